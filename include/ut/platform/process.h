@@ -1,0 +1,23 @@
+// The process as the library sees it: its environment, its modules, and its error output.
+#pragma once
+
+#include <string>
+
+#include <ut/platform/com.h>
+
+namespace ut::platform {
+
+// Whether the environment holds the variable, with any value (an empty one included).
+UT_PLATFORM_API bool HasEnvironmentVariable(const char* name);
+
+// The module (shared library or executable) whose image holds `address`, or null.
+UT_PLATFORM_API HINSTANCE ModuleOf(const void* address);
+
+// The full file name of a loaded module, or an empty string when it is unknown.
+UT_PLATFORM_API std::wstring ModuleFileName(HINSTANCE module);
+
+// Writes one line to the process's error output (standard error, or the debugger on Windows
+// when there is no console).
+UT_PLATFORM_API void ReportError(const std::wstring& line);
+
+} // namespace ut::platform

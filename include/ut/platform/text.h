@@ -1,0 +1,26 @@
+// Conversions between the in-memory wide text (wchar_t on both homes) and the encodings that
+// leave the process: UTF-8 for POSIX file names and messages, UTF-16LE for streams.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+#include <ut/platform/com.h>
+
+namespace ut::platform {
+
+// Invalid sequences become U+FFFD; nothing is dropped silently.
+UT_PLATFORM_API std::wstring WideFromUtf8(std::string_view text);
+UT_PLATFORM_API std::string Utf8FromWide(std::wstring_view text);
+
+// Number of UTF-16 code units that `text` takes on a stream.
+UT_PLATFORM_API std::size_t Utf16Length(std::wstring_view text);
+// Appends the UTF-16LE bytes of `text` to `out`.
+UT_PLATFORM_API void AppendUtf16Le(std::wstring_view text, std::string& out);
+// Decodes `units` UTF-16LE code units from `bytes`. Unpaired surrogates become U+FFFD where
+// wchar_t is 32-bit; where it is 16-bit they are kept as they are.
+UT_PLATFORM_API std::wstring WideFromUtf16Le(const std::uint8_t* bytes, std::size_t units);
+
+} // namespace ut::platform

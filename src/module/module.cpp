@@ -1,0 +1,47 @@
+// The library's load and unload steps.
+#include <ut/platform/module_entry.h>
+#include <ut/platform/process.h>
+#include <ut/sdk/resources.h>
+
+#include "module/state.h"
+
+namespace ut::module {
+namespace {
+
+// Built on first use: the load step may run before this library's static initialisers.
+State& MutableState() {
+    static State state;
+    return state;
+}
+
+constexpr int kRegistryKeyCapacity = 260;
+
+} // namespace
+
+const State& Current() { return MutableState(); }
+
+} // namespace ut::module
+
+namespace ut::platform {
+
+HRESULT OnModuleAttach(HINSTANCE self) {
+    ut::module::State& state = ut::module::MutableState();
+    state = {};
+    state.instance = self;
+    if (HRESULT hr = KXDictRegisterInstance(self, L"QVXUT"); FAILED(hr))
+        return hr;
+    wchar_t key[ut::module::kRegistryKeyCapacity];
+    if (LONG error = GWResourceConstructRegKey(self, L"", key, ut::module::kRegistryKeyCapacity); error != ERROR_SUCCESS)
+        return HRESULT_FROM_WIN32(static_cast<DWORD>(error));
+    state.baseKey = key;
+    state.streamCompressionDisabled = HasEnvironmentVariable("KX_DISABLE_STREAM_COMPRESSION");
+    state.loaded = true;
+    return S_OK;
+}
+
+void OnModuleDetach() {
+    KXDictUnregisterInstance(L"QVXUT");
+    ut::module::MutableState().loaded = false;
+}
+
+} // namespace ut::platform

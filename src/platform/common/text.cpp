@@ -1,0 +1,156 @@
+// Text conversions shared by both homes. wchar_t is UTF-32 on POSIX and UTF-16 on Windows; the
+// code below asks which at compile time instead of asking which home it is on.
+#include <ut/platform/text.h>
+
+namespace ut::platform {
+namespace {
+
+constexpr char32_t kReplacement = 0xFFFD;
+constexpr bool kWideIsUtf16 = sizeof(wchar_t) == 2;
+
+bool IsHighSurrogate(char32_t c) { return c >= 0xD800 && c <= 0xDBFF; }
+bool IsLowSurrogate(char32_t c) { return c >= 0xDC00 && c <= 0xDFFF; }
+bool IsSurrogate(char32_t c) { return c >= 0xD800 && c <= 0xDFFF; }
+
+void AppendWide(char32_t code, std::wstring& out) {
+    if (kWideIsUtf16 && code > 0xFFFF) {
+        code -= 0x10000;
+        out.push_back(static_cast<wchar_t>(0xD800 + (code >> 10)));
+        out.push_back(static_cast<wchar_t>(0xDC00 + (code & 0x3FF)));
+        return;
+    }
+    out.push_back(static_cast<wchar_t>(code));
+}
+
+// Calls visit(code point) for each character of wide text, pairing surrogates where wchar_t is
+// UTF-16 and replacing unpaired ones.
+template <class Visit>
+void ForEachCodePoint(std::wstring_view text, Visit visit) {
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        char32_t c = static_cast<char32_t>(text[i]);
+        if (kWideIsUtf16 && IsHighSurrogate(c) && i + 1 < text.size() &&
+            IsLowSurrogate(static_cast<char32_t>(text[i + 1]))) {
+            c = 0x10000 + ((c - 0xD800) << 10) + (static_cast<char32_t>(text[i + 1]) - 0xDC00);
+            ++i;
+        } else if (IsSurrogate(c) || c > 0x10FFFF) {
+            c = kReplacement;
+        }
+        visit(c);
+    }
+}
+
+} // namespace
+
+std::wstring WideFromUtf8(std::string_view text) {
+    std::wstring out;
+    out.reserve(text.size());
+    std::size_t i = 0;
+    while (i < text.size()) {
+        unsigned char lead = static_cast<unsigned char>(text[i]);
+        int extra = lead < 0x80 ? 0 : (lead >> 5) == 0x6 ? 1 : (lead >> 4) == 0xE ? 2 : (lead >> 3) == 0x1E ? 3 : -1;
+        if (extra < 0 || i + static_cast<std::size_t>(extra) >= text.size()) {
+            out.push_back(static_cast<wchar_t>(kReplacement));
+            ++i;
+            continue;
+        }
+        char32_t code = extra == 0 ? lead : lead & (0x3F >> extra);
+        bool valid = true;
+        for (int k = 1; k <= extra; ++k) {
+            unsigned char next = static_cast<unsigned char>(text[i + static_cast<std::size_t>(k)]);
+            if ((next & 0xC0) != 0x80) {
+                valid = false;
+                break;
+            }
+            code = (code << 6) | (next & 0x3F);
+        }
+        static constexpr char32_t kSmallest[] = {0, 0x80, 0x800, 0x10000};
+        if (!valid || code < kSmallest[extra] || code > 0x10FFFF || IsSurrogate(code)) {
+            out.push_back(static_cast<wchar_t>(kReplacement));
+            ++i;
+            continue;
+        }
+        AppendWide(code, out);
+        i += static_cast<std::size_t>(extra) + 1;
+    }
+    return out;
+}
+
+std::string Utf8FromWide(std::wstring_view text) {
+    std::string out;
+    out.reserve(text.size());
+    ForEachCodePoint(text, [&](char32_t c) {
+        if (c < 0x80) {
+            out.push_back(static_cast<char>(c));
+        } else if (c < 0x800) {
+            out.push_back(static_cast<char>(0xC0 | (c >> 6)));
+            out.push_back(static_cast<char>(0x80 | (c & 0x3F)));
+        } else if (c < 0x10000) {
+            out.push_back(static_cast<char>(0xE0 | (c >> 12)));
+            out.push_back(static_cast<char>(0x80 | ((c >> 6) & 0x3F)));
+            out.push_back(static_cast<char>(0x80 | (c & 0x3F)));
+        } else {
+            out.push_back(static_cast<char>(0xF0 | (c >> 18)));
+            out.push_back(static_cast<char>(0x80 | ((c >> 12) & 0x3F)));
+            out.push_back(static_cast<char>(0x80 | ((c >> 6) & 0x3F)));
+            out.push_back(static_cast<char>(0x80 | (c & 0x3F)));
+        }
+    });
+    return out;
+}
+
+std::size_t Utf16Length(std::wstring_view text) {
+    if constexpr (kWideIsUtf16)
+        return text.size();
+    std::size_t units = 0;
+    for (wchar_t c : text)
+        units += static_cast<char32_t>(c) > 0xFFFF && static_cast<char32_t>(c) <= 0x10FFFF ? 2 : 1;
+    return units;
+}
+
+void AppendUtf16Le(std::wstring_view text, std::string& out) {
+    auto put = [&out](char32_t unit) {
+        out.push_back(static_cast<char>(unit & 0xFF));
+        out.push_back(static_cast<char>((unit >> 8) & 0xFF));
+    };
+    if constexpr (kWideIsUtf16) {
+        for (wchar_t c : text)
+            put(static_cast<char32_t>(c));
+        return;
+    }
+    for (wchar_t wide : text) {
+        char32_t c = static_cast<char32_t>(wide);
+        if (c > 0x10FFFF) {
+            put(kReplacement);
+        } else if (c > 0xFFFF) {
+            c -= 0x10000;
+            put(0xD800 + (c >> 10));
+            put(0xDC00 + (c & 0x3FF));
+        } else {
+            put(c);
+        }
+    }
+}
+
+std::wstring WideFromUtf16Le(const std::uint8_t* bytes, std::size_t units) {
+    std::wstring out;
+    out.reserve(units);
+    auto unit = [bytes](std::size_t i) {
+        return static_cast<char32_t>(bytes[2 * i] | (static_cast<unsigned>(bytes[2 * i + 1]) << 8));
+    };
+    for (std::size_t i = 0; i < units; ++i) {
+        char32_t c = unit(i);
+        if constexpr (kWideIsUtf16) {
+            out.push_back(static_cast<wchar_t>(c));
+            continue;
+        }
+        if (IsHighSurrogate(c) && i + 1 < units && IsLowSurrogate(unit(i + 1))) {
+            out.push_back(static_cast<wchar_t>(0x10000 + ((c - 0xD800) << 10) + (unit(i + 1) - 0xDC00)));
+            ++i;
+        } else {
+            out.push_back(static_cast<wchar_t>(IsSurrogate(c) ? kReplacement : c));
+        }
+    }
+    return out;
+}
+
+} // namespace ut::platform

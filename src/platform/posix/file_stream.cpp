@@ -1,0 +1,187 @@
+// A stream over a file descriptor. Positions are our own, so reads and writes use pread and
+// pwrite and the descriptor's offset is never shared state.
+#include <cerrno>
+#include <fcntl.h>
+#include <new>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <ut/platform/text.h>
+
+#include "stream_base.h"
+
+namespace ut::platform::posix {
+namespace {
+
+HRESULT FromErrno(int error, HRESULT fallback) {
+    switch (error) {
+    case ENOENT:
+    case ENOTDIR:
+        return STG_E_FILENOTFOUND;
+    case EACCES:
+    case EPERM:
+    case EROFS:
+        return STG_E_ACCESSDENIED;
+    case ENOSPC:
+    case EFBIG:
+        return STG_E_MEDIUMFULL;
+    case ENOMEM:
+        return STG_E_INSUFFICIENTMEMORY;
+    default:
+        return fallback;
+    }
+}
+
+class FileStream final : public StreamBase {
+public:
+    FileStream(int fd, std::wstring path, DWORD mode) : fd_(fd), path_(std::move(path)), mode_(mode) {}
+
+    HRESULT STDMETHODCALLTYPE Read(void* buffer, ULONG count, ULONG* read) override {
+        if (read)
+            *read = 0;
+        if (!buffer && count)
+            return STG_E_INVALIDPOINTER;
+        ULONG done = 0;
+        while (done < count) {
+            ssize_t got = ::pread(fd_, static_cast<char*>(buffer) + done, count - done,
+                                  static_cast<off_t>(position_ + done));
+            if (got < 0 && errno == EINTR)
+                continue;
+            if (got < 0)
+                return FinishRead(done, read, FromErrno(errno, STG_E_READFAULT));
+            if (got == 0)
+                break;
+            done += static_cast<ULONG>(got);
+        }
+        return FinishRead(done, read, S_OK);
+    }
+
+    HRESULT STDMETHODCALLTYPE Write(const void* buffer, ULONG count, ULONG* written) override {
+        if (written)
+            *written = 0;
+        if (!buffer && count)
+            return STG_E_INVALIDPOINTER;
+        ULONG done = 0;
+        while (done < count) {
+            ssize_t put = ::pwrite(fd_, static_cast<const char*>(buffer) + done, count - done,
+                                   static_cast<off_t>(position_ + done));
+            if (put < 0 && errno == EINTR)
+                continue;
+            if (put <= 0) {
+                HRESULT hr = put < 0 ? FromErrno(errno, STG_E_WRITEFAULT) : STG_E_WRITEFAULT;
+                position_ += done;
+                if (written)
+                    *written = done;
+                return hr;
+            }
+            done += static_cast<ULONG>(put);
+        }
+        position_ += done;
+        if (written)
+            *written = done;
+        return S_OK;
+    }
+
+    HRESULT STDMETHODCALLTYPE Seek(LARGE_INTEGER move, DWORD origin, ULARGE_INTEGER* position) override {
+        ULONGLONG size = 0;
+        if (HRESULT hr = Size(size); FAILED(hr))
+            return hr;
+        ULONGLONG target = 0;
+        if (!NewPosition(move, origin, position_, size, target))
+            return STG_E_INVALIDFUNCTION;
+        position_ = target;
+        if (position)
+            position->QuadPart = position_;
+        return S_OK;
+    }
+
+    HRESULT STDMETHODCALLTYPE SetSize(ULARGE_INTEGER size) override {
+        if (::ftruncate(fd_, static_cast<off_t>(size.QuadPart)) != 0)
+            return FromErrno(errno, STG_E_WRITEFAULT);
+        return S_OK;
+    }
+
+    HRESULT STDMETHODCALLTYPE Stat(STATSTG* stat, DWORD flags) override {
+        ULONGLONG size = 0;
+        if (HRESULT hr = Size(size); FAILED(hr))
+            return hr;
+        return FillStat(stat, flags, size, path_, mode_);
+    }
+
+    // The system's file streams cannot be cloned either.
+    HRESULT STDMETHODCALLTYPE Clone(IStream** clone) override {
+        if (clone)
+            *clone = nullptr;
+        return E_NOTIMPL;
+    }
+
+private:
+    ~FileStream() override { ::close(fd_); }
+
+    HRESULT FinishRead(ULONG done, ULONG* read, HRESULT hr) {
+        position_ += done;
+        if (read)
+            *read = done;
+        return hr;
+    }
+
+    HRESULT Size(ULONGLONG& size) const {
+        struct stat info {};
+        if (::fstat(fd_, &info) != 0)
+            return FromErrno(errno, STG_E_READFAULT);
+        size = static_cast<ULONGLONG>(info.st_size);
+        return S_OK;
+    }
+
+    int fd_;
+    std::wstring path_;
+    DWORD mode_;
+    ULONGLONG position_ = 0;
+};
+
+int OpenFlags(DWORD mode) {
+    int flags = O_CLOEXEC;
+    switch (mode & 3) {
+    case STGM_WRITE:
+        flags |= O_WRONLY;
+        break;
+    case STGM_READWRITE:
+        flags |= O_RDWR;
+        break;
+    default:
+        flags |= O_RDONLY;
+        break;
+    }
+    if (mode & STGM_CREATE)
+        flags |= O_CREAT | O_TRUNC;
+    return flags;
+}
+
+} // namespace
+} // namespace ut::platform::posix
+
+namespace ut::platform {
+
+HRESULT OpenFileStream(const wchar_t* path, DWORD mode, IStream** stream) {
+    if (!stream)
+        return E_POINTER;
+    *stream = nullptr;
+    if (!path || !*path)
+        return STG_E_INVALIDNAME;
+    if ((mode & 3) == 3)
+        return STG_E_INVALIDFLAG;
+    int flags = posix::OpenFlags(mode);
+    if ((mode & STGM_CREATE) && (mode & 3) == STGM_READ)
+        flags = (flags & ~O_ACCMODE) | O_RDWR;
+    int fd = ::open(Utf8FromWide(path).c_str(), flags, 0666);
+    if (fd < 0)
+        return posix::FromErrno(errno, STG_E_ACCESSDENIED);
+    *stream = new (std::nothrow) posix::FileStream(fd, path, mode);
+    if (!*stream) {
+        ::close(fd);
+        return E_OUTOFMEMORY;
+    }
+    return S_OK;
+}
+
+} // namespace ut::platform

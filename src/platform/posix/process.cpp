@@ -1,0 +1,32 @@
+#include <cstdio>
+#include <cstdlib>
+#include <dlfcn.h>
+
+#include <ut/platform/process.h>
+#include <ut/platform/text.h>
+
+namespace ut::platform {
+
+bool HasEnvironmentVariable(const char* name) { return name && std::getenv(name) != nullptr; }
+
+HINSTANCE ModuleOf(const void* address) {
+    Dl_info info{};
+    if (!address || ::dladdr(address, &info) == 0)
+        return nullptr;
+    return static_cast<HINSTANCE>(info.dli_fbase);
+}
+
+std::wstring ModuleFileName(HINSTANCE module) {
+    Dl_info info{};
+    if (!module || ::dladdr(reinterpret_cast<void*>(module), &info) == 0 || !info.dli_fname)
+        return std::wstring();
+    return WideFromUtf8(info.dli_fname);
+}
+
+void ReportError(const std::wstring& line) {
+    std::string text = Utf8FromWide(line);
+    std::fprintf(stderr, "%s\n", text.c_str());
+    std::fflush(stderr);
+}
+
+} // namespace ut::platform

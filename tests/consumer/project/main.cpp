@@ -1,0 +1,20 @@
+// A plug-in's view of the installed library: the headers compile, the libraries link and load.
+#include <cstdio>
+
+#include <ut/platform/stream.h>
+#include <ut/sdk/resources.h>
+#include <ut/ut.h>
+
+int main() {
+    if (g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureCurrent] == 0 || !KXDictFindInstance(L"QVXUT")) {
+        std::puts("the library did not load");
+        return 1;
+    }
+    ut::ComPtr<IStream> stream;
+    if (FAILED(ut::platform::CreateMemoryStream(stream.Put())) || FAILED(stream->Write("ok", 2, nullptr))) {
+        std::puts("no memory stream");
+        return 1;
+    }
+    std::puts("consumer: ut found, loaded and usable");
+    return 0;
+}

@@ -1,0 +1,166 @@
+// The memory and file streams must behave alike, and alike on both homes.
+#include <cstring>
+#include <filesystem>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include <ut/platform/stream.h>
+
+namespace {
+
+using ut::ComPtr;
+
+LARGE_INTEGER Offset(LONGLONG value) {
+    LARGE_INTEGER offset;
+    offset.QuadPart = value;
+    return offset;
+}
+
+ULONGLONG Position(IStream* stream) {
+    ULARGE_INTEGER position{};
+    EXPECT_EQ(stream->Seek(Offset(0), STREAM_SEEK_CUR, &position), S_OK);
+    return position.QuadPart;
+}
+
+std::string ReadAll(IStream* stream) {
+    EXPECT_EQ(stream->Seek(Offset(0), STREAM_SEEK_SET, nullptr), S_OK);
+    std::string out;
+    char buffer[7];
+    ULONG got = 0;
+    while (SUCCEEDED(stream->Read(buffer, sizeof buffer, &got)) && got > 0)
+        out.append(buffer, got);
+    return out;
+}
+
+std::wstring TempPath(const wchar_t* name) { return (std::filesystem::temp_directory_path() / name).wstring(); }
+
+enum class Kind { Memory, File };
+
+class StreamTest : public ::testing::TestWithParam<Kind> {
+protected:
+    void SetUp() override {
+        if (GetParam() == Kind::Memory) {
+            ASSERT_EQ(ut::platform::CreateMemoryStream(stream_.Put()), S_OK);
+            return;
+        }
+        path_ = TempPath(L"ut_stream_test.bin");
+        ASSERT_EQ(ut::platform::OpenFileStream(path_.c_str(), STGM_READWRITE | STGM_CREATE, stream_.Put()), S_OK);
+    }
+    void TearDown() override {
+        stream_.Reset();
+        if (!path_.empty())
+            std::filesystem::remove(path_);
+    }
+
+    ComPtr<IStream> stream_;
+    std::wstring path_;
+};
+
+TEST_P(StreamTest, WritesReadsAndSeeks) {
+    ULONG written = 0;
+    ASSERT_EQ(stream_->Write("hello world", 11, &written), S_OK);
+    EXPECT_EQ(written, 11u);
+    EXPECT_EQ(Position(stream_.Get()), 11u);
+    EXPECT_EQ(ReadAll(stream_.Get()), "hello world");
+
+    ULARGE_INTEGER at{};
+    ASSERT_EQ(stream_->Seek(Offset(-5), STREAM_SEEK_END, &at), S_OK);
+    EXPECT_EQ(at.QuadPart, 6u);
+    char word[5];
+    ULONG got = 0;
+    ASSERT_EQ(stream_->Read(word, 5, &got), S_OK);
+    EXPECT_EQ(std::string(word, got), "world");
+    ASSERT_EQ(stream_->Seek(Offset(-11), STREAM_SEEK_CUR, nullptr), S_OK);
+    EXPECT_EQ(Position(stream_.Get()), 0u);
+}
+
+TEST_P(StreamTest, ReadingAtTheEndGivesNothingAndSucceeds) {
+    ASSERT_EQ(stream_->Write("abc", 3, nullptr), S_OK);
+    char buffer[8];
+    ULONG got = 99;
+    EXPECT_EQ(stream_->Read(buffer, sizeof buffer, &got), S_OK);
+    EXPECT_EQ(got, 0u);
+}
+
+TEST_P(StreamTest, SeekingBeforeTheStartFailsAndKeepsThePosition) {
+    ASSERT_EQ(stream_->Write("abc", 3, nullptr), S_OK);
+    EXPECT_TRUE(FAILED(stream_->Seek(Offset(-4), STREAM_SEEK_CUR, nullptr)));
+    EXPECT_EQ(Position(stream_.Get()), 3u);
+}
+
+TEST_P(StreamTest, WritingPastTheEndFillsTheGapWithZeros) {
+    ASSERT_EQ(stream_->Seek(Offset(4), STREAM_SEEK_SET, nullptr), S_OK);
+    ASSERT_EQ(stream_->Write("x", 1, nullptr), S_OK);
+    EXPECT_EQ(ReadAll(stream_.Get()), std::string("\0\0\0\0x", 5));
+}
+
+TEST_P(StreamTest, SetSizeTruncatesAndStatReportsTheSize) {
+    ASSERT_EQ(stream_->Write("0123456789", 10, nullptr), S_OK);
+    ULARGE_INTEGER size{};
+    size.QuadPart = 4;
+    ASSERT_EQ(stream_->SetSize(size), S_OK);
+    STATSTG stat{};
+    ASSERT_EQ(stream_->Stat(&stat, STATFLAG_NONAME), S_OK);
+    EXPECT_EQ(stat.type, static_cast<DWORD>(STGTY_STREAM));
+    EXPECT_EQ(stat.cbSize.QuadPart, 4u);
+    EXPECT_EQ(stat.pwcsName, nullptr);
+    EXPECT_EQ(ReadAll(stream_.Get()), "0123");
+}
+
+TEST_P(StreamTest, CopyToMovesTheRequestedBytes) {
+    ASSERT_EQ(stream_->Write("0123456789", 10, nullptr), S_OK);
+    ASSERT_EQ(stream_->Seek(Offset(2), STREAM_SEEK_SET, nullptr), S_OK);
+    ComPtr<IStream> target;
+    ASSERT_EQ(ut::platform::CreateMemoryStream(target.Put()), S_OK);
+    ULARGE_INTEGER count{}, read{}, written{};
+    count.QuadPart = 5;
+    ASSERT_EQ(stream_->CopyTo(target.Get(), count, &read, &written), S_OK);
+    EXPECT_EQ(read.QuadPart, 5u);
+    EXPECT_EQ(written.QuadPart, 5u);
+    EXPECT_EQ(ReadAll(target.Get()), "23456");
+}
+
+INSTANTIATE_TEST_SUITE_P(BothStreams, StreamTest, ::testing::Values(Kind::Memory, Kind::File),
+                         [](const auto& info) { return info.param == Kind::Memory ? "Memory" : "File"; });
+
+TEST(MemoryStream, ClonesShareBytesButNotPosition) {
+    ComPtr<IStream> stream;
+    ASSERT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
+    ASSERT_EQ(stream->Write("abcdef", 6, nullptr), S_OK);
+    ComPtr<IStream> clone;
+    ASSERT_EQ(stream->Clone(clone.Put()), S_OK);
+    EXPECT_EQ(Position(clone.Get()), 6u);
+    ASSERT_EQ(clone->Seek(Offset(0), STREAM_SEEK_SET, nullptr), S_OK);
+    ASSERT_EQ(clone->Write("X", 1, nullptr), S_OK);
+    EXPECT_EQ(Position(stream.Get()), 6u);
+    EXPECT_EQ(ReadAll(stream.Get()), "Xbcdef");
+}
+
+TEST(FileStream, KeepsItsBytesAcrossOpensAndReportsItsName) {
+    std::wstring path = TempPath(L"ut_stream_reopen.bin");
+    {
+        ComPtr<IStream> stream;
+        ASSERT_EQ(ut::platform::OpenFileStream(path.c_str(), STGM_WRITE | STGM_CREATE, stream.Put()), S_OK);
+        ASSERT_EQ(stream->Write("persisted", 9, nullptr), S_OK);
+    }
+    ComPtr<IStream> stream;
+    ASSERT_EQ(ut::platform::OpenFileStream(path.c_str(), STGM_READ, stream.Put()), S_OK);
+    EXPECT_EQ(ReadAll(stream.Get()), "persisted");
+    STATSTG stat{};
+    ASSERT_EQ(stream->Stat(&stat, STATFLAG_DEFAULT), S_OK);
+    ASSERT_NE(stat.pwcsName, nullptr);
+    EXPECT_NE(std::wstring(stat.pwcsName).find(L"ut_stream_reopen.bin"), std::wstring::npos);
+    CoTaskMemFree(stat.pwcsName);
+    stream.Reset();
+    std::filesystem::remove(path);
+}
+
+TEST(FileStream, MissingFileIsNotFound) {
+    ComPtr<IStream> stream;
+    std::wstring path = TempPath(L"ut_no_such_file.bin");
+    EXPECT_EQ(ut::platform::OpenFileStream(path.c_str(), STGM_READ, stream.Put()), STG_E_FILENOTFOUND);
+    EXPECT_FALSE(stream);
+}
+
+} // namespace
