@@ -1,0 +1,9 @@
+#include <ut/sdk/ambient.h>
+#include <ut/sdk/objects.h>
+
+HRESULT KXGetAmbientValuesMgr(IGWAmbientValues** manager) {
+    if (!manager)
+        return E_POINTER;
+    return GWQueryGenericObject(CLSID_GWAmbientValues, IID_IGWAmbientValues,
+                                reinterpret_cast<void**>(manager));
+}
