@@ -1,9 +1,14 @@
 #include <ut/host/reference_host.h>
 #include <ut/sdk/objects.h>
 
+#include "notification_service.h"
+
 namespace ut::host {
 
-ReferenceHost::ReferenceHost(const Settings&) {}
+ReferenceHost::ReferenceHost(const Settings&) {
+    auto notifications = ComPtr<NotificationService>::Adopt(new NotificationService());
+    InstallService(CLSID_GWNotificationService, static_cast<CGWCOMObject*>(notifications.Get()));
+}
 
 ReferenceHost::~ReferenceHost() {
     for (const CLSID& clsid : services_)
