@@ -70,6 +70,9 @@ public:
                                               int reserved) override;
 
 private:
+    // Allocate when the pool is not registered or the class has no kept block.
+    void* AllocateSlowPath(LONG size);
+
     Descriptor* FreeLists[kSizeClasses] = {};
     Descriptor* InUse = nullptr;
 

@@ -47,24 +47,45 @@ void Attach(Descriptor* descriptor, void* block) {
     descriptor->Data = static_cast<std::byte*>(block) + kHeaderBytes;
 }
 
+// The list helpers read every link before writing any: the links may alias the head.
 void PushFront(Descriptor*& head, Descriptor* descriptor) {
+    Descriptor* first = head;
     descriptor->Prev = nullptr;
-    descriptor->Next = head;
-    if (head)
-        head->Prev = descriptor;
+    descriptor->Next = first;
+    if (first)
+        first->Prev = descriptor;
     head = descriptor;
 }
 
 void Unlink(Descriptor*& head, Descriptor* descriptor) {
-    if (descriptor->Prev)
-        descriptor->Prev->Next = descriptor->Next;
+    Descriptor* prev = descriptor->Prev;
+    Descriptor* next = descriptor->Next;
+    if (prev)
+        prev->Next = next;
     else
-        head = descriptor->Next;
-    if (descriptor->Next)
-        descriptor->Next->Prev = descriptor->Prev;
+        head = next;
+    if (next)
+        next->Prev = prev;
 }
 
-void FreeBlock(Descriptor* descriptor) {
+// Takes the first kept block off its free list for a request of its class.
+Descriptor* TakeFirst(Descriptor*& freeList, ULONG request) {
+    Descriptor* descriptor = freeList;
+    Descriptor* next = descriptor->Next;
+    freeList = next;
+    if (next)
+        next->Prev = nullptr;
+    descriptor->Size = request;
+    return descriptor;
+}
+
+// Puts a block on the in-use list and answers the caller's pointer.
+void* HandOut(Descriptor*& inUse, Descriptor* descriptor) {
+    PushFront(inUse, descriptor);
+    return descriptor->Data;
+}
+
+[[gnu::noinline]] void FreeBlock(Descriptor* descriptor) {
     std::free(BlockStart(descriptor->Data));
     std::free(descriptor);
 }
@@ -82,8 +103,8 @@ struct FreeDeleter {
 };
 
 // A descriptor with a block of `size` bytes rounded up to the granule, or null. Its links are set
-// when it is put on a list.
-Descriptor* NewBlock(ULONG size) {
+// when it is put on a list. Kept out of line so that the pooled path needs no stack frame.
+[[gnu::noinline]] Descriptor* NewBlock(ULONG size) {
     std::unique_ptr<Descriptor, FreeDeleter> descriptor(
         static_cast<Descriptor*>(std::malloc(sizeof(Descriptor))));
     if (!descriptor)
@@ -116,23 +137,24 @@ CMemoryPool::~CMemoryPool() {
 }
 
 void* CMemoryPool::Allocate(LONG size) {
-    if (size < 0)
-        return nullptr;
-    if (!Notifier)
-        Register();
+    // The pooled path (registered, and a block of the class is kept) makes no call at all.
     ULONG request = size == 0 ? kGranule : static_cast<ULONG>(size);
     ULONG sizeClass = SizeClass(request);
-    Descriptor* descriptor = sizeClass < kSizeClasses ? FreeLists[sizeClass] : nullptr;
-    if (descriptor) {
-        Unlink(FreeLists[sizeClass], descriptor);
-        descriptor->Size = request;
-    } else {
-        descriptor = NewBlock(request);
-        if (!descriptor)
-            return nullptr;
-    }
-    PushFront(InUse, descriptor);
-    return descriptor->Data;
+    if (sizeClass >= kSizeClasses || !Notifier || !FreeLists[sizeClass]) [[unlikely]]
+        return AllocateSlowPath(size);
+    return HandOut(InUse, TakeFirst(FreeLists[sizeClass], request));
+}
+
+void* CMemoryPool::AllocateSlowPath(LONG size) {
+    if (size < 0)
+        return nullptr;
+    Register();
+    ULONG request = size == 0 ? kGranule : static_cast<ULONG>(size);
+    ULONG sizeClass = SizeClass(request);
+    if (sizeClass < kSizeClasses && FreeLists[sizeClass])
+        return HandOut(InUse, TakeFirst(FreeLists[sizeClass], request));
+    Descriptor* descriptor = NewBlock(request);
+    return descriptor ? HandOut(InUse, descriptor) : nullptr;
 }
 
 void* CMemoryPool::Reallocate(void* p, LONG size) {
