@@ -1,8 +1,13 @@
 // Persistence: the feature-version table and persisted-version codes, and user data blocks.
 #pragma once
 
+#include <map>
+
 #include <ut/export.h>
 #include <ut/platform/com.h>
+#include <ut/platform/stream.h>
+#include <ut/sdk/comobject.h>
+#include <ut/sdk/string.h>
 
 // ---------------------------------------------------------------------------------------------
 // Feature and persisted versions
@@ -43,3 +48,80 @@ UT_API HRESULT F3DGetVersionIdFromMode(ULONG& versionId);
 
 // 1 when the host's active database is in `mode`, 0 otherwise or when it cannot be asked.
 UT_API int IsCurrentActiveDBMode(ULONG mode);
+
+// ---------------------------------------------------------------------------------------------
+// User data blocks
+
+// The kinds of optional user data a scene object may carry, at most one block of each.
+enum eUserDataBlockType : LONG {
+    eUserDataBlockType0 = 0,
+    eUserDataBlockType1 = 1,
+    // The base block's own type, which no class implements.
+    eUserDataBlockTypeBase = 2,
+};
+
+// {4AF0E60F-DC45-4C99-98FE-03E9468DBAFC}
+inline constexpr CLSID CLSID_UserDataBlockType0 = {
+    0x4AF0E60F, 0xDC45, 0x4C99, {0x98, 0xFE, 0x03, 0xE9, 0x46, 0x8D, 0xBA, 0xFC}};
+// {DC0F9FF8-9C5E-4048-8766-2C4017EF6A18}
+inline constexpr CLSID CLSID_UserDataBlockType1 = {
+    0xDC0F9FF8, 0x9C5E, 0x4048, {0x87, 0x66, 0x2C, 0x40, 0x17, 0xEF, 0x6A, 0x18}};
+// {AD51D1E3-C45C-4B22-B862-F93882B4205F}: answered with the CUserDataBlock itself.
+inline constexpr IID IID_CUserDataBlock = {
+    0xAD51D1E3, 0xC45C, 0x4B22, {0xB8, 0x62, 0xF9, 0x38, 0x82, 0xB4, 0x20, 0x5F}};
+
+// The base of a block of user data. Concrete blocks live outside the library, registered under
+// the class id of their type; this base persists nothing (E_NOTIMPL).
+class UT_API CUserDataBlock : public CGWCOMObject {
+public:
+    CUserDataBlock() = default;
+
+    HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override;
+    ~CUserDataBlock() override;
+    void OnFinalRelease() override;
+
+    virtual bool IsPersistable() const;
+    virtual HRESULT Load(IStream* stream);
+    // Runs once every object of the scene has been loaded.
+    virtual HRESULT OnEndLoad();
+    virtual HRESULT Save(IStream* stream);
+    virtual HRESULT GetAsTextVersion(std::map<CKXString, CKXString>& text);
+    virtual HRESULT SetFromTextVersion(std::map<CKXString, CKXString>& text);
+    // The base answers eUserDataBlockTypeBase.
+    virtual HRESULT GetType(eUserDataBlockType& type);
+
+    // The class that implements blocks of `type`; E_UNEXPECTED, `clsid` untouched, when none does.
+    static HRESULT GetCLSIDFromType(const eUserDataBlockType& type, CLSID& clsid);
+
+private:
+    CUserDataBlock(const CUserDataBlock&) = delete;
+    CUserDataBlock& operator=(const CUserDataBlock&) = delete;
+};
+
+UT_INTERFACE_ID(CUserDataBlock, IID_CUserDataBlock);
+
+// The user data blocks of one owner, created on first request and released with the collection.
+class UT_API CUserDataBlocks {
+public:
+    CUserDataBlocks() = default;
+    virtual ~CUserDataBlocks();
+
+    // The block of `type`, borrowed (no AddRef): S_OK when it was there already. When it was not,
+    // S_FALSE, and with `create` the new block is handed out too, so the pointer tells the two
+    // apart. E_UNEXPECTED for a type without a class; a failed creation's error is returned.
+    HRESULT GetBlock(const eUserDataBlockType& type, CUserDataBlock** block, bool create);
+
+    // The collection persists nothing of its own: S_FALSE.
+    HRESULT Save(IStream* stream);
+    HRESULT Load(IStream* stream);
+
+protected:
+    // Releases every block, in type order, and empties the collection.
+    void Clear();
+
+private:
+    CUserDataBlocks(const CUserDataBlocks&) = delete;
+    CUserDataBlocks& operator=(const CUserDataBlocks&) = delete;
+
+    std::map<eUserDataBlockType, ut::ComPtr<CUserDataBlock>> blocks_;
+};
