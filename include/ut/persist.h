@@ -22,6 +22,12 @@ enum : ULONG { eFeatureNumber = 0, eFeatureCurrent = 1, eFeatureLoaded = 2 };
 // stream being loaded.
 UT_API extern ULONG g_uiFeaturesVersion[eFeaturesVersionCount][3];
 
+class C3DStreamHelper;
+
+// Fills the loaded column of g_uiFeaturesVersion from the stream's feature-version chunk. A stream
+// without one reports loaded version 0 for the scene feature. S_OK whatever the stream holds.
+UT_API HRESULT KXLoadFeaturesVersion(C3DStreamHelper& stream);
+
 // The loaded and current versions of a feature; either pointer may be null. A feature outside
 // the table reports nothing.
 UT_API void KXGetFeatureVersion(tagEFeaturesVersion feature, ULONG* loaded, ULONG* current);
