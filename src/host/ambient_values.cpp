@@ -20,20 +20,14 @@ HRESULT AmbientValues::GetBool(const wchar_t* name, BOOL* value) {
     if (!value)
         return E_POINTER;
     LONG stored = 0;
-    HRESULT hr = Read("IGWAmbientValues::GetBool", name, stored);
+    HRESULT hr = Read("IGWAmbientValues::GetBool", name, &stored);
     if (hr == S_OK)
         *value = stored != 0 ? TRUE : FALSE;
     return hr;
 }
 
 HRESULT AmbientValues::GetInt(const wchar_t* name, LONG* value) {
-    if (!value)
-        return E_POINTER;
-    LONG stored = 0;
-    HRESULT hr = Read("IGWAmbientValues::GetInt", name, stored);
-    if (hr == S_OK)
-        *value = stored;
-    return hr;
+    return Read("IGWAmbientValues::GetInt", name, value);
 }
 
 HRESULT AmbientValues::SetBool(const wchar_t* name, BOOL value) {
@@ -44,8 +38,8 @@ HRESULT AmbientValues::SetInt(const wchar_t* name, LONG value) {
     return Write("IGWAmbientValues::SetInt", name, value);
 }
 
-HRESULT AmbientValues::Read(std::string_view operation, const wchar_t* name, LONG& value) {
-    if (!name)
+HRESULT AmbientValues::Read(std::string_view operation, const wchar_t* name, LONG* value) {
+    if (!name || !value)
         return E_POINTER;
     if (HRESULT hr = ut::sdk::CheckHostFault(operation); FAILED(hr))
         return hr;
@@ -53,7 +47,7 @@ HRESULT AmbientValues::Read(std::string_view operation, const wchar_t* name, LON
     auto found = values_.find(std::wstring_view(name));
     if (found == values_.end())
         return DISP_E_MEMBERNOTFOUND;
-    value = found->second;
+    *value = found->second;
     return S_OK;
 }
 

@@ -28,7 +28,8 @@ public:
     HRESULT STDMETHODCALLTYPE SetInt(const wchar_t* name, LONG value) override;
 
 private:
-    HRESULT Read(std::string_view operation, const wchar_t* name, LONG& value);
+    // Leaves *value as it was unless the name is found.
+    HRESULT Read(std::string_view operation, const wchar_t* name, LONG* value);
     HRESULT Write(std::string_view operation, const wchar_t* name, LONG value);
 
     std::mutex mutex_;

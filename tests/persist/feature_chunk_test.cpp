@@ -1,4 +1,3 @@
-#include <optional>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -7,16 +6,14 @@
 
 namespace {
 
-// A reader that holds at most one chunk, with the values that follow its header.
+// A reader over at most one chunk, holding the values that follow its header.
 class ScriptedReader {
 public:
     ScriptedReader(HRESULT openResult, std::vector<ULONG> values)
         : openResult_(openResult), values_(std::move(values)) {}
 
-    HRESULT ChunkReadOpen(ULONG id, ULONG* version) {
+    HRESULT ChunkReadOpen(ULONG id, ULONG*) {
         openedId = id;
-        if (openResult_ == S_OK)
-            *version = 1;
         return openResult_;
     }
     HRESULT GetUInt32(ULONG& value) {
@@ -30,7 +27,7 @@ public:
         return S_OK;
     }
 
-    std::optional<ULONG> openedId;
+    ULONG openedId = 0;
     int closes = 0;
 
 private:
@@ -39,58 +36,41 @@ private:
     std::size_t next_ = 0;
 };
 
-class FeatureChunk : public testing::Test {
-protected:
-    void SetUp() override { SetLoaded(0); }
-    void TearDown() override { SetLoaded(0); }
-    static void SetLoaded(ULONG version) {
-        g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureLoaded] = version;
-    }
-    static ULONG Loaded() {
-        ULONG loaded = 0;
-        KXGetFeatureVersion(eFeaturesVersionScene, &loaded, nullptr);
-        return loaded;
-    }
-};
-
-TEST_F(FeatureChunk, AStreamWithoutItReportsVersionZero) {
-    for (HRESULT openResult : {STG_E_INVALIDHEADER, S_FALSE, E_FAIL}) {
-        SetLoaded(70);
-        ScriptedReader reader(openResult, {1, 0, 70});
-        EXPECT_EQ(ut::persist::LoadFeaturesVersion(reader), S_OK);
-        EXPECT_EQ(reader.openedId, 0x53464541u);
-        EXPECT_EQ(reader.closes, 0);
-        ULONG loaded = 99, current = 0;
-        KXGetFeatureVersion(eFeaturesVersionScene, &loaded, &current);
-        EXPECT_EQ(loaded, 0u) << "open answering " << openResult;
-        EXPECT_EQ(current, 64u);
-    }
-}
-
-TEST_F(FeatureChunk, FillsTheLoadedColumnAndSkipsUnknownFeatures) {
+TEST(FeatureChunk, FillsTheLoadedColumnAndSkipsUnknownFeatures) {
+    ULONG& loaded = g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureLoaded];
     struct Case {
         const char* what;
+        HRESULT openResult;
         std::vector<ULONG> values;
         ULONG loaded;
     };
     const Case cases[] = {
-        {"one pair", {1, 0, 70}, 70},
-        {"last pair wins", {2, 0, 70, 0, 71}, 71},
-        {"features beyond the table", {3, 1, 5, 0xFFFFFFFF, 6, 0, 65}, 65},
-        {"no pairs", {0}, 0},
-        {"count unreadable", {}, 0},
-        {"count beyond the data", {0xFFFFFFFF, 0, 66}, 66},
-        {"pair cut short", {2, 0, 67, 0}, 67},
+        {"no chunk", STG_E_INVALIDHEADER, {1, 0, 70}, 0},
+        {"open answering S_FALSE", S_FALSE, {1, 0, 70}, 0},
+        {"one pair", S_OK, {1, 0, 70}, 70},
+        {"last pair wins", S_OK, {2, 0, 70, 0, 71}, 71},
+        {"features beyond the table", S_OK, {3, 1, 5, 0xFFFFFFFF, 6, 0, 65}, 65},
+        {"no pairs", S_OK, {0}, 0},
+        {"count unreadable", S_OK, {}, 0},
+        {"count beyond the data", S_OK, {0xFFFFFFFF, 0, 66}, 66},
+        {"pair cut short", S_OK, {2, 0, 67, 0}, 67},
     };
     for (const Case& c : cases) {
-        SetLoaded(99);
-        ScriptedReader reader(S_OK, c.values);
+        loaded = 99;
+        ScriptedReader reader(c.openResult, c.values);
         EXPECT_EQ(ut::persist::LoadFeaturesVersion(reader), S_OK) << c.what;
-        EXPECT_EQ(Loaded(), c.loaded) << c.what;
-        EXPECT_EQ(reader.closes, 1) << c.what;
-        EXPECT_EQ(g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureNumber], 0u) << c.what;
-        EXPECT_EQ(g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureCurrent], 64u) << c.what;
+        EXPECT_EQ(reader.openedId, 0x53464541u) << c.what;
+        EXPECT_EQ(reader.closes, c.openResult == S_OK ? 1 : 0) << c.what;
+        ULONG reported = 0, current = 0;
+        KXGetFeatureVersion(eFeaturesVersionScene, &reported, &current);
+        EXPECT_EQ(reported, c.loaded) << c.what;
+        EXPECT_EQ(current, 64u) << c.what;
     }
+    loaded = 0;
+    // A feature the table does not have is not read past the table's end.
+    ULONG reported = 99;
+    KXGetFeatureVersion(eFeaturesVersionCount, &reported, nullptr);
+    EXPECT_EQ(reported, 99u);
 }
 
 } // namespace

@@ -10,8 +10,7 @@
 
 namespace {
 
-// Types of the blocks destroyed, in order.
-std::vector<eUserDataBlockType> g_destroyed;
+std::vector<eUserDataBlockType> g_destroyed; // types of the blocks destroyed, in order
 
 template <eUserDataBlockType Type>
 class TestBlock final : public CUserDataBlock {
@@ -23,13 +22,11 @@ public:
     }
 };
 
-// Exposes the protected Clear.
 class Blocks : public CUserDataBlocks {
 public:
     using CUserDataBlocks::Clear;
 };
 
-// Installs the test block classes for the test's duration.
 class UserDataBlocks : public testing::Test {
 protected:
     void SetUp() override {
@@ -43,144 +40,85 @@ protected:
     }
 
     ut::test::LiveObjectCheck live_;
+    Blocks blocks_;
+    CUserDataBlock* block_ = nullptr;
 };
 
 eUserDataBlockType Type(LONG value) {
     return static_cast<eUserDataBlockType>(value);
 }
 
-TEST(UserDataBlock, BaseAnswersOnlyItsOwnInterfaceAndPersistsNothing) {
+TEST(UserDataBlock, BaseAnswersItsOwnInterfaceAndHasNoClass) {
     ut::test::LiveObjectCheck live;
     auto block = ut::ComPtr<CUserDataBlock>::Adopt(new CUserDataBlock);
-
-    EXPECT_EQ(block->QueryInterface(IID_CUserDataBlock, nullptr), E_POINTER);
-    void* out = nullptr;
-    ASSERT_EQ(block->QueryInterface(IID_CUserDataBlock, &out), S_OK);
-    EXPECT_EQ(out, static_cast<void*>(block.Get()));
-    EXPECT_EQ(ut::test::RefTracker::References(block.Get()), 2u);
-    block->Release();
-    ut::ComPtr<IUnknown> identity;
-    EXPECT_EQ(block->QueryInterface(IID_IUnknown, identity.PutVoid()), S_OK);
-    identity.Reset();
-    out = &out;
+    ut::ComPtr<CUserDataBlock> same;
+    ASSERT_EQ(block.As(same), S_OK);
+    EXPECT_EQ(same.Get(), block.Get());
+    void* out = &out;
     EXPECT_EQ(block->QueryInterface(IID_IStream, &out), E_NOINTERFACE);
     EXPECT_EQ(out, nullptr);
-
-    EXPECT_TRUE(block->IsPersistable());
-    std::map<CKXString, CKXString> text;
-    EXPECT_EQ(block->Save(nullptr), E_NOTIMPL);
-    EXPECT_EQ(block->Load(nullptr), E_NOTIMPL);
-    EXPECT_EQ(block->GetAsTextVersion(text), E_NOTIMPL);
-    EXPECT_EQ(block->SetFromTextVersion(text), E_NOTIMPL);
-    EXPECT_EQ(block->OnEndLoad(), E_NOTIMPL);
-
-    // The base is of a type without a class, so that it is never mistaken for a real block.
+    // The base is of a type without a class, so that it is never taken for a real block.
     eUserDataBlockType type = eUserDataBlockType0;
-    EXPECT_EQ(block->GetType(type), S_OK);
-    EXPECT_EQ(type, eUserDataBlockTypeBase);
     CLSID clsid = GUID_NULL;
-    EXPECT_EQ(CUserDataBlock::GetCLSIDFromType(type, clsid), E_UNEXPECTED);
-}
-
-TEST(UserDataBlock, ClassIdsOfTheTypes) {
-    const CLSID untouched = {0x12345678, 0, 0, {0, 0, 0, 0, 0, 0, 0, 1}};
-    struct Case {
-        LONG type;
-        HRESULT result;
-        CLSID clsid;
-    };
-    for (const Case& c : {Case{0, S_OK, CLSID_UserDataBlockType0}, Case{1, S_OK, CLSID_UserDataBlockType1},
-                          Case{2, E_UNEXPECTED, untouched}, Case{5, E_UNEXPECTED, untouched},
-                          Case{-1, E_UNEXPECTED, untouched}}) {
-        CLSID clsid = untouched;
-        EXPECT_EQ(CUserDataBlock::GetCLSIDFromType(Type(c.type), clsid), c.result) << "type " << c.type;
-        EXPECT_TRUE(IsEqualGUID(clsid, c.clsid)) << "type " << c.type;
-    }
-}
-
-TEST_F(UserDataBlocks, AreCreatedOnRequestAndThenFound) {
-    Blocks blocks;
-    CUserDataBlock* sentinel = reinterpret_cast<CUserDataBlock*>(&blocks);
-    CUserDataBlock* block = sentinel;
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType0, &block, false), S_FALSE);
-    EXPECT_EQ(block, sentinel);
-
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType0, &block, true), S_FALSE);
-    ASSERT_NE(block, sentinel);
-    ASSERT_NE(block, nullptr);
-    eUserDataBlockType type = eUserDataBlockTypeBase;
     EXPECT_EQ(block->GetType(type), S_OK);
-    EXPECT_EQ(type, eUserDataBlockType0);
-    // Borrowed: the collection holds the only reference.
-    EXPECT_EQ(ut::test::RefTracker::References(block), 1u);
-
-    CUserDataBlock* again = nullptr;
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType0, &again, false), S_OK);
-    EXPECT_EQ(again, block);
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType0, &again, true), S_OK);
-    EXPECT_EQ(again, block);
-    EXPECT_EQ(ut::test::RefTracker::References(block), 1u);
+    EXPECT_EQ(CUserDataBlock::GetCLSIDFromType(type, clsid), E_UNEXPECTED);
+    EXPECT_TRUE(IsEqualGUID(clsid, GUID_NULL));
 }
 
-TEST_F(UserDataBlocks, RejectBadArgumentsWithoutCreating) {
-    Blocks blocks;
-    CUserDataBlock* block = nullptr;
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType0, nullptr, true), E_POINTER);
+TEST_F(UserDataBlocks, AreCreatedOnRequestAndThenLent) {
+    CUserDataBlock* untouched = reinterpret_cast<CUserDataBlock*>(&block_);
+    block_ = untouched;
+    EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType0, &block_, false), S_FALSE);
+    EXPECT_EQ(block_, untouched);
+    EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType0, &block_, true), S_FALSE);
+    ASSERT_NE(block_, untouched);
+    eUserDataBlockType type = eUserDataBlockTypeBase;
+    EXPECT_EQ(block_->GetType(type), S_OK);
+    EXPECT_EQ(type, eUserDataBlockType0);
+    EXPECT_EQ(ut::test::RefTracker::References(block_), 1u); // the collection's only
+
+    for (bool create : {false, true}) {
+        CUserDataBlock* again = nullptr;
+        EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType0, &again, create), S_OK);
+        EXPECT_EQ(again, block_);
+    }
+    EXPECT_EQ(blocks_.Save(nullptr), S_FALSE);
+    EXPECT_EQ(blocks_.Load(nullptr), S_FALSE);
+}
+
+TEST_F(UserDataBlocks, BadRequestsAndFailedCreationsStoreNothing) {
+    EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType0, nullptr, true), E_POINTER);
     for (LONG type : {2, 5, -1}) {
         ut::test::FaultPlan plan(1); // would fail a creation, were one tried
-        EXPECT_EQ(blocks.GetBlock(Type(type), &block, true), E_UNEXPECTED) << "type " << type;
+        EXPECT_EQ(blocks_.GetBlock(Type(type), &block_, true), E_UNEXPECTED) << "type " << type;
         EXPECT_EQ(plan.Calls(), 0) << "type " << type;
     }
-    EXPECT_EQ(block, nullptr);
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType0, &block, false), S_FALSE);
-}
-
-TEST_F(UserDataBlocks, AFailedCreationStoresNothing) {
-    Blocks blocks;
-    CUserDataBlock* block = nullptr;
     {
         ut::test::FaultPlan plan(1, E_OUTOFMEMORY);
-        EXPECT_EQ(blocks.GetBlock(eUserDataBlockType1, &block, true), E_OUTOFMEMORY);
-        EXPECT_TRUE(plan.Fired());
+        EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType1, &block_, true), E_OUTOFMEMORY);
     }
-    EXPECT_EQ(block, nullptr);
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType1, &block, false), S_FALSE);
-
-    // A type whose class nobody installed: the creation's own error.
-    GWRevokeClassFactory(CLSID_UserDataBlockType1);
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType1, &block, true), REGDB_E_CLASSNOTREG);
-    EXPECT_EQ(block, nullptr);
-    EXPECT_EQ(blocks.GetBlock(eUserDataBlockType1, &block, false), S_FALSE);
+    GWRevokeClassFactory(CLSID_UserDataBlockType0);
+    EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType0, &block_, true), REGDB_E_CLASSNOTREG);
+    EXPECT_EQ(block_, nullptr);
+    EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType0, &block_, false), S_FALSE);
+    EXPECT_EQ(blocks_.GetBlock(eUserDataBlockType1, &block_, false), S_FALSE);
 }
 
 TEST_F(UserDataBlocks, AreReleasedInTypeOrder) {
-    CUserDataBlock* block = nullptr;
+    const std::vector<eUserDataBlockType> typeOrder = {eUserDataBlockType0, eUserDataBlockType1};
     {
         Blocks blocks;
-        ASSERT_EQ(blocks.GetBlock(eUserDataBlockType1, &block, true), S_FALSE);
-        ASSERT_EQ(blocks.GetBlock(eUserDataBlockType0, &block, true), S_FALSE);
-        blocks.Clear();
-        EXPECT_EQ(g_destroyed, (std::vector{eUserDataBlockType0, eUserDataBlockType1}));
-        EXPECT_EQ(blocks.GetBlock(eUserDataBlockType0, &block, false), S_FALSE);
-
-        g_destroyed.clear();
-        ASSERT_EQ(blocks.GetBlock(eUserDataBlockType1, &block, true), S_FALSE);
-        ASSERT_EQ(blocks.GetBlock(eUserDataBlockType0, &block, true), S_FALSE);
+        for (int round = 0; round < 2; ++round) {
+            ASSERT_EQ(blocks.GetBlock(eUserDataBlockType1, &block_, true), S_FALSE);
+            ASSERT_EQ(blocks.GetBlock(eUserDataBlockType0, &block_, true), S_FALSE);
+            if (round == 0) {
+                blocks.Clear();
+                EXPECT_EQ(g_destroyed, typeOrder);
+                g_destroyed.clear();
+            }
+        }
     }
-    EXPECT_EQ(g_destroyed, (std::vector{eUserDataBlockType0, eUserDataBlockType1}));
-}
-
-TEST_F(UserDataBlocks, PersistNothingOfTheirOwn) {
-    Blocks blocks;
-    CUserDataBlock* block = nullptr;
-    ASSERT_EQ(blocks.GetBlock(eUserDataBlockType0, &block, true), S_FALSE);
-    ut::ComPtr<IStream> stream;
-    ASSERT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
-    EXPECT_EQ(blocks.Save(stream.Get()), S_FALSE);
-    EXPECT_EQ(blocks.Load(stream.Get()), S_FALSE);
-    STATSTG stat{};
-    ASSERT_EQ(stream->Stat(&stat, STATFLAG_NONAME), S_OK);
-    EXPECT_EQ(stat.cbSize.QuadPart, 0u);
+    EXPECT_EQ(g_destroyed, typeOrder); // by the destructor
 }
 
 } // namespace
