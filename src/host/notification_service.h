@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include <ut/host/reference_host.h>
 #include <ut/sdk/comobject.h>
 #include <ut/sdk/notify.h>
 
@@ -14,6 +15,9 @@ namespace ut::host {
 
 class NotificationService final : public CGWCOMObject, public IGWNotificationService {
 public:
+    // Nothing in the settings concerns notifications.
+    explicit NotificationService(const Settings&) {}
+
     UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
 

@@ -1,13 +1,36 @@
 #include <ut/host/reference_host.h>
-#include <ut/sdk/objects.h>
 
+#include <new>
+
+#include <ut/sdk/ambient.h>
+#include <ut/sdk/database.h>
+#include <ut/sdk/notify.h>
+#include <ut/sdk/objects.h>
+#include <ut/sdk/version.h>
+
+#include "active_database.h"
+#include "ambient_values.h"
 #include "notification_service.h"
+#include "version_info.h"
 
 namespace ut::host {
+namespace {
 
-ReferenceHost::ReferenceHost(const Settings&) {
-    auto notifications = ComPtr<NotificationService>::Adopt(new NotificationService());
-    InstallService(CLSID_GWNotificationService, static_cast<CGWCOMObject*>(notifications.Get()));
+// A service built from the settings, owned by the returned pointer; null when memory ran out,
+// which InstallService then reports.
+template <class Service>
+ut::ComPtr<IUnknown> NewService(const Settings& settings) {
+    CGWCOMObject* service = new (std::nothrow) Service(settings);
+    return ut::ComPtr<IUnknown>::Adopt(service);
+}
+
+} // namespace
+
+ReferenceHost::ReferenceHost(const Settings& settings) {
+    InstallService(CLSID_GWVersionInfo, NewService<VersionInfo>(settings).Get());
+    InstallService(CLSID_GWAmbientValues, NewService<AmbientValues>(settings).Get());
+    InstallService(CLSID_GWActiveDatabase, NewService<ActiveDatabase>(settings).Get());
+    InstallService(CLSID_GWNotificationService, NewService<NotificationService>(settings).Get());
 }
 
 ReferenceHost::~ReferenceHost() {

@@ -8,10 +8,11 @@
 namespace ut::module {
 namespace {
 
-// Built on first use: the load step may run before this library's static initialisers.
+// Built on first use, because the load step may run before this library's static initialisers,
+// and never destroyed, because the unload step runs after them.
 State& MutableState() {
-    static State state;
-    return state;
+    static State* state = new State;
+    return *state;
 }
 
 constexpr int kRegistryKeyCapacity = 260;

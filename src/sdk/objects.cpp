@@ -45,14 +45,16 @@ private:
     std::map<CLSID, ut::ComPtr<Interface>, ut::GuidLess> entries_;
 };
 
+// The registries are never destroyed: modules still revoke and query them while the process
+// exits, after function-local statics are gone.
 Registry<IUnknown>& GenericObjects() {
-    static Registry<IUnknown> registry;
-    return registry;
+    static Registry<IUnknown>* registry = new Registry<IUnknown>;
+    return *registry;
 }
 
 Registry<IClassFactory>& ClassFactories() {
-    static Registry<IClassFactory> registry;
-    return registry;
+    static Registry<IClassFactory>* registry = new Registry<IClassFactory>;
+    return *registry;
 }
 
 struct FaultState {
@@ -61,8 +63,8 @@ struct FaultState {
 };
 
 FaultState& Faults() {
-    static FaultState state;
-    return state;
+    static FaultState* state = new FaultState;
+    return *state;
 }
 
 class ObjectFactory final : public CGWCOMObject, public IClassFactory {

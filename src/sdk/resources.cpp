@@ -24,9 +24,10 @@ struct Dictionaries {
     std::map<std::wstring, HINSTANCE> byName;
 };
 
+// Never destroyed: modules unregister their dictionaries while the process exits.
 Dictionaries& AllDictionaries() {
-    static Dictionaries dictionaries;
-    return dictionaries;
+    static Dictionaries* dictionaries = new Dictionaries;
+    return *dictionaries;
 }
 
 } // namespace

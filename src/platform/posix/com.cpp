@@ -61,9 +61,10 @@ struct ClassTable {
     DWORD nextCookie = 1;
 };
 
+// Never destroyed, like the registries above it: modules revoke classes while the process exits.
 ClassTable& Classes() {
-    static ClassTable table;
-    return table;
+    static ClassTable* table = new ClassTable;
+    return *table;
 }
 
 // Finds the factory registered for clsid and returns it with a new reference.
