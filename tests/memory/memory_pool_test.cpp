@@ -48,6 +48,11 @@ struct ReleaseCase {
     std::size_t capacity;
 };
 
+// Rows print as their description (gtest would otherwise dump their padding bytes).
+void PrintTo(const ReleaseCase& row, std::ostream* out) {
+    *out << row.what;
+}
+
 class ReleaseRules : public testing::TestWithParam<ReleaseCase> {};
 
 TEST_P(ReleaseRules, KeepBlocksByTheirLastSizeAndFreeLargeOnes) {
@@ -195,6 +200,10 @@ struct StateChangeCase {
     bool purges;
     bool unregisters;
 };
+
+void PrintTo(const StateChangeCase& row, std::ostream* out) {
+    *out << row.what;
+}
 
 class StateChanges : public PoolWithMockService, public testing::WithParamInterface<StateChangeCase> {};
 
