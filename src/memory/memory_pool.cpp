@@ -29,6 +29,11 @@ ULONG RoundUp(ULONG size) {
     return (size + kGranule - 1) & ~(kGranule - 1);
 }
 
+// A zero request is served as the smallest class, so that its block can be handed out again.
+ULONG Request(LONG size) {
+    return size == 0 ? kGranule : static_cast<ULONG>(size);
+}
+
 ULONG SizeClass(ULONG size) {
     return size == 0 ? 0 : (size - 1) / kGranule;
 }
@@ -138,7 +143,7 @@ CMemoryPool::~CMemoryPool() {
 
 void* CMemoryPool::Allocate(LONG size) {
     // The pooled path (registered, and a block of the class is kept) makes no call at all.
-    ULONG request = size == 0 ? kGranule : static_cast<ULONG>(size);
+    ULONG request = Request(size);
     ULONG sizeClass = SizeClass(request);
     if (sizeClass >= kSizeClasses || !Notifier || !FreeLists[sizeClass]) [[unlikely]]
         return AllocateSlowPath(size);
@@ -149,7 +154,7 @@ void* CMemoryPool::AllocateSlowPath(LONG size) {
     if (size < 0)
         return nullptr;
     Register();
-    ULONG request = size == 0 ? kGranule : static_cast<ULONG>(size);
+    ULONG request = Request(size);
     ULONG sizeClass = SizeClass(request);
     if (sizeClass < kSizeClasses && FreeLists[sizeClass])
         return HandOut(InUse, TakeFirst(FreeLists[sizeClass], request));
