@@ -99,13 +99,17 @@ void Churn(benchmark::State& state) {
     state.SetItemsProcessed(state.iterations() * 2);
 }
 
-template <class Allocator>
-void RegisterFor() {
-    std::string name = Allocator::kName;
-    benchmark::RegisterBenchmark(("pair/" + name).c_str(), AllocateFreePair<Allocator>)
-        ->RangeMultiplier(4)
-        ->Range(16, 4096);
-    benchmark::RegisterBenchmark(("churn/" + name).c_str(), Churn<Allocator>);
+// Scenario by scenario, the three allocators one after the other, so that a busy machine slows
+// the runs that are compared with each other alike.
+template <class... Allocators>
+void RegisterSideBySide() {
+    for (int size = 16; size <= 4096; size *= 4)
+        (benchmark::RegisterBenchmark((std::string("pair/") + Allocators::kName).c_str(),
+                                      AllocateFreePair<Allocators>)
+             ->Arg(size),
+         ...);
+    (benchmark::RegisterBenchmark((std::string("churn/") + Allocators::kName).c_str(), Churn<Allocators>),
+     ...);
 }
 
 // The console output, followed by the pool's rate against each other allocator per scenario.
@@ -181,9 +185,7 @@ int main(int argc, char** argv) {
     // With the host's notification service installed the pool registers once, as in the
     // application; without it every allocation would ask the host again.
     ut::host::ReferenceHost host;
-    RegisterFor<PoolAllocator>();
-    RegisterFor<GlibcAllocator>();
-    RegisterFor<MimallocAllocator>();
+    RegisterSideBySide<PoolAllocator, GlibcAllocator, MimallocAllocator>();
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv))
         return 1;
