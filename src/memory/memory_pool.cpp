@@ -34,8 +34,9 @@ ULONG Request(LONG size) {
     return size == 0 ? kGranule : static_cast<ULONG>(size);
 }
 
+// Sizes from 1 on: requests go through Request, and a block in use never has a size of 0.
 ULONG SizeClass(ULONG size) {
-    return size == 0 ? 0 : (size - 1) / kGranule;
+    return (size - 1) / kGranule;
 }
 
 std::byte* BlockStart(void* data) {
