@@ -2,4 +2,5 @@
 #pragma once
 
 #include <ut/export.h>
+#include <ut/memory.h>
 #include <ut/persist.h>

@@ -4,11 +4,13 @@
 
 #include <ut/sdk/ambient.h>
 #include <ut/sdk/database.h>
+#include <ut/sdk/notify.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/version.h>
 
 #include "active_database.h"
 #include "ambient_values.h"
+#include "notification_service.h"
 #include "version_info.h"
 
 namespace ut::host {
@@ -28,6 +30,7 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWVersionInfo, NewService<VersionInfo>(settings).Get());
     InstallService(CLSID_GWAmbientValues, NewService<AmbientValues>(settings).Get());
     InstallService(CLSID_GWActiveDatabase, NewService<ActiveDatabase>(settings).Get());
+    InstallService(CLSID_GWNotificationService, NewService<NotificationService>(settings).Get());
 }
 
 ReferenceHost::~ReferenceHost() {

@@ -1,0 +1,196 @@
+// CMemoryPool side by side with glibc malloc/free and mimalloc, in one run:
+//   pair/<allocator>/<size>  allocate and free one block of a fixed size
+//   churn/<allocator>        free a random one of 4096 live blocks and allocate a new one of a
+//                            random size 1..4096 in its place
+// Operations are single calls (an allocation or a free). After the runs a table gives the pool's
+// rate against each of the others.
+#include <cstdlib>
+#include <iomanip>
+#include <map>
+#include <random>
+#include <string>
+#include <vector>
+
+#include <benchmark/benchmark.h>
+#include <mimalloc.h>
+
+#include <ut/host/reference_host.h>
+#include <ut/memory.h>
+
+namespace {
+
+struct PoolAllocator {
+    static constexpr const char* kName = "pool";
+    void* Allocate(std::size_t size) { return pool.Allocate(static_cast<LONG>(size)); }
+    void Free(void* block) { pool.Deallocate(block); }
+    CMemoryPool pool;
+};
+
+struct GlibcAllocator {
+    static constexpr const char* kName = "glibc";
+    void* Allocate(std::size_t size) { return std::malloc(size); }
+    void Free(void* block) { std::free(block); }
+};
+
+struct MimallocAllocator {
+    static constexpr const char* kName = "mimalloc";
+    void* Allocate(std::size_t size) { return mi_malloc(size); }
+    void Free(void* block) { mi_free(block); }
+};
+
+// Touches the block as a caller would, so that no allocator gets away with handing out memory
+// it never brings into the cache.
+void* Use(void* block) {
+    *static_cast<volatile char*>(block) = 1;
+    return block;
+}
+
+template <class Allocator>
+void AllocateFreePair(benchmark::State& state) {
+    Allocator allocator;
+    auto size = static_cast<std::size_t>(state.range(0));
+    for (auto _ : state) {
+        void* block = Use(allocator.Allocate(size));
+        benchmark::DoNotOptimize(block);
+        allocator.Free(block);
+    }
+    state.SetItemsProcessed(state.iterations() * 2);
+}
+
+constexpr std::size_t kLiveBlocks = 4096;
+constexpr std::size_t kPlannedSteps = 1 << 16;
+
+// The same random steps for every allocator: which live block goes, and the size of its successor.
+struct ChurnPlan {
+    std::vector<std::size_t> slots;
+    std::vector<std::size_t> sizes;
+};
+
+const ChurnPlan& Plan() {
+    static const ChurnPlan plan = [] {
+        std::mt19937 random(42);
+        std::uniform_int_distribution<std::size_t> slot(0, kLiveBlocks - 1), size(1, 4096);
+        ChurnPlan made;
+        for (std::size_t i = 0; i < kPlannedSteps; ++i) {
+            made.slots.push_back(slot(random));
+            made.sizes.push_back(size(random));
+        }
+        return made;
+    }();
+    return plan;
+}
+
+template <class Allocator>
+void Churn(benchmark::State& state) {
+    Allocator allocator;
+    const ChurnPlan& plan = Plan();
+    std::vector<void*> live(kLiveBlocks);
+    for (std::size_t i = 0; i < kLiveBlocks; ++i)
+        live[i] = Use(allocator.Allocate(plan.sizes[kPlannedSteps - 1 - i]));
+    std::size_t step = 0;
+    for (auto _ : state) {
+        void*& slot = live[plan.slots[step]];
+        allocator.Free(slot);
+        slot = Use(allocator.Allocate(plan.sizes[step]));
+        step = (step + 1) % kPlannedSteps;
+    }
+    for (void* block : live)
+        allocator.Free(block);
+    state.SetItemsProcessed(state.iterations() * 2);
+}
+
+// Scenario by scenario, the three allocators one after the other, so that a busy machine slows
+// the runs that are compared with each other alike.
+template <class... Allocators>
+void RegisterSideBySide() {
+    for (int size = 16; size <= 4096; size *= 4)
+        (benchmark::RegisterBenchmark((std::string("pair/") + Allocators::kName).c_str(),
+                                      AllocateFreePair<Allocators>)
+             ->Arg(size),
+         ...);
+    (benchmark::RegisterBenchmark((std::string("churn/") + Allocators::kName).c_str(), Churn<Allocators>),
+     ...);
+}
+
+// The console output, followed by the pool's rate against each other allocator per scenario.
+class RatioReporter : public benchmark::ConsoleReporter {
+public:
+    RatioReporter() : ConsoleReporter(OO_Tabular) {}
+
+    void ReportRuns(const std::vector<Run>& runs) override {
+        ConsoleReporter::ReportRuns(runs);
+        for (const Run& run : runs) {
+            auto rate = run.counters.find("items_per_second");
+            if (run.run_type != Run::RT_Iteration || run.error_occurred || rate == run.counters.end())
+                continue;
+            Record(run.benchmark_name(), rate->second.value);
+        }
+    }
+
+    void Finalize() override {
+        ConsoleReporter::Finalize();
+        std::ostream& out = GetOutputStream();
+        out << "\nmillions of operations per second, and the pool's rate against the others\n"
+            << std::left << std::setw(12) << "scenario" << std::right;
+        for (const char* column : {"pool", "glibc", "mimalloc", "vs glibc", "vs mimalloc"})
+            out << std::setw(13) << column;
+        out << "\n" << std::fixed << std::setprecision(1);
+        for (auto& [scenario, rates] : rates_) {
+            out << std::left << std::setw(12) << scenario << std::right;
+            for (const char* allocator : {"pool", "glibc", "mimalloc"})
+                out << std::setw(13) << Mean(rates, allocator) / 1e6;
+            out << std::setprecision(2) << std::setw(12) << Ratio(rates, "glibc") << "x" << std::setw(12)
+                << Ratio(rates, "mimalloc") << "x\n"
+                << std::setprecision(1);
+        }
+    }
+
+private:
+    struct Sum {
+        double total = 0;
+        int count = 0;
+    };
+    using Rates = std::map<std::string, Sum>;
+
+    // "pair/glibc/64" is allocator "glibc" in scenario "pair/64".
+    void Record(const std::string& name, double rate) {
+        std::size_t first = name.find('/');
+        std::size_t second = name.find('/', first + 1);
+        std::string allocator = name.substr(first + 1, second - first - 1);
+        std::string scenario =
+            name.substr(0, first) + (second == std::string::npos ? "" : name.substr(second));
+        Sum& sum = rates_[scenario][allocator];
+        sum.total += rate;
+        ++sum.count;
+    }
+
+    static double Mean(const Rates& rates, const std::string& allocator) {
+        auto found = rates.find(allocator);
+        return found == rates.end() || found->second.count == 0 ? 0
+                                                                : found->second.total / found->second.count;
+    }
+
+    static double Ratio(const Rates& rates, const std::string& other) {
+        double rate = Mean(rates, other);
+        return rate == 0 ? 0 : Mean(rates, "pool") / rate;
+    }
+
+    std::map<std::string, Rates> rates_;
+};
+
+} // namespace
+
+// Our own main (it takes precedence over benchmark_main's): the ratio table needs its reporter.
+int main(int argc, char** argv) {
+    // With the host's notification service installed the pool registers once, as in the
+    // application; without it every allocation would ask the host again.
+    ut::host::ReferenceHost host;
+    RegisterSideBySide<PoolAllocator, GlibcAllocator, MimallocAllocator>();
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv))
+        return 1;
+    RatioReporter reporter;
+    benchmark::RunSpecifiedBenchmarks(&reporter);
+    benchmark::Shutdown();
+    return 0;
+}

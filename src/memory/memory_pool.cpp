@@ -1,0 +1,268 @@
+#include <cstdlib>
+#include <cwchar>
+#include <memory>
+
+#include <ut/memory.h>
+#include <ut/sdk/objects.h>
+
+struct CMemoryPool::Descriptor {
+    // The caller's part of the block.
+    void* Data;
+    // Usable bytes, a multiple of 16.
+    ULONG Capacity;
+    // The size last asked for; 0 while the block is kept.
+    ULONG Size;
+    Descriptor* Prev;
+    Descriptor* Next;
+};
+
+namespace ut::memory {
+namespace {
+
+using Descriptor = CMemoryPool::Descriptor;
+
+constexpr ULONG kGranule = 16;
+// Two pointer-sized words: the descriptor, and a reserved one.
+constexpr std::size_t kHeaderBytes = 2 * sizeof(void*);
+
+ULONG RoundUp(ULONG size) {
+    return (size + kGranule - 1) & ~(kGranule - 1);
+}
+
+// A zero request is served as the smallest class, so that its block can be handed out again.
+ULONG Request(LONG size) {
+    return size == 0 ? kGranule : static_cast<ULONG>(size);
+}
+
+// Sizes from 1 on: requests go through Request, and a block in use never has a size of 0.
+ULONG SizeClass(ULONG size) {
+    return (size - 1) / kGranule;
+}
+
+std::byte* BlockStart(void* data) {
+    return static_cast<std::byte*>(data) - kHeaderBytes;
+}
+
+Descriptor* DescriptorOf(void* data) {
+    return *reinterpret_cast<Descriptor**>(BlockStart(data));
+}
+
+// Writes the header of a block (new or moved) and points its descriptor at the caller's part.
+void Attach(Descriptor* descriptor, void* block) {
+    *static_cast<Descriptor**>(block) = descriptor;
+    descriptor->Data = static_cast<std::byte*>(block) + kHeaderBytes;
+}
+
+// The list helpers read every link before writing any: the links may alias the head.
+void PushFront(Descriptor*& head, Descriptor* descriptor) {
+    Descriptor* first = head;
+    descriptor->Prev = nullptr;
+    descriptor->Next = first;
+    if (first)
+        first->Prev = descriptor;
+    head = descriptor;
+}
+
+void Unlink(Descriptor*& head, Descriptor* descriptor) {
+    Descriptor* prev = descriptor->Prev;
+    Descriptor* next = descriptor->Next;
+    if (prev)
+        prev->Next = next;
+    else
+        head = next;
+    if (next)
+        next->Prev = prev;
+}
+
+// Takes the first kept block off its free list for a request of its class.
+Descriptor* TakeFirst(Descriptor*& freeList, ULONG request) {
+    Descriptor* descriptor = freeList;
+    Descriptor* next = descriptor->Next;
+    freeList = next;
+    if (next)
+        next->Prev = nullptr;
+    descriptor->Size = request;
+    return descriptor;
+}
+
+// Puts a block on the in-use list and answers the caller's pointer.
+void* HandOut(Descriptor*& inUse, Descriptor* descriptor) {
+    PushFront(inUse, descriptor);
+    return descriptor->Data;
+}
+
+[[gnu::noinline]] void FreeBlock(Descriptor* descriptor) {
+    std::free(BlockStart(descriptor->Data));
+    std::free(descriptor);
+}
+
+// Frees every block of a list and empties it.
+void FreeList(Descriptor*& head) {
+    while (Descriptor* descriptor = head) {
+        head = descriptor->Next;
+        FreeBlock(descriptor);
+    }
+}
+
+struct FreeDeleter {
+    void operator()(void* memory) const noexcept { std::free(memory); }
+};
+
+// A descriptor with a block of `size` bytes rounded up to the granule, or null. Its links are set
+// when it is put on a list. Kept out of line so that the pooled path needs no stack frame.
+[[gnu::noinline]] Descriptor* NewBlock(ULONG size) {
+    std::unique_ptr<Descriptor, FreeDeleter> descriptor(
+        static_cast<Descriptor*>(std::malloc(sizeof(Descriptor))));
+    if (!descriptor)
+        return nullptr;
+    ULONG capacity = RoundUp(size);
+    void* block = std::malloc(kHeaderBytes + capacity);
+    if (!block)
+        return nullptr;
+    Attach(descriptor.get(), block);
+    descriptor->Capacity = capacity;
+    descriptor->Size = size;
+    return descriptor.release();
+}
+
+bool IsStateChange(const wchar_t* name, ULONG kind) {
+    return kind == ut::sdk::kStateChangeKind && name && std::wcscmp(name, ut::sdk::kAppStateChange) == 0;
+}
+
+} // namespace
+} // namespace ut::memory
+
+using namespace ut::memory;
+
+CMemoryPool::CMemoryPool() = default;
+
+CMemoryPool::~CMemoryPool() {
+    Purge();
+    FreeList(InUse);
+    Unregister();
+}
+
+void* CMemoryPool::Allocate(LONG size) {
+    // The pooled path (registered, and a block of the class is kept) makes no call at all.
+    ULONG request = Request(size);
+    ULONG sizeClass = SizeClass(request);
+    if (sizeClass >= kSizeClasses || !Notifier || !FreeLists[sizeClass]) [[unlikely]]
+        return AllocateSlowPath(size);
+    return HandOut(InUse, TakeFirst(FreeLists[sizeClass], request));
+}
+
+void* CMemoryPool::AllocateSlowPath(LONG size) {
+    if (size < 0)
+        return nullptr;
+    Register();
+    ULONG request = Request(size);
+    ULONG sizeClass = SizeClass(request);
+    if (sizeClass < kSizeClasses && FreeLists[sizeClass])
+        return HandOut(InUse, TakeFirst(FreeLists[sizeClass], request));
+    Descriptor* descriptor = NewBlock(request);
+    return descriptor ? HandOut(InUse, descriptor) : nullptr;
+}
+
+void* CMemoryPool::Reallocate(void* p, LONG size) {
+    if (!p)
+        return Allocate(size == 0 ? 1 : size);
+    if (size == 0) {
+        Deallocate(p);
+        return nullptr;
+    }
+    if (size < 0)
+        return nullptr;
+    Descriptor* descriptor = DescriptorOf(p);
+    ULONG request = static_cast<ULONG>(size);
+    if (request > descriptor->Capacity) {
+        ULONG capacity = RoundUp(request);
+        void* block = std::realloc(BlockStart(p), kHeaderBytes + capacity);
+        if (!block)
+            return nullptr;
+        Attach(descriptor, block);
+        descriptor->Capacity = capacity;
+    }
+    descriptor->Size = request;
+    return descriptor->Data;
+}
+
+void CMemoryPool::Deallocate(void* p) {
+    if (!p)
+        return;
+    Descriptor* descriptor = DescriptorOf(p);
+    Unlink(InUse, descriptor);
+    if (descriptor->Capacity > static_cast<ULONG>(kLargestPooled)) {
+        FreeBlock(descriptor);
+        return;
+    }
+    // The class of the last size asked for, not of the capacity: a block grown in place to a
+    // small size waits on that size's list.
+    PushFront(FreeLists[SizeClass(descriptor->Size)], descriptor);
+    descriptor->Size = 0;
+}
+
+void CMemoryPool::Purge() {
+    for (Descriptor*& head : FreeLists)
+        FreeList(head);
+}
+
+void CMemoryPool::Diagnostics() {
+    InUseBytes = 0;
+    InUseCount = 0;
+    for (const Descriptor* descriptor = InUse; descriptor; descriptor = descriptor->Next) {
+        InUseBytes += descriptor->Capacity;
+        ++InUseCount;
+    }
+    TotalFreeBytes = 0;
+    TotalFreeCount = 0;
+    for (int sizeClass = 0; sizeClass < kSizeClasses; ++sizeClass) {
+        FreeBytes[sizeClass] = 0;
+        FreeCounts[sizeClass] = 0;
+        for (const Descriptor* descriptor = FreeLists[sizeClass]; descriptor; descriptor = descriptor->Next) {
+            FreeBytes[sizeClass] += descriptor->Capacity;
+            ++FreeCounts[sizeClass];
+        }
+        TotalFreeBytes += FreeBytes[sizeClass];
+        TotalFreeCount += FreeCounts[sizeClass];
+    }
+}
+
+void CMemoryPool::Register() {
+    if (Notifier)
+        return;
+    ut::ComPtr<IGWNotificationService> service;
+    if (FAILED(
+            GWQueryGenericObject(CLSID_GWNotificationService, IID_IGWNotificationService, service.PutVoid())))
+        return;
+    if (FAILED(service->Advise(ut::sdk::kAppStateChange, this)))
+        return;
+    Notifier = std::move(service);
+}
+
+void CMemoryPool::Unregister() {
+    // Cleared before the call, so that a notification arriving meanwhile finds the pool withdrawn.
+    ut::ComPtr<IGWNotificationService> service = std::move(Notifier);
+    if (service)
+        service->Unadvise(ut::sdk::kAppStateChange, this);
+}
+
+ULONG CMemoryPool::AddRef() {
+    return 1;
+}
+
+ULONG CMemoryPool::Release() {
+    return 1;
+}
+
+HRESULT CMemoryPool::QueryInterface(REFIID iid, void**) {
+    return IsEqualGUID(iid, IID_IUnknown) || IsEqualGUID(iid, IID_IGwNotifySink) ? S_OK : E_NOINTERFACE;
+}
+
+HRESULT CMemoryPool::PropertyChanged(const wchar_t* name, ULONG kind, const VARIANT* value, int) {
+    if (!IsStateChange(name, kind))
+        return S_OK;
+    Purge();
+    if (ut::sdk::NotificationState(value) == ut::sdk::kAppStateTerminate)
+        Unregister();
+    return S_OK;
+}
