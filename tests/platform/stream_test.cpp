@@ -33,7 +33,9 @@ std::string ReadAll(IStream* stream) {
     return out;
 }
 
-std::wstring TempPath(const wchar_t* name) { return (std::filesystem::temp_directory_path() / name).wstring(); }
+std::wstring TempPath(const wchar_t* name) {
+    return (std::filesystem::temp_directory_path() / name).wstring();
+}
 
 enum class Kind { Memory, File };
 
@@ -45,7 +47,8 @@ protected:
             return;
         }
         path_ = TempPath(L"ut_stream_test.bin");
-        ASSERT_EQ(ut::platform::OpenFileStream(path_.c_str(), STGM_READWRITE | STGM_CREATE, stream_.Put()), S_OK);
+        ASSERT_EQ(ut::platform::OpenFileStream(path_.c_str(), STGM_READWRITE | STGM_CREATE, stream_.Put()),
+                  S_OK);
     }
     void TearDown() override {
         stream_.Reset();
@@ -75,24 +78,46 @@ TEST_P(StreamTest, WritesReadsAndSeeks) {
     EXPECT_EQ(Position(stream_.Get()), 0u);
 }
 
-TEST_P(StreamTest, ReadingAtTheEndGivesNothingAndSucceeds) {
+// The system's file stream answers S_FALSE here; both homes answer S_OK.
+TEST_P(StreamTest, ReadingUpToTheEndSucceeds) {
     ASSERT_EQ(stream_->Write("abc", 3, nullptr), S_OK);
     char buffer[8];
     ULONG got = 99;
     EXPECT_EQ(stream_->Read(buffer, sizeof buffer, &got), S_OK);
     EXPECT_EQ(got, 0u);
+    ASSERT_EQ(stream_->Seek(Offset(1), STREAM_SEEK_SET, nullptr), S_OK);
+    EXPECT_EQ(stream_->Read(buffer, sizeof buffer, &got), S_OK);
+    EXPECT_EQ(got, 2u);
 }
 
-TEST_P(StreamTest, SeekingBeforeTheStartFailsAndKeepsThePosition) {
+TEST_P(StreamTest, RefusedSeeksKeepThePosition) {
     ASSERT_EQ(stream_->Write("abc", 3, nullptr), S_OK);
-    EXPECT_TRUE(FAILED(stream_->Seek(Offset(-4), STREAM_SEEK_CUR, nullptr)));
+    EXPECT_EQ(stream_->Seek(Offset(-4), STREAM_SEEK_CUR, nullptr), STG_E_INVALIDFUNCTION);
+    EXPECT_EQ(stream_->Seek(Offset(-1), STREAM_SEEK_SET, nullptr), STG_E_INVALIDFUNCTION);
+    EXPECT_EQ(stream_->Seek(Offset(0), 7, nullptr), STG_E_INVALIDFUNCTION);
     EXPECT_EQ(Position(stream_.Get()), 3u);
 }
 
-TEST_P(StreamTest, WritingPastTheEndFillsTheGapWithZeros) {
+// The system's memory stream grows its block without clearing it.
+TEST_P(StreamTest, GrowingPastTheEndFillsTheGapWithZeros) {
     ASSERT_EQ(stream_->Seek(Offset(4), STREAM_SEEK_SET, nullptr), S_OK);
     ASSERT_EQ(stream_->Write("x", 1, nullptr), S_OK);
     EXPECT_EQ(ReadAll(stream_.Get()), std::string("\0\0\0\0x", 5));
+
+    ULARGE_INTEGER size{};
+    size.QuadPart = 5000;
+    ASSERT_EQ(stream_->Write("y", 1, nullptr), S_OK);
+    ASSERT_EQ(stream_->SetSize(size), S_OK);
+    EXPECT_EQ(Position(stream_.Get()), 6u);
+    EXPECT_EQ(ReadAll(stream_.Get()), std::string("\0\0\0\0xy", 6) + std::string(4994, '\0'));
+}
+
+TEST_P(StreamTest, NullPointersAreRefused) {
+    ULONG count = 0;
+    EXPECT_EQ(stream_->Read(nullptr, 1, &count), STG_E_INVALIDPOINTER);
+    EXPECT_EQ(stream_->Write(nullptr, 1, &count), STG_E_INVALIDPOINTER);
+    EXPECT_EQ(stream_->Stat(nullptr, STATFLAG_NONAME), STG_E_INVALIDPOINTER);
+    EXPECT_EQ(stream_->Clone(nullptr), STG_E_INVALIDPOINTER);
 }
 
 TEST_P(StreamTest, SetSizeTruncatesAndStatReportsTheSize) {
@@ -156,10 +181,55 @@ TEST(FileStream, KeepsItsBytesAcrossOpensAndReportsItsName) {
     std::filesystem::remove(path);
 }
 
+// The system wraps a memory stream's position at 4 GiB instead of refusing it.
+TEST(MemoryStream, RefusesPositionsPastFourGibibytes) {
+    ComPtr<IStream> stream;
+    ASSERT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
+    ASSERT_EQ(stream->Seek(Offset(0xFFFFFFFFll), STREAM_SEEK_SET, nullptr), S_OK);
+    EXPECT_EQ(stream->Seek(Offset(0x100000000ll), STREAM_SEEK_SET, nullptr), STG_E_INVALIDFUNCTION);
+    EXPECT_EQ(Position(stream.Get()), 0xFFFFFFFFull);
+    EXPECT_EQ(stream->Write("x", 1, nullptr), STG_E_MEDIUMFULL);
+}
+
+TEST(FileStream, AccessFollowsTheMode) {
+    std::wstring path = TempPath(L"ut_stream_access.bin");
+    char byte = 0;
+    ULONG count = 0;
+    {
+        ComPtr<IStream> created;
+        ASSERT_EQ(ut::platform::OpenFileStream(path.c_str(), STGM_READ | STGM_CREATE, created.Put()), S_OK);
+        EXPECT_EQ(created->Write("x", 1, &count), STG_E_ACCESSDENIED);
+        ULARGE_INTEGER size{};
+        EXPECT_EQ(created->SetSize(size), STG_E_ACCESSDENIED);
+    }
+    {
+        ComPtr<IStream> writeOnly;
+        ASSERT_EQ(ut::platform::OpenFileStream(path.c_str(), STGM_WRITE, writeOnly.Put()), S_OK);
+        EXPECT_EQ(writeOnly->Read(&byte, 1, &count), STG_E_ACCESSDENIED);
+        STATSTG stat{};
+        ASSERT_EQ(writeOnly->Stat(&stat, STATFLAG_NONAME), S_OK);
+        EXPECT_EQ(stat.grfMode, static_cast<DWORD>(STGM_WRITE));
+    }
+    std::filesystem::remove(path);
+}
+
+TEST(FileStream, RefusesBadArgumentsAndFolders) {
+    ComPtr<IStream> stream;
+    std::wstring folder = std::filesystem::temp_directory_path().wstring();
+    EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), STGM_READ, stream.Put()), STG_E_ACCESSDENIED);
+    EXPECT_EQ(ut::platform::OpenFileStream(L"", STGM_READ, stream.Put()), STG_E_INVALIDNAME);
+    EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), 3, stream.Put()), STG_E_INVALIDFLAG);
+    EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), STGM_READ, nullptr), E_POINTER);
+    EXPECT_FALSE(stream);
+}
+
 TEST(FileStream, MissingFileIsNotFound) {
     ComPtr<IStream> stream;
     std::wstring path = TempPath(L"ut_no_such_file.bin");
     EXPECT_EQ(ut::platform::OpenFileStream(path.c_str(), STGM_READ, stream.Put()), STG_E_FILENOTFOUND);
+    path = TempPath(L"ut_no_such_folder") + L"/file.bin";
+    EXPECT_EQ(ut::platform::OpenFileStream(path.c_str(), STGM_READWRITE | STGM_CREATE, stream.Put()),
+              STG_E_FILENOTFOUND);
     EXPECT_FALSE(stream);
 }
 

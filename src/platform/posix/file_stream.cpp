@@ -8,7 +8,7 @@
 
 #include <ut/platform/text.h>
 
-#include "stream_base.h"
+#include "common/stream_base.h"
 
 namespace ut::platform::posix {
 namespace {
@@ -41,6 +41,8 @@ public:
             *read = 0;
         if (!buffer && count)
             return STG_E_INVALIDPOINTER;
+        if (!CanRead(mode_))
+            return STG_E_ACCESSDENIED;
         ULONG done = 0;
         while (done < count) {
             ssize_t got = ::pread(fd_, static_cast<char*>(buffer) + done, count - done,
@@ -61,6 +63,9 @@ public:
             *written = 0;
         if (!buffer && count)
             return STG_E_INVALIDPOINTER;
+        // A file created for reading is open for writing underneath, so that it can be truncated.
+        if (!CanWrite(mode_))
+            return STG_E_ACCESSDENIED;
         ULONG done = 0;
         while (done < count) {
             ssize_t put = ::pwrite(fd_, static_cast<const char*>(buffer) + done, count - done,
@@ -96,6 +101,8 @@ public:
     }
 
     HRESULT STDMETHODCALLTYPE SetSize(ULARGE_INTEGER size) override {
+        if (!CanWrite(mode_))
+            return STG_E_ACCESSDENIED;
         if (::ftruncate(fd_, static_cast<off_t>(size.QuadPart)) != 0)
             return FromErrno(errno, STG_E_WRITEFAULT);
         return S_OK;
@@ -110,8 +117,9 @@ public:
 
     // The system's file streams cannot be cloned either.
     HRESULT STDMETHODCALLTYPE Clone(IStream** clone) override {
-        if (clone)
-            *clone = nullptr;
+        if (!clone)
+            return STG_E_INVALIDPOINTER;
+        *clone = nullptr;
         return E_NOTIMPL;
     }
 
@@ -163,19 +171,20 @@ int OpenFlags(DWORD mode) {
 namespace ut::platform {
 
 HRESULT OpenFileStream(const wchar_t* path, DWORD mode, IStream** stream) {
-    if (!stream)
-        return E_POINTER;
-    *stream = nullptr;
-    if (!path || !*path)
-        return STG_E_INVALIDNAME;
-    if ((mode & 3) == 3)
-        return STG_E_INVALIDFLAG;
+    if (HRESULT hr = CheckFileStreamArguments(path, mode, stream); FAILED(hr))
+        return hr;
     int flags = posix::OpenFlags(mode);
     if ((mode & STGM_CREATE) && (mode & 3) == STGM_READ)
         flags = (flags & ~O_ACCMODE) | O_RDWR;
     int fd = ::open(Utf8FromWide(path).c_str(), flags, 0666);
     if (fd < 0)
         return posix::FromErrno(errno, STG_E_ACCESSDENIED);
+    // A folder opens for reading here but not on Windows: refuse it on both homes.
+    struct stat info {};
+    if (::fstat(fd, &info) == 0 && S_ISDIR(info.st_mode)) {
+        ::close(fd);
+        return STG_E_ACCESSDENIED;
+    }
     *stream = new (std::nothrow) posix::FileStream(fd, path, mode);
     if (!*stream) {
         ::close(fd);

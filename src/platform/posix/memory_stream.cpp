@@ -4,7 +4,7 @@
 #include <new>
 #include <vector>
 
-#include "stream_base.h"
+#include "common/stream_base.h"
 
 namespace ut::platform::posix {
 namespace {
@@ -38,7 +38,7 @@ public:
         if (count == 0)
             return S_OK;
         ULONGLONG end = position_ + count;
-        if (end > kMaxSize)
+        if (end > kMaxMemorySize)
             return STG_E_MEDIUMFULL;
         if (end > bytes_->size() && !Grow(end))
             return STG_E_INSUFFICIENTMEMORY;
@@ -51,7 +51,7 @@ public:
 
     HRESULT STDMETHODCALLTYPE Seek(LARGE_INTEGER move, DWORD origin, ULARGE_INTEGER* position) override {
         ULONGLONG target = 0;
-        if (!NewPosition(move, origin, position_, bytes_->size(), target) || target > kMaxSize)
+        if (!NewPosition(move, origin, position_, bytes_->size(), target) || target > kMaxMemorySize)
             return STG_E_INVALIDFUNCTION;
         position_ = target;
         if (position)
@@ -60,7 +60,7 @@ public:
     }
 
     HRESULT STDMETHODCALLTYPE SetSize(ULARGE_INTEGER size) override {
-        if (size.QuadPart > kMaxSize)
+        if (size.QuadPart > kMaxMemorySize)
             return STG_E_MEDIUMFULL;
         try {
             bytes_->resize(size.QuadPart);
@@ -82,9 +82,6 @@ public:
     }
 
 private:
-    // A memory stream holds at most what a 32-bit length can count, like the system's.
-    static constexpr ULONGLONG kMaxSize = 0xFFFFFFFFull;
-
     bool Grow(ULONGLONG end) {
         try {
             if (end > bytes_->capacity())

@@ -1,13 +1,16 @@
-#include <cstdio>
 #include <cstdlib>
 #include <dlfcn.h>
 
 #include <ut/platform/process.h>
 #include <ut/platform/text.h>
 
+#include "common/error_output.h"
+
 namespace ut::platform {
 
-bool HasEnvironmentVariable(const char* name) { return name && std::getenv(name) != nullptr; }
+bool HasEnvironmentVariable(const char* name) {
+    return name && std::getenv(name) != nullptr;
+}
 
 HINSTANCE ModuleOf(const void* address) {
     Dl_info info{};
@@ -24,9 +27,7 @@ std::wstring ModuleFileName(HINSTANCE module) {
 }
 
 void ReportError(const std::wstring& line) {
-    std::string text = Utf8FromWide(line);
-    std::fprintf(stderr, "%s\n", text.c_str());
-    std::fflush(stderr);
+    WriteErrorLine(line);
 }
 
 } // namespace ut::platform

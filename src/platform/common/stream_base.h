@@ -1,5 +1,6 @@
-// What the POSIX streams share: reference counting, interface lookup, and the parts of IStream
-// that no stream of ours supports.
+// What the streams of both homes share: reference counting, interface lookup, the parts of
+// IStream that no stream of ours supports, and the rules of Seek and Stat, so that a stream
+// answers alike wherever it runs.
 #pragma once
 
 #include <algorithm>
@@ -9,7 +10,7 @@
 
 #include <ut/platform/stream.h>
 
-namespace ut::platform::posix {
+namespace ut::platform {
 
 class StreamBase : public IStream {
 public:
@@ -72,7 +73,14 @@ public:
     }
 
 protected:
+    // A memory stream holds at most what a 32-bit length can count, like the system's.
+    static constexpr ULONGLONG kMaxMemorySize = 0xFFFFFFFFull;
+
     virtual ~StreamBase() = default;
+
+    // Whether a stream opened with `mode` (STGM flags) may be read or written.
+    static bool CanRead(DWORD mode) { return (mode & 3) != STGM_WRITE; }
+    static bool CanWrite(DWORD mode) { return (mode & 3) != STGM_READ; }
 
     // Fills the parts of STATSTG that every stream reports the same way.
     static HRESULT FillStat(STATSTG* stat, DWORD flags, ULONGLONG size, const std::wstring& name,
@@ -93,7 +101,8 @@ protected:
         return S_OK;
     }
 
-    // Applies a Seek request to a position; false when it would land before the start.
+    // Applies a Seek request to a position; false when it would land before the start or the
+    // origin is unknown (both answer STG_E_INVALIDFUNCTION).
     static bool NewPosition(LARGE_INTEGER move, DWORD origin, ULONGLONG current, ULONGLONG size,
                             ULONGLONG& position) {
         LONGLONG base = 0;
@@ -121,4 +130,17 @@ private:
     std::atomic<ULONG> references_{1};
 };
 
-} // namespace ut::platform::posix
+// The checks OpenFileStream makes before it asks the system: clears *stream, refuses a null
+// or empty path and the access value 3, which names no access.
+inline HRESULT CheckFileStreamArguments(const wchar_t* path, DWORD mode, IStream** stream) {
+    if (!stream)
+        return E_POINTER;
+    *stream = nullptr;
+    if (!path || !*path)
+        return STG_E_INVALIDNAME;
+    if ((mode & 3) == 3)
+        return STG_E_INVALIDFLAG;
+    return S_OK;
+}
+
+} // namespace ut::platform
