@@ -17,6 +17,10 @@ bool IsLowSurrogate(char32_t c) {
 bool IsSurrogate(char32_t c) {
     return c >= 0xD800 && c <= 0xDFFF;
 }
+// Takes char32_t so that the test also compiles where wchar_t cannot hold such a value.
+bool NeedsSurrogatePair(char32_t c) {
+    return c > 0xFFFF && c <= 0x10FFFF;
+}
 
 void AppendWide(char32_t code, std::wstring& out) {
     if (kWideIsUtf16 && code > 0xFFFF) {
@@ -113,7 +117,7 @@ std::size_t Utf16Length(std::wstring_view text) {
         return text.size();
     std::size_t units = 0;
     for (wchar_t c : text)
-        units += static_cast<char32_t>(c) > 0xFFFF && static_cast<char32_t>(c) <= 0x10FFFF ? 2 : 1;
+        units += NeedsSurrogatePair(static_cast<char32_t>(c)) ? 2 : 1;
     return units;
 }
 

@@ -1,0 +1,59 @@
+#include <string>
+
+#include <ut/platform/process.h>
+
+#include "common/error_output.h"
+
+namespace ut::platform {
+namespace {
+
+// Long-path names are at most this many characters.
+constexpr DWORD kLongestPath = 32768;
+
+} // namespace
+
+bool HasEnvironmentVariable(const char* name) {
+    if (!name)
+        return false;
+    // With no room, a present variable answers the room it needs (at least 1 for an empty
+    // value), and a missing one answers 0 with ERROR_ENVVAR_NOT_FOUND.
+    SetLastError(ERROR_SUCCESS);
+    if (GetEnvironmentVariableA(name, nullptr, 0) != 0)
+        return true;
+    return GetLastError() != ERROR_ENVVAR_NOT_FOUND;
+}
+
+HINSTANCE ModuleOf(const void* address) {
+    HMODULE module = nullptr;
+    constexpr DWORD kFlags =
+        GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT;
+    if (!address || !GetModuleHandleExW(kFlags, static_cast<LPCWSTR>(address), &module))
+        return nullptr;
+    return module;
+}
+
+std::wstring ModuleFileName(HINSTANCE module) {
+    if (!module)
+        return std::wstring();
+    std::wstring name(MAX_PATH, L'\0');
+    for (;;) {
+        DWORD copied = GetModuleFileNameW(module, name.data(), static_cast<DWORD>(name.size()));
+        if (copied == 0)
+            return std::wstring();
+        // A name that fills the buffer was cut short: grow and ask again.
+        if (copied < name.size()) {
+            name.resize(copied);
+            return name;
+        }
+        if (name.size() >= kLongestPath)
+            return std::wstring();
+        name.resize(name.size() * 2);
+    }
+}
+
+void ReportError(const std::wstring& line) {
+    WriteErrorLine(line);
+    OutputDebugStringW((line + L"\n").c_str());
+}
+
+} // namespace ut::platform
