@@ -1,0 +1,13 @@
+# Cross-build for Windows with mingw-w64, for the target that UT_MINGW_TRIPLET names. The posix
+# thread model gives std::thread and std::mutex.
+set(CMAKE_SYSTEM_NAME Windows)
+
+set(CMAKE_C_COMPILER ${UT_MINGW_TRIPLET}-gcc-posix)
+set(CMAKE_CXX_COMPILER ${UT_MINGW_TRIPLET}-g++-posix)
+set(CMAKE_RC_COMPILER ${UT_MINGW_TRIPLET}-windres)
+
+set(CMAKE_FIND_ROOT_PATH /usr/${UT_MINGW_TRIPLET})
+set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
+set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
+set(CMAKE_FIND_ROOT_PATH_MODE_INCLUDE ONLY)
+set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
