@@ -6,6 +6,9 @@
 #include <ut/platform/process.h>
 #include <ut/platform/stream.h>
 #include <ut/platform/text.h>
+#include <ut/platform/variant.h>
+#include <ut/sdk/notify.h>
+#include <ut/sdk/objects.h>
 #include <ut/sdk/resources.h>
 #include <ut/ut.h>
 
@@ -14,7 +17,9 @@
 namespace ut::tool {
 namespace {
 
-std::string Narrow(const std::wstring& text) { return ut::platform::Utf8FromWide(text); }
+std::string Narrow(const std::wstring& text) {
+    return ut::platform::Utf8FromWide(text);
+}
 
 int ShowModule() {
     HINSTANCE library = KXDictFindInstance(L"QVXUT");
@@ -29,13 +34,12 @@ int ShowModule() {
     }
     std::printf("module      %s\n", Narrow(ut::platform::ModuleFileName(library)).c_str());
     std::printf("base key    HKEY_LOCAL_MACHINE\\%s\n", Narrow(key).c_str());
-    std::printf("features    scene format version %u\n",
-                static_cast<unsigned>(g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureCurrent]));
     return 0;
 }
 
 int ShowGuidRoundTrip() {
-    constexpr GUID compressor = {0x1C36C8C0, 0xA6A4, 0x11D3, {0xB4, 0xB3, 0x00, 0xA0, 0x24, 0x4E, 0xEB, 0x76}};
+    constexpr GUID compressor = {
+        0x1C36C8C0, 0xA6A4, 0x11D3, {0xB4, 0xB3, 0x00, 0xA0, 0x24, 0x4E, 0xEB, 0x76}};
     std::wstring text = ut::GuidToString(compressor);
     GUID back{};
     bool same = SUCCEEDED(ut::ParseGuid(text.c_str(), &back)) && IsEqualGUID(back, compressor);
@@ -58,6 +62,51 @@ int ShowStreamRoundTrip() {
     return std::string(back) == payload ? 0 : 1;
 }
 
+std::string FourCharacters(ULONG code) {
+    std::string text;
+    for (int shift = 24; shift >= 0; shift -= 8)
+        text += static_cast<char>((code >> shift) & 0xFF);
+    return text;
+}
+
+int ShowVersions() {
+    ULONG loaded = 0, current = 0;
+    KXGetFeatureVersion(eFeaturesVersionScene, &loaded, &current);
+    tagVersion persisted = F3DGetVersionPersisted(S_OK, 0);
+    std::printf("versions    scene feature: current %u, loaded %u; this host persists format %s\n",
+                static_cast<unsigned>(current), static_cast<unsigned>(loaded),
+                FourCharacters(persisted).c_str());
+    return 0;
+}
+
+// Tells every listener that the application changed state, as the application would.
+void BroadcastStateChange(USHORT state) {
+    ut::ComPtr<IGWNotificationService> service;
+    if (FAILED(
+            GWQueryGenericObject(CLSID_GWNotificationService, IID_IGWNotificationService, service.PutVoid())))
+        return;
+    ut::Variant value;
+    value->vt = VT_I4;
+    value->lVal = state;
+    service->Broadcast(ut::sdk::kAppStateChange, ut::sdk::kStateChangeKind, value.Get());
+}
+
+int ShowMemoryPool() {
+    CMemoryPool pool;
+    void* first = pool.Allocate(20);
+    pool.Deallocate(first);
+    void* second = pool.Allocate(30);
+    bool reused = first == second;
+    pool.Deallocate(second);
+    pool.Diagnostics();
+    std::size_t keptBefore = pool.TotalFreeCount;
+    BroadcastStateChange(3);
+    pool.Diagnostics();
+    std::printf("pool        20 then 30 bytes: %s; kept blocks %zu, after a state change %zu\n",
+                reused ? "same block reused" : "NOT reused", keptBefore, pool.TotalFreeCount);
+    return reused && keptBefore == 1 && pool.TotalFreeCount == 0 ? 0 : 1;
+}
+
 } // namespace
 
 int Demo(const Arguments&) {
@@ -66,7 +115,8 @@ int Demo(const Arguments&) {
         std::fprintf(stderr, "ut: the reference host did not start\n");
         return 1;
     }
-    int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip();
+    int failures =
+        ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowVersions() + ShowMemoryPool();
     return failures ? 1 : 0;
 }
 
