@@ -165,15 +165,70 @@ HRESULT C3DStreamCompressor::GetStartCount(ULONG& hostVersionKnown, ULONG& start
     return S_OK;
 }
 
-// Packed values.
+// Packed values. Encoders write straight into the window when it has room at its end, and
+// decoders read straight from it when it holds a whole form; otherwise the bytes go through a
+// local copy and the same code.
+
+namespace {
+
+using ut::persist::kDecodeWindow;
+
+template <class T>
+HRESULT WritePacked(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T value) {
+    if (BYTE* room = buffer.Reserve(kMaxPacked)) {
+        buffer.Commit(pack(value, room));
+        return S_OK;
+    }
+    BYTE bytes[kMaxPacked];
+    return buffer.Write(bytes, pack(value, bytes));
+}
+
+// Decodes one integer form whose tag is at least `lowestTag`.
+HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, ULONG& value) {
+    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
+        if (bytes[0] < lowestTag) {
+            buffer.Advance(1);
+            return E_FAIL;
+        }
+        buffer.Advance(ut::persist::UnpackInteger(bytes, value));
+        return S_OK;
+    }
+    BYTE bytes[kDecodeWindow] = {};
+    buffer.ReadValue(bytes[0]); // unchecked: a missing tag stays 0, which no form has
+    if (bytes[0] < lowestTag)
+        return E_FAIL;
+    if (HRESULT hr = buffer.Read(bytes + 1, ut::persist::PayloadBytes(bytes[0])); FAILED(hr))
+        return hr;
+    ut::persist::UnpackInteger(bytes, value);
+    return S_OK;
+}
+
+HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
+    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
+        ULONG length = ut::persist::UnpackDouble(bytes, value);
+        buffer.Advance(length ? length : 1);
+        return length ? S_OK : E_FAIL;
+    }
+    BYTE bytes[kDecodeWindow] = {};
+    buffer.ReadValue(bytes[0]); // unchecked, as above
+    double probe = 0;
+    ULONG length = ut::persist::UnpackDouble(bytes, probe);
+    if (!length)
+        return E_FAIL;
+    if (HRESULT hr = buffer.Read(bytes + 1, length - 1); FAILED(hr))
+        return hr;
+    ut::persist::UnpackDouble(bytes, value);
+    return S_OK;
+}
+
+} // namespace
 
 HRESULT C3DStreamCompressor::SavePackedVarLenUInt32(const ULONG& value) {
     if (!buffer_)
         return E_UNEXPECTED;
     if (!Packing(packUInt32_))
         return buffer_->WriteValue(value);
-    BYTE bytes[kMaxPacked];
-    return buffer_->Write(bytes, ut::persist::PackUInt32(value, bytes));
+    return WritePacked(*buffer_, &ut::persist::PackUInt32, value);
 }
 
 HRESULT C3DStreamCompressor::SavePackedVarLenUInt32ForPatchBack(const ULONG& value) {
@@ -192,18 +247,7 @@ HRESULT C3DStreamCompressor::LoadPackedVarLenUInt32(ULONG& value) {
         return E_UNEXPECTED;
     if (!Packing(packUInt32_))
         return buffer_->ReadValue(value);
-    BYTE tag = 0;
-    buffer_->ReadValue(tag);
-    if ((tag & 0xF0) == ut::persist::kTagWhole)
-        return buffer_->ReadValue(value);
-    int payloadBytes = ut::persist::PayloadBytes(tag);
-    if (payloadBytes < 0 || tag < ut::persist::kTagWhole)
-        return E_FAIL;
-    ULONG payload = 0;
-    if (HRESULT hr = buffer_->Read(&payload, static_cast<ULONG>(payloadBytes)); FAILED(hr))
-        return hr;
-    value = (payload << 4) | (tag & 15u);
-    return S_OK;
+    return ReadPackedInteger(*buffer_, ut::persist::kTagWhole, value);
 }
 
 HRESULT C3DStreamCompressor::SkipPackedVarLenUInt32() {
@@ -220,8 +264,7 @@ HRESULT C3DStreamCompressor::SavePackedVarLenInt32(const LONG& value) {
         return E_UNEXPECTED;
     if (!Packing(packInt32_))
         return buffer_->WriteValue(value);
-    BYTE bytes[kMaxPacked];
-    return buffer_->Write(bytes, ut::persist::PackInt32(value, bytes));
+    return WritePacked(*buffer_, &ut::persist::PackInt32, value);
 }
 
 HRESULT C3DStreamCompressor::SavePackedVarLenInt32ForPatchBack(const LONG&) {
@@ -234,18 +277,10 @@ HRESULT C3DStreamCompressor::LoadPackedVarLenInt32(LONG& value) {
         return E_UNEXPECTED;
     if (!Packing(packInt32_))
         return buffer_->ReadValue(value);
-    BYTE tag = 0;
-    buffer_->ReadValue(tag);
-    BYTE form = tag & 0xF0;
-    if (form < ut::persist::kTagNegWhole)
-        return E_FAIL;
-    if (form == ut::persist::kTagWhole || form == ut::persist::kTagNegWhole)
-        return buffer_->ReadValue(value);
-    ULONG payload = 0;
-    if (HRESULT hr = buffer_->Read(&payload, static_cast<ULONG>(ut::persist::PayloadBytes(tag))); FAILED(hr))
-        return hr;
-    value = ut::persist::UnpackInt32(tag, payload);
-    return S_OK;
+    ULONG bits = 0;
+    HRESULT hr = ReadPackedInteger(*buffer_, ut::persist::kTagNegWhole, bits);
+    value = static_cast<LONG>(bits);
+    return hr;
 }
 
 HRESULT C3DStreamCompressor::SkipPackedVarLenInt32() {
@@ -259,8 +294,7 @@ HRESULT C3DStreamCompressor::SaveVarLenDouble(const double& value) {
         return E_UNEXPECTED;
     if (!Packing(packDouble_))
         return buffer_->WriteValue(value);
-    BYTE bytes[kMaxPacked];
-    return buffer_->Write(bytes, ut::persist::PackDouble(value, bytes));
+    return WritePacked(*buffer_, &ut::persist::PackDouble, value);
 }
 
 HRESULT C3DStreamCompressor::LoadVarLenDouble(double& value) {
@@ -268,41 +302,7 @@ HRESULT C3DStreamCompressor::LoadVarLenDouble(double& value) {
         return E_UNEXPECTED;
     if (!Packing(packDouble_))
         return buffer_->ReadValue(value);
-    BYTE tag = 0;
-    buffer_->ReadValue(tag);
-    switch (tag) {
-    case ut::persist::kDoubleZero:
-        value = 0.0;
-        return S_OK;
-    case ut::persist::kDoubleOne:
-        value = 1.0;
-        return S_OK;
-    case ut::persist::kDoubleMinusOne:
-        value = -1.0;
-        return S_OK;
-    case ut::persist::kDoubleInt8: {
-        signed char small = 0;
-        HRESULT hr = buffer_->ReadValue(small);
-        value = small;
-        return hr;
-    }
-    case ut::persist::kDoubleInt16: {
-        SHORT small = 0;
-        HRESULT hr = buffer_->ReadValue(small);
-        value = small;
-        return hr;
-    }
-    case ut::persist::kDoubleFloat: {
-        float single = 0;
-        HRESULT hr = buffer_->ReadValue(single);
-        value = single;
-        return hr;
-    }
-    case ut::persist::kDoubleWhole:
-        return buffer_->ReadValue(value);
-    default:
-        return E_FAIL;
-    }
+    return ReadPackedDouble(*buffer_, value);
 }
 
 // A plain double takes 8 bytes, but the skip moves 4 like the integer skips: streams written so
@@ -437,19 +437,7 @@ HRESULT C3DStreamCompressor::ChunkSafeWriteOpen(ULONG id, ULONG version) {
 HRESULT C3DStreamCompressor::ChunkWriteClose() {
     if (!active_)
         return STG_E_OLDFORMAT;
-    if (writeStarts_.empty())
-        return E_UNEXPECTED;
-    ULONGLONG start = writeStarts_.back();
-    writeStarts_.pop_back();
-    ULONGLONG end = buffer_->Position();
-    if (end < start)
-        return E_UNEXPECTED;
-    if (end == start)
-        return S_OK; // an empty body keeps the placeholder 0
-    if (HRESULT hr = buffer_->SetPosition(start - sizeof(ULONG)); FAILED(hr))
-        return hr;
-    buffer_->WriteValue(static_cast<ULONG>(end - start));
-    return buffer_->SetPosition(end);
+    return ut::sdk::CloseWrittenChunk(*buffer_, writeStarts_);
 }
 
 HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {

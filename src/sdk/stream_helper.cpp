@@ -10,7 +10,7 @@ namespace {
 using ut::sdk::Rewind;
 
 constexpr ULONG kNullString = 0xFFFFFFFF;
-constexpr HRESULT kBufferTooSmall = HRESULT_FROM_WIN32(ERROR_INSUFFICIENT_BUFFER);
+const HRESULT kBufferTooSmall = HRESULT_FROM_WIN32(ERROR_INSUFFICIENT_BUFFER);
 
 struct ChunkHeader {
     ULONG id;
@@ -36,6 +36,23 @@ ULONG ChunkIdFromName(const char* name) {
     for (int i = 0; i < 4; ++i)
         id |= static_cast<LONG>(static_cast<signed char>(name[i])) * (1 << (8 * i));
     return static_cast<ULONG>(id);
+}
+
+HRESULT CloseWrittenChunk(StreamBuffer& buffer, std::vector<ULONGLONG>& bodyStarts) {
+    if (bodyStarts.empty())
+        return E_UNEXPECTED;
+    ULONGLONG start = bodyStarts.back();
+    bodyStarts.pop_back();
+    ULONGLONG end = buffer.Position();
+    if (end < start)
+        return E_UNEXPECTED;
+    if (end == start)
+        return S_OK;
+    if (HRESULT hr = buffer.SetPosition(start - sizeof(ULONG)); FAILED(hr))
+        return hr;
+    if (HRESULT hr = buffer.WriteValue(static_cast<ULONG>(end - start)); FAILED(hr))
+        return hr;
+    return buffer.SetPosition(end);
 }
 
 } // namespace ut::sdk
@@ -99,10 +116,8 @@ HRESULT CGWStreamHelper::PutDouble(double value) {
 }
 
 HRESULT CGWStreamHelper::PutTChar(wchar_t value) {
-    if constexpr (sizeof(wchar_t) > 2) {
-        if (static_cast<ULONG>(value) > 0xFFFF)
-            return E_INVALIDARG;
-    }
+    if ((static_cast<ULONG>(value) >> 16) != 0) // only where wchar_t is wider than a code unit
+        return E_INVALIDARG;
     return buffer_->WriteValue(static_cast<USHORT>(value));
 }
 
@@ -489,18 +504,7 @@ HRESULT CGWStreamHelper::ChunkWriteOpen(ULONG id, ULONG version) {
 }
 
 HRESULT CGWStreamHelper::ChunkWriteClose() {
-    if (writeStarts_.empty())
-        return E_UNEXPECTED;
-    ULONGLONG start = writeStarts_.back();
-    writeStarts_.pop_back();
-    ULONGLONG end = buffer_->Position();
-    if (end < start)
-        return E_UNEXPECTED;
-    if (HRESULT hr = buffer_->SetPosition(start - sizeof(ULONG)); FAILED(hr))
-        return hr;
-    if (HRESULT hr = buffer_->WriteValue(static_cast<ULONG>(end - start)); FAILED(hr))
-        return hr;
-    return buffer_->SetPosition(end);
+    return ut::sdk::CloseWrittenChunk(*buffer_, writeStarts_);
 }
 
 HRESULT CGWStreamHelper::ChunkReadOpen(const char* name, ULONG* version) {

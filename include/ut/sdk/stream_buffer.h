@@ -94,6 +94,23 @@ public:
         return Read(&value, sizeof value);
     }
 
+    // Direct access to the window for encoders and decoders of small values.
+    // Room for `count` bytes at the end of the window, or null; Commit(n) then keeps the first n.
+    BYTE* Reserve(ULONG count) {
+        return cursor_ == valid_ && count <= limit_ - cursor_ ? data_.get() + cursor_ : nullptr;
+    }
+    void Commit(ULONG count) {
+        if (cursor_ < dirtyBegin_)
+            dirtyBegin_ = cursor_;
+        cursor_ += count;
+        valid_ = dirtyEnd_ = cursor_;
+    }
+    // `count` readable bytes at the position, or null; Advance(n) then consumes n of them.
+    const BYTE* Peek(ULONG count) const {
+        return count <= valid_ - cursor_ ? data_.get() + cursor_ : nullptr;
+    }
+    void Advance(ULONG count) { cursor_ += count; }
+
     // Up to `count` bytes; fewer only at the end of the stream. For IStream::Read.
     HRESULT ReadSome(void* bytes, ULONG count, ULONG* read);
 

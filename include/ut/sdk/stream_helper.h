@@ -63,6 +63,9 @@ UT_INTERFACE_ID(IGWStreamCapabilities, IID_IGWStreamCapabilities);
 namespace ut::sdk {
 // The chunk id of a four-character name: the bytes in written order, each sign-extended.
 UT_SDK_API ULONG ChunkIdFromName(const char* name);
+// Closes the innermost chunk open for writing: pops the start of its body and writes the body's
+// size into the 4 bytes before it (an empty body keeps the 0 written at the open).
+UT_SDK_API HRESULT CloseWrittenChunk(StreamBuffer& buffer, std::vector<ULONGLONG>& bodyStarts);
 } // namespace ut::sdk
 
 class UT_SDK_API CGWStreamHelper {
