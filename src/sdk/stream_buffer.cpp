@@ -12,6 +12,27 @@ LARGE_INTEGER Offset(LONGLONG value) {
     return offset;
 }
 
+HRESULT SeekTo(IStream* stream, ULONGLONG position) {
+    return stream->Seek(Offset(static_cast<LONGLONG>(position)), STREAM_SEEK_SET, nullptr);
+}
+
+// All `count` bytes at `position` of the stream, or a failure.
+HRESULT WriteAt(IStream* stream, ULONGLONG position, const void* bytes, ULONG count) {
+    if (HRESULT hr = SeekTo(stream, position); FAILED(hr))
+        return hr;
+    ULONG written = 0;
+    HRESULT hr = stream->Write(bytes, count, &written);
+    return FAILED(hr) ? hr : written == count ? S_OK : STG_E_WRITEFAULT;
+}
+
+// Up to `count` bytes at `position`; `read` says how many the stream had.
+HRESULT ReadAt(IStream* stream, ULONGLONG position, void* bytes, ULONG count, ULONG& read) {
+    read = 0;
+    if (HRESULT hr = SeekTo(stream, position); FAILED(hr))
+        return hr;
+    return stream->Read(bytes, count, &read);
+}
+
 } // namespace
 
 StreamBuffer::StreamBuffer(IStream* stream) : stream_(stream) {
@@ -29,22 +50,13 @@ StreamBuffer::~StreamBuffer() {
     Sync();
 }
 
-HRESULT StreamBuffer::SeekStream(ULONGLONG position) {
-    return stream_->Seek(Offset(static_cast<LONGLONG>(position)), STREAM_SEEK_SET, nullptr);
-}
-
 HRESULT StreamBuffer::Flush() {
     if (dirtyEnd_ <= dirtyBegin_)
         return S_OK;
-    if (HRESULT hr = SeekStream(base_ + dirtyBegin_); FAILED(hr))
-        return hr;
-    ULONG count = dirtyEnd_ - dirtyBegin_;
-    ULONG written = 0;
-    HRESULT hr = stream_->Write(data_.get() + dirtyBegin_, count, &written);
+    HRESULT hr =
+        WriteAt(stream_.Get(), base_ + dirtyBegin_, data_.get() + dirtyBegin_, dirtyEnd_ - dirtyBegin_);
     if (FAILED(hr))
         return hr;
-    if (written != count)
-        return STG_E_WRITEFAULT;
     dirtyBegin_ = kCapacity;
     dirtyEnd_ = 0;
     return S_OK;
@@ -55,7 +67,7 @@ HRESULT StreamBuffer::Sync() {
         return E_POINTER;
     if (HRESULT hr = Flush(); FAILED(hr))
         return hr;
-    return SeekStream(Position());
+    return SeekTo(stream_.Get(), Position());
 }
 
 HRESULT StreamBuffer::StartWindow(ULONGLONG position) {
@@ -72,14 +84,10 @@ HRESULT StreamBuffer::StartWindow(ULONGLONG position) {
 }
 
 HRESULT StreamBuffer::Fill() {
-    if (HRESULT hr = SeekStream(base_); FAILED(hr))
-        return hr;
     ULONG read = 0;
-    HRESULT hr = stream_->Read(data_.get(), limit_, &read);
-    if (FAILED(hr))
-        return hr;
+    HRESULT hr = ReadAt(stream_.Get(), base_, data_.get(), limit_, read);
     valid_ = std::min(read, limit_);
-    return S_OK;
+    return hr;
 }
 
 HRESULT StreamBuffer::WriteSlow(const void* bytes, ULONG count) {
@@ -93,14 +101,8 @@ HRESULT StreamBuffer::WriteSlow(const void* bytes, ULONG count) {
     if (count <= limit_)
         return Write(bytes, count);
     // Larger than a window: straight to the stream.
-    if (HRESULT hr = SeekStream(position); FAILED(hr))
+    if (HRESULT hr = WriteAt(stream_.Get(), position, bytes, count); FAILED(hr))
         return hr;
-    ULONG written = 0;
-    HRESULT hr = stream_->Write(bytes, count, &written);
-    if (FAILED(hr))
-        return hr;
-    if (written != count)
-        return STG_E_WRITEFAULT;
     return StartWindow(position + count);
 }
 
@@ -116,15 +118,10 @@ HRESULT StreamBuffer::ReadSlow(void* bytes, ULONG count) {
         return count <= valid_ ? Read(bytes, count) : STG_E_READFAULT;
     }
     // Larger than a window: straight from the stream.
-    if (HRESULT hr = SeekStream(position); FAILED(hr))
-        return hr;
     ULONG read = 0;
-    HRESULT hr = stream_->Read(bytes, count, &read);
-    if (FAILED(hr))
+    if (HRESULT hr = ReadAt(stream_.Get(), position, bytes, count, read); FAILED(hr))
         return hr;
-    if (read != count)
-        return STG_E_READFAULT;
-    return StartWindow(position + count);
+    return read == count ? StartWindow(position + count) : STG_E_READFAULT;
 }
 
 HRESULT StreamBuffer::ReadSome(void* bytes, ULONG count, ULONG* read) {

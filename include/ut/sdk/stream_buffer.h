@@ -145,7 +145,6 @@ private:
     // Flushes and starts an empty window at `position`.
     HRESULT StartWindow(ULONGLONG position);
     HRESULT Fill();
-    HRESULT SeekStream(ULONGLONG position);
     HRESULT Unusable() const { return stream_ ? E_OUTOFMEMORY : E_POINTER; }
 
     ComPtr<IStream> stream_;
