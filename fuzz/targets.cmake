@@ -1,3 +1,4 @@
 # The fuzz targets, one call each: ut_fuzz_target(name sources...) with sources relative to fuzz/.
 # fuzz/CMakeLists.txt turns each into a libFuzzer binary; tests/CMakeLists.txt into a replay of
 # fuzz/corpus/<name>/ under CTest.
+ut_fuzz_target(stream stream_fuzz.cpp)

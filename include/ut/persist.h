@@ -1,12 +1,16 @@
-// Persistence: the feature-version table and persisted-version codes, and user data blocks.
+// Persistence: the feature-version table and persisted-version codes, user data blocks, and the
+// chunked streams.
 #pragma once
 
 #include <map>
+#include <memory>
+#include <vector>
 
 #include <ut/export.h>
 #include <ut/platform/com.h>
 #include <ut/platform/stream.h>
 #include <ut/sdk/comobject.h>
+#include <ut/sdk/stream_helper.h>
 #include <ut/sdk/string.h>
 
 // ---------------------------------------------------------------------------------------------
@@ -131,3 +135,189 @@ private:
 
     std::map<eUserDataBlockType, ut::ComPtr<CUserDataBlock>> blocks_;
 };
+
+// ---------------------------------------------------------------------------------------------
+// Chunked streams: the typed reader/writer every persisted object uses, and the compact encoding
+// (packed integers and doubles, chunk headers as one-byte indexes into a table of (id, version)
+// pairs) that the stream objects opened below apply.
+
+// The header table of a compact stream holds 256 (id, version) pairs; writing a chunk with a
+// 257th distinct pair fails with this code and writes nothing.
+inline constexpr HRESULT KX_E_CHUNKTABLEFULL = static_cast<HRESULT>(0x80040201);
+
+// {1C36C8C0-A6A4-11D3-B4B3-00A0244EEB76}
+inline constexpr IID IID_I3DStreamCompressor = {
+    0x1C36C8C0, 0xA6A4, 0x11D3, {0xB4, 0xB3, 0x00, 0xA0, 0x24, 0x4E, 0xEB, 0x76}};
+
+// The compact encoding of a stream, answered by the stream object. The chunk operations answer
+// STG_E_OLDFORMAT while the stream is in the plain form: the caller then uses its own chunk code.
+struct I3DStreamCompressor : IUnknown {
+    virtual HRESULT STDMETHODCALLTYPE SaveVarLenDouble(const double& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE LoadVarLenDouble(double& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE SkipVarLenDouble() = 0;
+    virtual HRESULT STDMETHODCALLTYPE SavePackedVarLenInt32ForPatchBack(const LONG& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE SavePackedVarLenInt32(const LONG& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE LoadPackedVarLenInt32(LONG& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE SkipPackedVarLenInt32() = 0;
+    virtual HRESULT STDMETHODCALLTYPE SavePackedVarLenUInt32ForPatchBack(const ULONG& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE SavePackedVarLenUInt32(const ULONG& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE LoadPackedVarLenUInt32(ULONG& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE SkipPackedVarLenUInt32() = 0;
+    virtual HRESULT STDMETHODCALLTYPE ChunkPeekHeader(ULONG* id, ULONG* version) = 0;
+    virtual HRESULT STDMETHODCALLTYPE ChunkWriteOpen(ULONG id, ULONG version) = 0;
+    virtual HRESULT STDMETHODCALLTYPE ChunkWriteClose() = 0;
+    virtual HRESULT STDMETHODCALLTYPE ChunkReadOpen(ULONG id, ULONG* version) = 0;
+    virtual HRESULT STDMETHODCALLTYPE ChunkReadClose() = 0;
+    virtual HRESULT STDMETHODCALLTYPE SkipChunk() = 0;
+    virtual HRESULT STDMETHODCALLTYPE ChunkSafeReadOpen(ULONG id, ULONG* version) = 0;
+    virtual HRESULT STDMETHODCALLTYPE ChunkSafeWriteOpen(ULONG id, ULONG version) = 0;
+    virtual HRESULT STDMETHODCALLTYPE SaveGUID(const GUID& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE LoadGUID(GUID& value) = 0;
+    virtual HRESULT STDMETHODCALLTYPE GetStartCount(ULONG& hostVersionKnown, ULONG& startDepth) = 0;
+    virtual ~I3DStreamCompressor() = default;
+};
+
+UT_INTERFACE_ID(I3DStreamCompressor, IID_I3DStreamCompressor);
+
+// The compact encoding. The object that embeds it supplies QueryInterface, AddRef and Release,
+// and calls Init for each stream, PreRead before reading a stream whose header table travels
+// apart, and Term after writing one.
+class UT_API C3DStreamCompressor : public I3DStreamCompressor {
+public:
+    C3DStreamCompressor();
+    C3DStreamCompressor(const C3DStreamCompressor&) = default;
+    C3DStreamCompressor& operator=(const C3DStreamCompressor&) = default;
+    ~C3DStreamCompressor() override;
+
+    HRESULT STDMETHODCALLTYPE SaveVarLenDouble(const double& value) override;
+    HRESULT STDMETHODCALLTYPE LoadVarLenDouble(double& value) override;
+    HRESULT STDMETHODCALLTYPE SkipVarLenDouble() override;
+    HRESULT STDMETHODCALLTYPE SavePackedVarLenInt32ForPatchBack(const LONG& value) override;
+    HRESULT STDMETHODCALLTYPE SavePackedVarLenInt32(const LONG& value) override;
+    HRESULT STDMETHODCALLTYPE LoadPackedVarLenInt32(LONG& value) override;
+    HRESULT STDMETHODCALLTYPE SkipPackedVarLenInt32() override;
+    HRESULT STDMETHODCALLTYPE SavePackedVarLenUInt32ForPatchBack(const ULONG& value) override;
+    HRESULT STDMETHODCALLTYPE SavePackedVarLenUInt32(const ULONG& value) override;
+    HRESULT STDMETHODCALLTYPE LoadPackedVarLenUInt32(ULONG& value) override;
+    HRESULT STDMETHODCALLTYPE SkipPackedVarLenUInt32() override;
+    HRESULT STDMETHODCALLTYPE ChunkPeekHeader(ULONG* id, ULONG* version) override;
+    HRESULT STDMETHODCALLTYPE ChunkWriteOpen(ULONG id, ULONG version) override;
+    HRESULT STDMETHODCALLTYPE ChunkWriteClose() override;
+    HRESULT STDMETHODCALLTYPE ChunkReadOpen(ULONG id, ULONG* version) override;
+    HRESULT STDMETHODCALLTYPE ChunkReadClose() override;
+    HRESULT STDMETHODCALLTYPE SkipChunk() override;
+    HRESULT STDMETHODCALLTYPE ChunkSafeReadOpen(ULONG id, ULONG* version) override;
+    HRESULT STDMETHODCALLTYPE ChunkSafeWriteOpen(ULONG id, ULONG version) override;
+    HRESULT STDMETHODCALLTYPE SaveGUID(const GUID& value) override;
+    HRESULT STDMETHODCALLTYPE LoadGUID(GUID& value) override;
+    HRESULT STDMETHODCALLTYPE GetStartCount(ULONG& hostVersionKnown, ULONG& startDepth) override;
+
+    // Binds the compressor to `stream`. A stream at position 0 becomes compact: an empty one gets
+    // the marker chunk (unless KX_DISABLE_STREAM_COMPRESSION was set when the library loaded), a
+    // non-empty one is compact when it starts with the marker. The header table is kept.
+    HRESULT Init(IStream* stream, int tableMode, int reserved);
+    // Reads a header table written by Term from `stream`: S_OK, or S_FALSE when there is none.
+    HRESULT PreRead(IStream* stream);
+    // Writes the header table to `stream` unless `skip`.
+    HRESULT Term(IStream* stream, int skip);
+
+private:
+    struct HeaderRow {
+        ULONG version;
+        ULONG id;
+    };
+
+    HRESULT PutChunkHeader(ULONG id, ULONG version);
+    HRESULT GetChunkHeader(ULONG& id, ULONG& version, bool record);
+
+    bool Packing(int kind) const { return active_ && kind; }
+    HRESULT PushReadEnd(ULONGLONG end);
+    HRESULT PushWriteStart();
+    bool ImportingDelta() const;
+
+    std::shared_ptr<CGWStreamHelper> helper_;
+    ut::sdk::StreamBuffer* buffer_ = nullptr;
+    ut::ComPtr<IStream> stream_;
+    CKXString streamName_;
+    int active_ = 0;
+    int packUInt32_ = 1;
+    int packInt32_ = 1;
+    int packDouble_ = 1;
+    int tableMode_ = 0;
+    HeaderRow headerTable_[256] = {};
+    ULONG headerPos_[256] = {};
+    int lastIndex_ = -1;
+    bool packHeaders_ = true;
+    std::vector<ULONGLONG> readEnds_;
+    std::vector<ULONGLONG> writeStarts_;
+    LONG startDepth_ = -1;
+    BYTE hostVersionKnown_ = 0;
+};
+
+// The typed reader and writer through which persisted objects save and load. Over a stream
+// that answers I3DStreamCompressor, 32-bit integers, doubles and chunk framing go through the
+// compressor; everything else, and everything on other streams, is CGWStreamHelper's. Chunks
+// opened through the helper and still open when it goes are closed then.
+class UT_API C3DStreamHelper : public CGWStreamHelper {
+public:
+    explicit C3DStreamHelper(IStream* stream);
+    ~C3DStreamHelper() override;
+
+    using CGWStreamHelper::ChunkReadOpen;
+    using CGWStreamHelper::ChunkWriteOpen;
+
+    HRESULT PutInt32(LONG value) override;
+    HRESULT PutUInt32(ULONG value) override;
+    HRESULT PutDouble(double value) override;
+    HRESULT GetInt32(LONG& value) override;
+    HRESULT GetUInt32(ULONG& value) override;
+    HRESULT GetDouble(double& value) override;
+    HRESULT SkipInt32() override;
+    HRESULT SkipUInt32() override;
+    HRESULT SkipDouble() override;
+    HRESULT SkipChunk() override;
+    HRESULT ChunkPeekHeader(ULONG* id, ULONG* version) override;
+    HRESULT ChunkWriteOpen(ULONG id, ULONG version) override;
+    HRESULT ChunkWriteClose() override;
+    HRESULT ChunkReadOpen(ULONG id, ULONG* version) override;
+    HRESULT ChunkReadClose() override;
+
+    // A wide string; an empty one is stored as an empty string, never as a missing one.
+    virtual HRESULT PutString(const CKXString& text);
+    // A 32-bit value in a slot of fixed size, so that it can be overwritten later.
+    virtual HRESULT StoreUInt32(ULONG value);
+    virtual HRESULT GetString(CKXString& text);
+    // Chunks with a plain header, found by readers that know nothing of the header table.
+    virtual HRESULT ChunkSafeReadOpen(ULONG id, ULONG* version);
+    virtual HRESULT ChunkSafeWriteOpen(ULONG id, ULONG version);
+
+private:
+    HRESULT _ChunkWriteClose();
+    HRESULT _ChunkReadClose();
+    HRESULT CountWriteOpen(HRESULT hr);
+    HRESULT CountReadOpen(HRESULT hr);
+    HRESULT CountClose(HRESULT hr);
+
+    ut::ComPtr<I3DStreamCompressor> compressor_;
+    BYTE lastOpenWasRead_ = 1;
+    ULONG openDepth_ = 0;
+};
+
+// The stream objects that applications open around the streams they save to and load from.
+// They answer IStream (all access goes through one shared buffer), I3DStreamCompressor and the
+// request to count chunks (IID_IGWChunkCountingStream), so that a C3DStreamHelper built over
+// them writes and reads the compact form and closes chunks left open.
+//
+// Saving: `target` is written from its current position. At position 0 it is emptied first and
+// written in the compact form (or the plain form when KX_DISABLE_STREAM_COMPRESSION was set when
+// the library loaded); elsewhere in the plain form. With a `table` stream the header table is
+// written there by KXClosePersistStream (out of line) instead of inside the data.
+UT_API HRESULT KXOpenPersistStreamForSave(IStream* target, IStream* table, IStream** stream);
+// Loading: the form is found from `source` itself (compact streams start with a marker chunk).
+// Give the `table` stream that the save wrote, or null when it had none.
+UT_API HRESULT KXOpenPersistStreamForLoad(IStream* source, IStream* table, IStream** stream);
+// Ends a save: writes the out-of-line header table, then every pending byte, and leaves the
+// target at the end of what was written. Releasing the stream without closing it writes the
+// pending bytes but no table. A second close answers S_FALSE; a stream not opened by the calls
+// above answers E_INVALIDARG.
+UT_API HRESULT KXClosePersistStream(IStream* stream);

@@ -4,11 +4,17 @@ namespace {
 std::atomic<long> g_liveObjects{0};
 }
 
-CGWCOMObject::CGWCOMObject() { g_liveObjects.fetch_add(1, std::memory_order_relaxed); }
+CGWCOMObject::CGWCOMObject() {
+    g_liveObjects.fetch_add(1, std::memory_order_relaxed);
+}
 
-CGWCOMObject::~CGWCOMObject() { g_liveObjects.fetch_sub(1, std::memory_order_relaxed); }
+CGWCOMObject::~CGWCOMObject() {
+    g_liveObjects.fetch_sub(1, std::memory_order_relaxed);
+}
 
-long CGWCOMObject::LiveCount() { return g_liveObjects.load(std::memory_order_relaxed); }
+long CGWCOMObject::LiveCount() {
+    return g_liveObjects.load(std::memory_order_relaxed);
+}
 
 HRESULT CGWCOMObject::QueryInterface(REFIID iid, void** object) {
     if (!object)
@@ -30,7 +36,9 @@ HRESULT CGWCOMObject::QueryInterface(REFIID iid, void** object) {
     return S_OK;
 }
 
-ULONG CGWCOMObject::AddRef() { return references_.fetch_add(1, std::memory_order_relaxed) + 1; }
+ULONG CGWCOMObject::AddRef() {
+    return references_.fetch_add(1, std::memory_order_relaxed) + 1;
+}
 
 ULONG CGWCOMObject::Release() {
     ULONG left = references_.fetch_sub(1, std::memory_order_acq_rel) - 1;
@@ -45,8 +53,14 @@ HRESULT CGWCOMObject::GetWeakRefContainerWithReference(IUnknown** container) {
     return E_NOTIMPL;
 }
 
-void CGWCOMObject::OnFinalRelease() { delete this; }
+void CGWCOMObject::OnFinalRelease() {
+    delete this;
+}
 
-std::span<const CGWCOMObject::InterfaceEntry> CGWCOMObject::GetInterfaceMap() const { return {}; }
+std::span<const CGWCOMObject::InterfaceEntry> CGWCOMObject::GetInterfaceMap() const {
+    return {};
+}
 
-HRESULT CGWCOMObject::Construct() { return S_OK; }
+HRESULT CGWCOMObject::Construct() {
+    return S_OK;
+}

@@ -74,7 +74,8 @@ public:
     UT_COM_OBJECT_IUNKNOWN()
 
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {UT_INTERFACE_ENTRY(ObjectFactory, IClassFactory, IID_IClassFactory)};
+        static const InterfaceEntry map[] = {
+            UT_INTERFACE_ENTRY(ObjectFactory, IClassFactory, IID_IClassFactory)};
         return map;
     }
 
@@ -115,7 +116,9 @@ HRESULT GWQueryGenericObject(REFCLSID clsid, REFIID iid, void** object) {
     return found->QueryInterface(iid, object);
 }
 
-HRESULT GWQueryGenericObject(REFCLSID clsid, void** object) { return GWQueryGenericObject(clsid, IID_IUnknown, object); }
+HRESULT GWQueryGenericObject(REFCLSID clsid, void** object) {
+    return GWQueryGenericObject(clsid, IID_IUnknown, object);
+}
 
 HRESULT KXCreateInstance(REFCLSID clsid, REFIID iid, void** object) {
     if (!object)
@@ -128,15 +131,21 @@ HRESULT KXCreateInstance(REFCLSID clsid, REFIID iid, void** object) {
     return CoCreateInstance(clsid, nullptr, CLSCTX_INPROC_SERVER, iid, object);
 }
 
-HRESULT GWRegisterGenericObject(REFCLSID clsid, IUnknown* object) { return GenericObjects().Install(clsid, object); }
+HRESULT GWRegisterGenericObject(REFCLSID clsid, IUnknown* object) {
+    return GenericObjects().Install(clsid, object);
+}
 
-HRESULT GWRevokeGenericObject(REFCLSID clsid) { return GenericObjects().Revoke(clsid); }
+HRESULT GWRevokeGenericObject(REFCLSID clsid) {
+    return GenericObjects().Revoke(clsid);
+}
 
 HRESULT GWRegisterClassFactory(REFCLSID clsid, IClassFactory* factory) {
     return ClassFactories().Install(clsid, factory);
 }
 
-HRESULT GWRevokeClassFactory(REFCLSID clsid) { return ClassFactories().Revoke(clsid); }
+HRESULT GWRevokeClassFactory(REFCLSID clsid) {
+    return ClassFactories().Revoke(clsid);
+}
 
 namespace ut::sdk {
 

@@ -32,18 +32,26 @@ CKXString& CKXString::operator=(const wchar_t* text) {
     return *this;
 }
 
-CKXString CKXString::FromGUID(REFGUID guid) { return CKXString(ut::GuidToString(guid)); }
+CKXString CKXString::FromGUID(REFGUID guid) {
+    return CKXString(ut::GuidToString(guid));
+}
 
-CKXString CKXString::Left(int count) const { return CKXString(text_.substr(0, Clamp(count, text_.size()))); }
+CKXString CKXString::Left(int count) const {
+    return CKXString(text_.substr(0, Clamp(count, text_.size())));
+}
 
 CKXString CKXString::Right(int count) const {
     std::size_t n = Clamp(count, text_.size());
     return CKXString(text_.substr(text_.size() - n));
 }
 
-void CKXString::TruncateLeft(int count) { text_.erase(0, Clamp(count, text_.size())); }
+void CKXString::TruncateLeft(int count) {
+    text_.erase(0, Clamp(count, text_.size()));
+}
 
-void CKXString::TruncateRight(int count) { text_.resize(text_.size() - Clamp(count, text_.size())); }
+void CKXString::TruncateRight(int count) {
+    text_.resize(text_.size() - Clamp(count, text_.size()));
+}
 
 int CKXString::Compare(const wchar_t* text, bool caseless) const {
     const wchar_t* a = text_.c_str();

@@ -60,12 +60,18 @@ void* CastTo(CGWCOMObject* self) {
 }
 } // namespace ut::sdk
 
-#define UT_INTERFACE_ENTRY(Object, Interface, iid)                                                       \
-    CGWCOMObject::InterfaceEntry { &(iid), &ut::sdk::CastTo<Object, Interface> }
+#define UT_INTERFACE_ENTRY(Object, Interface, iid)                                                           \
+    CGWCOMObject::InterfaceEntry {                                                                           \
+        &(iid), &ut::sdk::CastTo<Object, Interface>                                                          \
+    }
 
-#define UT_COM_OBJECT_IUNKNOWN()                                                                         \
-    HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override {                      \
-        return CGWCOMObject::QueryInterface(iid, object);                                                \
-    }                                                                                                    \
-    ULONG STDMETHODCALLTYPE AddRef() override { return CGWCOMObject::AddRef(); }                         \
-    ULONG STDMETHODCALLTYPE Release() override { return CGWCOMObject::Release(); }
+#define UT_COM_OBJECT_IUNKNOWN()                                                                             \
+    HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override {                           \
+        return CGWCOMObject::QueryInterface(iid, object);                                                    \
+    }                                                                                                        \
+    ULONG STDMETHODCALLTYPE AddRef() override {                                                              \
+        return CGWCOMObject::AddRef();                                                                       \
+    }                                                                                                        \
+    ULONG STDMETHODCALLTYPE Release() override {                                                             \
+        return CGWCOMObject::Release();                                                                      \
+    }

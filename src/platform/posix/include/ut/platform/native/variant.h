@@ -72,6 +72,12 @@ inline constexpr USHORT FADF_BSTR = 0x100;
 inline constexpr USHORT FADF_UNKNOWN = 0x200;
 inline constexpr USHORT FADF_VARIANT = 0x800;
 
+// Named outside the union: anonymous structs inside an anonymous union are an extension.
+struct tagBRECORD {
+    void* pvRecord;
+    void* pRecInfo;
+};
+
 struct VARIANT {
     VARTYPE vt;
     WORD wReserved1;
@@ -102,10 +108,7 @@ struct VARIANT {
         BSTR* pbstrVal;
         VARIANT* pvarVal;
         void* byref;
-        struct {
-            void* pvRecord;
-            void* pRecInfo;
-        } brecVal;
+        tagBRECORD brecVal;
     };
 };
 using VARIANTARG = VARIANT;

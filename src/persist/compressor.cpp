@@ -1,0 +1,530 @@
+#include <cwchar>
+#include <new>
+
+#include <ut/persist.h>
+#include <ut/sdk/ambient.h>
+#include <ut/sdk/objects.h>
+#include <ut/sdk/version.h>
+
+#include "module/state.h"
+#include "persist/packing.h"
+
+namespace {
+
+using ut::persist::kMaxPacked;
+
+// "IGAM": a compact stream starts with this empty chunk.
+constexpr ULONG kMarkerId = 0x4D414749;
+constexpr ULONG kMarkerVersion = 256;
+// "KNHC", version "0010": the header table written apart from the stream.
+constexpr ULONG kTableId = 0x43484E4B;
+constexpr ULONG kTableVersion = 0x30313030;
+constexpr ULONG kTableRows = 256;
+// Reported as the id of a header whose index byte could not be read.
+constexpr ULONG kUnreadableId = 0x30303030;
+
+LONG VersionNumber(IGWVersionInfo* info, ULONG index) {
+    wchar_t* text = nullptr;
+    if (FAILED(info->GetVersionString(index, &text)) || !text)
+        return 0;
+    std::unique_ptr<wchar_t, ut::TaskMemDeleter> owned(text);
+    return static_cast<LONG>(std::wcstol(text, nullptr, 10));
+}
+
+bool HasVersionString(IGWVersionInfo* info, ULONG index) {
+    wchar_t* text = nullptr;
+    HRESULT hr = info->GetVersionString(index, &text);
+    std::unique_ptr<wchar_t, ut::TaskMemDeleter> owned(text);
+    return SUCCEEDED(hr) && text;
+}
+
+// Hosts of the 2000 line and early 2001 builds could not take back the closing of chunks
+// opened for reading; StartDepth -1 tells the helper not to count them there.
+void ReadHostVersion(BYTE& known, LONG& startDepth) {
+    known = 0;
+    startDepth = -1;
+    ut::ComPtr<IGWVersionInfo> info;
+    if (FAILED(GWQueryGenericObject(CLSID_GWVersionInfo, IID_IGWVersionInfo, info.PutVoid())) || !info)
+        return;
+    if (!HasVersionString(info.Get(), GWVERSION_PRODUCT))
+        return;
+    known = 1;
+    startDepth = 0;
+    LONG major = VersionNumber(info.Get(), GWVERSION_MAJOR);
+    LONG build = VersionNumber(info.Get(), GWVERSION_BUILD);
+    if ((major == 2001 && build < 1015) || major == 2000)
+        startDepth = -1;
+}
+
+} // namespace
+
+C3DStreamCompressor::C3DStreamCompressor() {
+    ReadHostVersion(hostVersionKnown_, startDepth_);
+}
+
+C3DStreamCompressor::~C3DStreamCompressor() = default;
+
+// Binding to a stream.
+
+HRESULT C3DStreamCompressor::Init(IStream* stream, int tableMode, int) {
+    stream_ = ut::ComPtr<IStream>(stream);
+    helper_.reset();
+    buffer_ = nullptr;
+    tableMode_ = tableMode;
+    try {
+        helper_ = std::make_shared<CGWStreamHelper>(stream);
+    } catch (const std::bad_alloc&) {
+        return E_OUTOFMEMORY;
+    }
+    buffer_ = &helper_->Buffer();
+    if (!stream)
+        return S_OK;
+
+    LARGE_INTEGER zero{};
+    ULARGE_INTEGER position{};
+    if (FAILED(stream->Seek(zero, STREAM_SEEK_CUR, &position)) || position.QuadPart != 0)
+        return S_OK;
+    STATSTG stat{};
+    if (FAILED(stream->Stat(&stat, STATFLAG_DEFAULT)))
+        return S_OK;
+    std::unique_ptr<wchar_t, ut::TaskMemDeleter> name(stat.pwcsName);
+    streamName_ = name.get();
+
+    if (stat.cbSize.QuadPart == 0) {
+        if (ut::module::Current().streamCompressionDisabled)
+            return S_OK;
+        helper_->ChunkWriteOpen(kMarkerId, kMarkerVersion);
+        helper_->ChunkWriteClose();
+        active_ = 1;
+        return S_OK;
+    }
+    ULONG version = 0;
+    if (helper_->ChunkReadOpen(kMarkerId, &version) == S_OK) {
+        helper_->ChunkReadClose();
+        active_ = 1;
+    } else {
+        active_ = 0;
+    }
+    return S_OK;
+}
+
+HRESULT C3DStreamCompressor::PreRead(IStream* stream) {
+    if (!stream)
+        return E_POINTER;
+    CGWStreamHelper table(stream);
+    ULONG version = 0;
+    if (FAILED(table.ChunkReadOpen(kTableId, &version))) {
+        tableMode_ = 0;
+        return S_FALSE;
+    }
+    tableMode_ = 1;
+    if (version < kTableVersion)
+        return S_FALSE;
+    ULONG count = 0;
+    if (HRESULT hr = table.GetUInt32(count); FAILED(hr))
+        return hr;
+    if (count > kTableRows)
+        return E_FAIL;
+    lastIndex_ = static_cast<int>(count) - 1;
+    for (ULONG k = 0; k < count; ++k) {
+        LONG id = 0;
+        if (HRESULT hr = table.GetInt32(id); FAILED(hr))
+            return hr;
+        if (HRESULT hr = table.GetUInt32(headerTable_[k].version); FAILED(hr))
+            return hr;
+        headerTable_[k].id = static_cast<ULONG>(id);
+        headerPos_[k] = k;
+    }
+    return table.ChunkReadClose();
+}
+
+HRESULT C3DStreamCompressor::Term(IStream* stream, int skip) {
+    if (skip)
+        return S_OK;
+    if (!stream)
+        return E_POINTER;
+    CGWStreamHelper table(stream);
+    HRESULT hr = table.ChunkWriteOpen(kTableId, kTableVersion);
+    if (SUCCEEDED(hr))
+        hr = table.PutUInt32(kTableRows);
+    for (ULONG k = 0; k < kTableRows && SUCCEEDED(hr); ++k) {
+        hr = table.PutInt32(static_cast<LONG>(headerTable_[k].id));
+        if (SUCCEEDED(hr))
+            hr = table.PutUInt32(headerTable_[k].version);
+    }
+    if (SUCCEEDED(hr))
+        hr = table.ChunkWriteClose();
+    if (SUCCEEDED(hr))
+        hr = table.Flush();
+    return hr;
+}
+
+HRESULT C3DStreamCompressor::GetStartCount(ULONG& hostVersionKnown, ULONG& startDepth) {
+    hostVersionKnown = hostVersionKnown_;
+    startDepth = static_cast<ULONG>(startDepth_);
+    return S_OK;
+}
+
+// Packed values. Encoders write straight into the window when it has room at its end, and
+// decoders read straight from it when it holds a whole form; otherwise the bytes go through a
+// local copy and the same code.
+
+namespace {
+
+using ut::persist::kDecodeWindow;
+
+template <class T>
+HRESULT WritePacked(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T value) {
+    if (BYTE* room = buffer.Reserve(kMaxPacked)) {
+        buffer.Commit(pack(value, room));
+        return S_OK;
+    }
+    BYTE bytes[kMaxPacked];
+    return buffer.Write(bytes, pack(value, bytes));
+}
+
+// Decodes one integer form whose tag is at least `lowestTag`.
+HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, ULONG& value) {
+    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
+        if (bytes[0] < lowestTag) {
+            buffer.Advance(1);
+            return E_FAIL;
+        }
+        buffer.Advance(ut::persist::UnpackInteger(bytes, value));
+        return S_OK;
+    }
+    BYTE bytes[kDecodeWindow] = {};
+    buffer.ReadValue(bytes[0]); // unchecked: a missing tag stays 0, which no form has
+    if (bytes[0] < lowestTag)
+        return E_FAIL;
+    if (HRESULT hr = buffer.Read(bytes + 1, ut::persist::PayloadBytes(bytes[0])); FAILED(hr))
+        return hr;
+    ut::persist::UnpackInteger(bytes, value);
+    return S_OK;
+}
+
+HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
+    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
+        ULONG length = ut::persist::UnpackDouble(bytes, value);
+        buffer.Advance(length ? length : 1);
+        return length ? S_OK : E_FAIL;
+    }
+    BYTE bytes[kDecodeWindow] = {};
+    buffer.ReadValue(bytes[0]); // unchecked, as above
+    double probe = 0;
+    ULONG length = ut::persist::UnpackDouble(bytes, probe);
+    if (!length)
+        return E_FAIL;
+    if (HRESULT hr = buffer.Read(bytes + 1, length - 1); FAILED(hr))
+        return hr;
+    ut::persist::UnpackDouble(bytes, value);
+    return S_OK;
+}
+
+} // namespace
+
+HRESULT C3DStreamCompressor::SavePackedVarLenUInt32(const ULONG& value) {
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packUInt32_))
+        return buffer_->WriteValue(value);
+    return WritePacked(*buffer_, &ut::persist::PackUInt32, value);
+}
+
+HRESULT C3DStreamCompressor::SavePackedVarLenUInt32ForPatchBack(const ULONG& value) {
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packUInt32_))
+        return buffer_->WriteValue(value);
+    BYTE bytes[5] = {ut::persist::kTagWhole};
+    std::memcpy(bytes + 1, &value, 4);
+    return buffer_->Write(bytes, 5);
+}
+
+HRESULT C3DStreamCompressor::LoadPackedVarLenUInt32(ULONG& value) {
+    value = 0;
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packUInt32_))
+        return buffer_->ReadValue(value);
+    return ReadPackedInteger(*buffer_, ut::persist::kTagWhole, value);
+}
+
+HRESULT C3DStreamCompressor::SkipPackedVarLenUInt32() {
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packUInt32_))
+        return buffer_->Move(false, 4);
+    ULONG scratch = 0;
+    return LoadPackedVarLenUInt32(scratch);
+}
+
+HRESULT C3DStreamCompressor::SavePackedVarLenInt32(const LONG& value) {
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packInt32_))
+        return buffer_->WriteValue(value);
+    return WritePacked(*buffer_, &ut::persist::PackInt32, value);
+}
+
+HRESULT C3DStreamCompressor::SavePackedVarLenInt32ForPatchBack(const LONG&) {
+    return E_NOTIMPL;
+}
+
+HRESULT C3DStreamCompressor::LoadPackedVarLenInt32(LONG& value) {
+    value = 0;
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packInt32_))
+        return buffer_->ReadValue(value);
+    ULONG bits = 0;
+    HRESULT hr = ReadPackedInteger(*buffer_, ut::persist::kTagNegWhole, bits);
+    value = static_cast<LONG>(bits);
+    return hr;
+}
+
+HRESULT C3DStreamCompressor::SkipPackedVarLenInt32() {
+    LONG scratch = 0;
+    LoadPackedVarLenInt32(scratch);
+    return S_OK;
+}
+
+HRESULT C3DStreamCompressor::SaveVarLenDouble(const double& value) {
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packDouble_))
+        return buffer_->WriteValue(value);
+    return WritePacked(*buffer_, &ut::persist::PackDouble, value);
+}
+
+HRESULT C3DStreamCompressor::LoadVarLenDouble(double& value) {
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packDouble_))
+        return buffer_->ReadValue(value);
+    return ReadPackedDouble(*buffer_, value);
+}
+
+// A plain double takes 8 bytes, but the skip moves 4 like the integer skips: streams written so
+// are read so.
+HRESULT C3DStreamCompressor::SkipVarLenDouble() {
+    if (!buffer_)
+        return E_UNEXPECTED;
+    if (!Packing(packDouble_))
+        return buffer_->Move(false, 4);
+    double scratch = 0;
+    return LoadVarLenDouble(scratch);
+}
+
+HRESULT C3DStreamCompressor::SaveGUID(const GUID&) {
+    return E_NOTIMPL;
+}
+HRESULT C3DStreamCompressor::LoadGUID(GUID&) {
+    return E_NOTIMPL;
+}
+
+// Chunk headers.
+
+HRESULT C3DStreamCompressor::PutChunkHeader(ULONG id, ULONG version) {
+    if (!active_ || !packHeaders_) {
+        ULONG plain[2] = {id, version};
+        return buffer_->WriteValue(plain);
+    }
+    for (int row = 0; row <= lastIndex_; ++row) {
+        if (headerTable_[row].id == id && headerTable_[row].version == version)
+            return buffer_->WriteValue(static_cast<BYTE>(row));
+    }
+    if (lastIndex_ + 1 >= static_cast<int>(kTableRows))
+        return KX_E_CHUNKTABLEFULL;
+    int row = lastIndex_ + 1;
+    HRESULT hr = S_OK;
+    if (tableMode_) {
+        hr = buffer_->WriteValue(static_cast<BYTE>(row));
+    } else {
+        BYTE definition[9] = {static_cast<BYTE>(row)};
+        std::memcpy(definition + 1, &id, 4);
+        std::memcpy(definition + 5, &version, 4);
+        hr = buffer_->WriteValue(definition);
+    }
+    if (FAILED(hr))
+        return hr;
+    headerTable_[row] = {version, id};
+    lastIndex_ = row;
+    return S_OK;
+}
+
+HRESULT C3DStreamCompressor::GetChunkHeader(ULONG& id, ULONG& version, bool record) {
+    if (!active_ || !packHeaders_) {
+        ULONG plain[2] = {};
+        HRESULT hr = buffer_->ReadValue(plain);
+        id = plain[0];
+        version = plain[1];
+        return hr;
+    }
+    BYTE index = 0;
+    if (HRESULT hr = buffer_->ReadValue(index); FAILED(hr)) {
+        id = kUnreadableId;
+        return hr;
+    }
+    auto position = static_cast<ULONG>(buffer_->Position());
+    HeaderRow& row = headerTable_[index];
+    if (headerPos_[index] != 0 && headerPos_[index] != position) {
+        id = row.id;
+        version = row.version;
+        return S_OK;
+    }
+    // The row's definition: first sight, or the same definition again at the same place.
+    if (record)
+        headerPos_[index] = position;
+    if (!tableMode_) {
+        ULONG pair[2] = {};
+        if (HRESULT hr = buffer_->ReadValue(pair); FAILED(hr))
+            return hr;
+        if (record)
+            row = {pair[1], pair[0]};
+        id = pair[0];
+        version = pair[1];
+        return S_OK;
+    }
+    id = row.id;
+    version = row.version;
+    return S_OK;
+}
+
+// Chunks.
+
+HRESULT C3DStreamCompressor::PushReadEnd(ULONGLONG end) {
+    try {
+        readEnds_.push_back(end);
+    } catch (const std::bad_alloc&) {
+        return E_OUTOFMEMORY;
+    }
+    return S_OK;
+}
+
+HRESULT C3DStreamCompressor::PushWriteStart() {
+    try {
+        writeStarts_.push_back(buffer_->Position());
+    } catch (const std::bad_alloc&) {
+        return E_OUTOFMEMORY;
+    }
+    return S_OK;
+}
+
+HRESULT C3DStreamCompressor::ChunkWriteOpen(ULONG id, ULONG version) {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    ut::sdk::Rewind rewind(*buffer_);
+    HRESULT hr = PutChunkHeader(id, version);
+    if (SUCCEEDED(hr))
+        hr = buffer_->WriteValue(ULONG{0});
+    if (SUCCEEDED(hr))
+        hr = PushWriteStart();
+    return rewind(hr);
+}
+
+HRESULT C3DStreamCompressor::ChunkSafeWriteOpen(ULONG id, ULONG version) {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    ut::sdk::Rewind rewind(*buffer_);
+    ULONG header[3] = {id, version, 0};
+    HRESULT hr = buffer_->WriteValue(header);
+    if (SUCCEEDED(hr))
+        hr = PushWriteStart();
+    return rewind(hr);
+}
+
+HRESULT C3DStreamCompressor::ChunkWriteClose() {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    return ut::sdk::CloseWrittenChunk(*buffer_, writeStarts_);
+}
+
+HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    ut::sdk::Rewind rewind(*buffer_);
+    ULONG foundId = 0, foundVersion = 0;
+    if (HRESULT hr = GetChunkHeader(foundId, foundVersion, true); FAILED(hr))
+        return rewind(hr);
+    if (foundId != id)
+        return rewind(STG_E_INVALIDHEADER);
+    ULONG size = 0;
+    if (HRESULT hr = buffer_->ReadValue(size); FAILED(hr))
+        return rewind(hr);
+    if (HRESULT hr = PushReadEnd(buffer_->Position() + size); FAILED(hr))
+        return rewind(hr);
+    if (version)
+        *version = foundVersion;
+    return S_OK;
+}
+
+// Reads of the plain header go unchecked: a header cut short reads as zeros.
+HRESULT C3DStreamCompressor::ChunkSafeReadOpen(ULONG id, ULONG* version) {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    ut::sdk::Rewind rewind(*buffer_);
+    ULONG foundId = 0, foundVersion = 0, size = 0;
+    buffer_->ReadValue(foundId);
+    if (foundId != id)
+        return rewind(STG_E_INVALIDHEADER);
+    buffer_->ReadValue(foundVersion);
+    buffer_->ReadValue(size);
+    if (HRESULT hr = PushReadEnd(buffer_->Position() + size); FAILED(hr))
+        return rewind(hr);
+    if (version)
+        *version = foundVersion;
+    return S_OK;
+}
+
+HRESULT C3DStreamCompressor::ChunkPeekHeader(ULONG* id, ULONG* version) {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    if (!id)
+        return E_POINTER;
+    ut::sdk::Rewind rewind(*buffer_);
+    ULONG foundId = 0, foundVersion = 0;
+    HRESULT hr = GetChunkHeader(foundId, foundVersion, false);
+    rewind.Always();
+    *id = foundId;
+    if (version)
+        *version = foundVersion;
+    return hr;
+}
+
+bool C3DStreamCompressor::ImportingDelta() const {
+    ut::ComPtr<IGWAmbientValues> ambient;
+    if (FAILED(KXGetAmbientValuesMgr(ambient.Put())) || !ambient)
+        return false;
+    BOOL importing = FALSE;
+    return SUCCEEDED(ambient->GetBool(L"referencing.importingdelta", &importing)) && importing;
+}
+
+HRESULT C3DStreamCompressor::ChunkReadClose() {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    if (readEnds_.empty())
+        return E_UNEXPECTED;
+    ULONGLONG end = readEnds_.back();
+    readEnds_.pop_back();
+    // While a delta is imported the reader stays where the object left it.
+    if (ImportingDelta())
+        return S_OK;
+    return buffer_->SetPosition(end);
+}
+
+// The header is read, not only stepped over: a definition skipped unread would leave the later
+// references to its row unreadable.
+HRESULT C3DStreamCompressor::SkipChunk() {
+    if (!active_)
+        return STG_E_OLDFORMAT;
+    ut::sdk::Rewind rewind(*buffer_);
+    ULONG id = 0, version = 0;
+    HRESULT hr = GetChunkHeader(id, version, true);
+    ULONG size = 0;
+    if (SUCCEEDED(hr))
+        hr = buffer_->ReadValue(size);
+    if (SUCCEEDED(hr))
+        hr = buffer_->Move(false, size);
+    return rewind(hr);
+}

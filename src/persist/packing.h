@@ -1,0 +1,201 @@
+// The packed forms of 32-bit integers and doubles on compact streams. The first byte is a tag:
+// its high nibble names the form, its low nibble carries the value's lowest four bits (integers)
+// or the whole form (doubles). Every Pack function writes at most kMaxPacked bytes.
+#pragma once
+
+#include <bit>
+#include <cmath>
+#include <cstring>
+
+#include <ut/platform/com.h>
+
+namespace ut::persist {
+
+inline constexpr ULONG kMaxPacked = 9;
+
+// Tags of the integer forms (high nibble).
+inline constexpr BYTE kTagNibble = 0xF0; // value in the tag
+inline constexpr BYTE kTagByte = 0xE0;   // one more byte
+inline constexpr BYTE kTagWord = 0xD0;   // two more bytes
+inline constexpr BYTE kTagTriple = 0xC0; // three more bytes
+inline constexpr BYTE kTagWhole = 0xB0;  // the whole value follows
+// Negative forms of the signed integers, in the same order.
+inline constexpr BYTE kTagNegNibble = 0xA0;
+inline constexpr BYTE kTagNegByte = 0x90;
+inline constexpr BYTE kTagNegWord = 0x80;
+inline constexpr BYTE kTagNegTriple = 0x70;
+inline constexpr BYTE kTagNegWhole = 0x60;
+
+// Tags of the double forms (whole byte).
+inline constexpr BYTE kDoubleInt8 = 0xF8;
+inline constexpr BYTE kDoubleInt16 = 0xF9;
+inline constexpr BYTE kDoubleFloat = 0xFB;
+inline constexpr BYTE kDoubleWhole = 0xFC;
+inline constexpr BYTE kDoubleMinusOne = 0xFD;
+inline constexpr BYTE kDoubleOne = 0xFE;
+inline constexpr BYTE kDoubleZero = 0xFF;
+
+namespace detail {
+
+// The integer forms by the number of bits a magnitude needs: the form's place in the tag order
+// (0: the nibble form ... 4: the whole form). Unsigned values keep 4 bits in the tag and 8, 16
+// or 24 after it; signed ones stop one bit short of each, hence their symmetric bounds.
+inline constexpr BYTE kUnsignedForm[33] = {0, 0, 0, 0, 0, 1, 1, 1, 1, 1, 1, 1, 1, 2, 2, 2, 2,
+                                           2, 2, 2, 2, 3, 3, 3, 3, 3, 3, 3, 3, 4, 4, 4, 4};
+inline constexpr BYTE kSignedForm[33] = {0, 0, 0, 0, 1, 1, 1, 1, 1, 1, 1, 1, 2, 2, 2, 2, 2,
+                                         2, 2, 2, 3, 3, 3, 3, 4, 4, 4, 4, 4, 4, 4, 4, 4};
+inline constexpr BYTE kPositiveTags[5] = {kTagNibble, kTagByte, kTagWord, kTagTriple, kTagWhole};
+inline constexpr BYTE kNegativeTags[5] = {kTagNegNibble, kTagNegByte, kTagNegWord, kTagNegTriple,
+                                          kTagNegWhole};
+inline constexpr BYTE kPayloadOfForm[5] = {0, 1, 2, 3, 4};
+
+// Writes the tag and the payload of `form` for the 32 bits of a value; `shifted` is the value
+// shifted right by 4 (arithmetically for signed values). Always stores 5 bytes.
+inline ULONG PutForm(BYTE* out, BYTE tag, unsigned form, ULONG bits, ULONG shifted) {
+    bool whole = form == 4;
+    out[0] = static_cast<BYTE>(whole ? tag : tag | (bits & 15));
+    ULONG payload = whole ? bits : shifted;
+    std::memcpy(out + 1, &payload, 4);
+    return kPayloadOfForm[form] + 1u;
+}
+
+} // namespace detail
+
+// The form is looked up from the value's bit width rather than found by comparisons, so that a
+// mix of magnitudes costs no mispredicted branches.
+inline ULONG PackUInt32(ULONG value, BYTE* out) {
+    unsigned form = detail::kUnsignedForm[std::bit_width(value)];
+    return detail::PutForm(out, detail::kPositiveTags[form], form, value, value >> 4);
+}
+
+// The bounds are symmetric on purpose: -8, -2048, -524288 and -8388608 take the next form.
+inline ULONG PackInt32(LONG value, BYTE* out) {
+    bool negative = value < 0;
+    auto bits = static_cast<ULONG>(value);
+    ULONG magnitude = negative ? 0u - bits : bits;
+    unsigned form = detail::kSignedForm[std::bit_width(magnitude)];
+    auto shifted = static_cast<ULONG>(value >> 4); // arithmetic: negative forms keep their sign
+    return detail::PutForm(out, negative ? detail::kNegativeTags[form] : detail::kPositiveTags[form], form,
+                           bits, shifted);
+}
+
+namespace detail {
+
+// `a` when `condition` holds, else `b`, without a branch.
+template <class T>
+T Select(bool condition, T a, T b) {
+    return b ^ ((a ^ b) & (T{0} - static_cast<T>(condition)));
+}
+
+inline constexpr BYTE kDoubleLengths[8] = {2, 3, 0, 5, 9, 1, 1, 1};
+
+} // namespace detail
+
+// -0.0 compares equal to 0.0 and so reads back as +0.0. Large integral values skip the float
+// form on purpose. Every candidate form is computed and the tests pick one with masks, so that a
+// mix of values costs no mispredicted branches.
+inline ULONG PackDouble(double value, BYTE* out) {
+    using detail::Select;
+    double magnitude = std::fabs(value);
+    // Below 2^63 a value is integral when truncation keeps it; above, every finite value is.
+    bool convertible = magnitude < 9.2e18;
+    auto truncated = static_cast<LONGLONG>(convertible ? value : 0.0);
+    bool integral = (static_cast<double>(truncated) == value) | (!convertible & (value == value));
+    bool floatRange = magnitude <= 3.4e38;
+    auto single = static_cast<float>(floatRange ? value : 0.0);
+    bool exactFloat = floatRange & (static_cast<double>(single) == value);
+
+    ULONGLONG singleBits = 0, payload = 0;
+    std::memcpy(&singleBits, &single, 4);
+    std::memcpy(&payload, &value, 8);
+    auto integer = static_cast<ULONGLONG>(truncated);
+    unsigned form = kDoubleWhole - kDoubleInt8;
+    payload = Select<ULONGLONG>(exactFloat & !integral, singleBits, payload);
+    form = Select(exactFloat & !integral, unsigned{kDoubleFloat - kDoubleInt8}, form);
+    bool medium = integral & (magnitude <= 32767);
+    payload = Select<ULONGLONG>(medium, integer & 0xFFFF, payload);
+    form = Select(medium, unsigned{kDoubleInt16 - kDoubleInt8}, form);
+    bool small = integral & (magnitude <= 127);
+    payload = Select<ULONGLONG>(small, integer & 0xFF, payload);
+    form = Select(small, 0u, form);
+    form = Select(value == -1.0, unsigned{kDoubleMinusOne - kDoubleInt8}, form);
+    form = Select(value == 1.0, unsigned{kDoubleOne - kDoubleInt8}, form);
+    form = Select(value == 0.0, unsigned{kDoubleZero - kDoubleInt8}, form);
+
+    out[0] = static_cast<BYTE>(kDoubleInt8 + form);
+    std::memcpy(out + 1, &payload, 8);
+    return detail::kDoubleLengths[form];
+}
+
+// Room a decoder wants in front of it to decode any form from memory.
+inline constexpr ULONG kDecodeWindow = 9;
+
+namespace detail {
+
+// An integer form, by the tag's high nibble.
+struct IntegerForm {
+    BYTE length; // bytes after the tag
+    bool whole;  // the value follows the tag as it is
+    ULONG mask;  // the payload's share of the four bytes after the tag
+    ULONG fill;  // the high bits of a negative form
+};
+
+inline constexpr IntegerForm kIntegerForms[16] = {
+    {},
+    {},
+    {},
+    {},
+    {},
+    {},
+    {4, true, 0, 0},                   // 0x60
+    {3, false, 0xFFFFFF, 0xF0000000u}, // 0x70
+    {2, false, 0xFFFF, 0xFFF00000u},   // 0x80
+    {1, false, 0xFF, 0xFFFFF000u},     // 0x90
+    {0, false, 0, 0xFFFFFFF0u},        // 0xA0
+    {4, true, 0, 0},                   // 0xB0
+    {3, false, 0xFFFFFF, 0},           // 0xC0
+    {2, false, 0xFFFF, 0},             // 0xD0
+    {1, false, 0xFF, 0},               // 0xE0
+    {0, false, 0, 0},                  // 0xF0
+};
+
+} // namespace detail
+
+// Decodes the integer form at `bytes` (kDecodeWindow readable bytes; the tag already known to
+// be valid) without branching on the form, and returns the bytes it takes.
+inline ULONG UnpackInteger(const BYTE* bytes, ULONG& value) {
+    const detail::IntegerForm& form = detail::kIntegerForms[bytes[0] >> 4];
+    ULONG word = 0;
+    std::memcpy(&word, bytes + 1, 4);
+    ULONG packed = form.fill | ((word & form.mask) << 4) | (bytes[0] & 15u);
+    value = form.whole ? word : packed;
+    return form.length + 1u;
+}
+
+// Payload bytes after the tag of an integer form, from the tag.
+inline ULONG PayloadBytes(BYTE tag) {
+    return detail::kIntegerForms[tag >> 4].length;
+}
+
+// Decodes the double form at `bytes` (kDecodeWindow readable bytes) and returns the bytes it
+// takes, or 0 for a tag no form has. Every form is converted and the tag picks one, so that a
+// mix of forms costs no mispredicted branches.
+inline ULONG UnpackDouble(const BYTE* bytes, double& value) {
+    BYTE tag = bytes[0];
+    if (tag < kDoubleInt8 || tag == 0xFA)
+        return 0;
+    signed char small = 0;
+    SHORT medium = 0;
+    float single = 0;
+    double whole = 0;
+    std::memcpy(&small, bytes + 1, 1);
+    std::memcpy(&medium, bytes + 1, 2);
+    std::memcpy(&single, bytes + 1, 4);
+    std::memcpy(&whole, bytes + 1, 8);
+    const double candidates[8] = {
+        static_cast<double>(small), static_cast<double>(medium), 0, single, whole, -1.0, 1.0, 0.0};
+    value = candidates[tag - kDoubleInt8];
+    return detail::kDoubleLengths[tag - kDoubleInt8];
+}
+
+} // namespace ut::persist

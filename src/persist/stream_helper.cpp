@@ -1,0 +1,196 @@
+#include <cstdlib>
+
+#include <ut/persist.h>
+
+namespace {
+
+constexpr ULONG kCountingOff = 0xFFFFFFFF;
+
+// Calls the compressor when there is one; the base's operation when there is none or when the
+// compressor declines a chunk call on a plain stream (and only then).
+template <class ViaCompressor, class ViaBase>
+HRESULT Route(I3DStreamCompressor* compressor, ViaCompressor viaCompressor, ViaBase viaBase) {
+    if (!compressor)
+        return viaBase();
+    HRESULT hr = viaCompressor(compressor);
+    return hr == STG_E_OLDFORMAT ? viaBase() : hr;
+}
+
+} // namespace
+
+C3DStreamHelper::C3DStreamHelper(IStream* stream) : CGWStreamHelper(stream) {
+    if (!stream)
+        return;
+    stream->QueryInterface(IID_I3DStreamCompressor, compressor_.PutVoid());
+    ut::ComPtr<IUnknown> counting;
+    if (SUCCEEDED(stream->QueryInterface(IID_IGWChunkCountingStream, counting.PutVoid())) && counting)
+        return;
+    if (!compressor_) {
+        openDepth_ = kCountingOff;
+        return;
+    }
+    ULONG hostVersionKnown = 0;
+    ULONG startDepth = 0;
+    compressor_->GetStartCount(hostVersionKnown, startDepth);
+    openDepth_ = startDepth;
+    ut::ComPtr<IGWStreamCapabilities> capabilities;
+    if (SUCCEEDED(stream->QueryInterface(IID_IGWStreamCapabilities, capabilities.PutVoid())) &&
+        capabilities && hostVersionKnown == 0 && !capabilities->HasCapability(2))
+        openDepth_ = kCountingOff;
+}
+
+// Whatever an object left open is closed, innermost first, in the mode of the last open.
+C3DStreamHelper::~C3DStreamHelper() {
+    if (openDepth_ == 0 || openDepth_ == kCountingOff)
+        return;
+    for (ULONG remaining = openDepth_; remaining > 0; --remaining)
+        CountClose(lastOpenWasRead_ ? _ChunkReadClose() : _ChunkWriteClose());
+}
+
+// Counting of open chunks. Writing always counts, even on a stream where reading does not.
+
+HRESULT C3DStreamHelper::CountWriteOpen(HRESULT hr) {
+    if (openDepth_ == kCountingOff)
+        openDepth_ = 0;
+    if (SUCCEEDED(hr)) {
+        lastOpenWasRead_ = 0;
+        ++openDepth_;
+    }
+    return hr;
+}
+
+HRESULT C3DStreamHelper::CountReadOpen(HRESULT hr) {
+    if (SUCCEEDED(hr) && openDepth_ != kCountingOff) {
+        lastOpenWasRead_ = 1;
+        ++openDepth_;
+    }
+    return hr;
+}
+
+HRESULT C3DStreamHelper::CountClose(HRESULT hr) {
+    if (SUCCEEDED(hr) && openDepth_ != kCountingOff)
+        --openDepth_;
+    return hr;
+}
+
+// Values.
+
+HRESULT C3DStreamHelper::PutUInt32(ULONG value) {
+    return compressor_ ? compressor_->SavePackedVarLenUInt32(value) : CGWStreamHelper::PutUInt32(value);
+}
+
+HRESULT C3DStreamHelper::GetUInt32(ULONG& value) {
+    return compressor_ ? compressor_->LoadPackedVarLenUInt32(value) : CGWStreamHelper::GetUInt32(value);
+}
+
+HRESULT C3DStreamHelper::SkipUInt32() {
+    return compressor_ ? compressor_->SkipPackedVarLenUInt32() : CGWStreamHelper::SkipUInt32();
+}
+
+HRESULT C3DStreamHelper::StoreUInt32(ULONG value) {
+    return compressor_ ? compressor_->SavePackedVarLenUInt32ForPatchBack(value) : PutUInt32(value);
+}
+
+HRESULT C3DStreamHelper::PutInt32(LONG value) {
+    return compressor_ ? compressor_->SavePackedVarLenInt32(value) : CGWStreamHelper::PutInt32(value);
+}
+
+HRESULT C3DStreamHelper::GetInt32(LONG& value) {
+    return compressor_ ? compressor_->LoadPackedVarLenInt32(value) : CGWStreamHelper::GetInt32(value);
+}
+
+HRESULT C3DStreamHelper::SkipInt32() {
+    return compressor_ ? compressor_->SkipPackedVarLenInt32() : CGWStreamHelper::SkipInt32();
+}
+
+HRESULT C3DStreamHelper::PutDouble(double value) {
+    return compressor_ ? compressor_->SaveVarLenDouble(value) : CGWStreamHelper::PutDouble(value);
+}
+
+HRESULT C3DStreamHelper::GetDouble(double& value) {
+    return compressor_ ? compressor_->LoadVarLenDouble(value) : CGWStreamHelper::GetDouble(value);
+}
+
+HRESULT C3DStreamHelper::SkipDouble() {
+    return compressor_ ? compressor_->SkipVarLenDouble() : CGWStreamHelper::SkipDouble();
+}
+
+// Strings always take the base's wide-string form.
+
+HRESULT C3DStreamHelper::PutString(const CKXString& text) {
+    return CGWStreamHelper::PutUnicodeString(text.Length() ? text.c_str() : L"", -1);
+}
+
+HRESULT C3DStreamHelper::GetString(CKXString& text) {
+    ULONG length = 0;
+    CGWStreamHelper::GetStringLength(&length);
+    auto* buffer =
+        static_cast<wchar_t*>(std::malloc((static_cast<std::size_t>(length) + 1) * sizeof(wchar_t)));
+    if (!buffer)
+        return E_OUTOFMEMORY;
+    HRESULT hr = CGWStreamHelper::GetUnicodeString(buffer, static_cast<LONG>(length + 1));
+    if (FAILED(hr)) {
+        std::free(buffer);
+        return hr;
+    }
+    text.Attach_CRT(buffer);
+    return S_OK;
+}
+
+// Chunks.
+
+HRESULT C3DStreamHelper::ChunkPeekHeader(ULONG* id, ULONG* version) {
+    return Route(
+        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkPeekHeader(id, version); },
+        [&] { return CGWStreamHelper::ChunkPeekHeader(id, version); });
+}
+
+HRESULT C3DStreamHelper::SkipChunk() {
+    return Route(
+        compressor_.Get(), [](I3DStreamCompressor* c) { return c->SkipChunk(); },
+        [&] { return CGWStreamHelper::SkipChunk(); });
+}
+
+HRESULT C3DStreamHelper::ChunkWriteOpen(ULONG id, ULONG version) {
+    return CountWriteOpen(Route(
+        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkWriteOpen(id, version); },
+        [&] { return CGWStreamHelper::ChunkWriteOpen(id, version); }));
+}
+
+HRESULT C3DStreamHelper::ChunkSafeWriteOpen(ULONG id, ULONG version) {
+    return CountWriteOpen(Route(
+        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkSafeWriteOpen(id, version); },
+        [&] { return CGWStreamHelper::ChunkWriteOpen(id, version); }));
+}
+
+HRESULT C3DStreamHelper::ChunkReadOpen(ULONG id, ULONG* version) {
+    return CountReadOpen(Route(
+        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkReadOpen(id, version); },
+        [&] { return CGWStreamHelper::ChunkReadOpen(id, version); }));
+}
+
+HRESULT C3DStreamHelper::ChunkSafeReadOpen(ULONG id, ULONG* version) {
+    return CountReadOpen(Route(
+        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkSafeReadOpen(id, version); },
+        [&] { return CGWStreamHelper::ChunkReadOpen(id, version); }));
+}
+
+HRESULT C3DStreamHelper::ChunkWriteClose() {
+    return CountClose(_ChunkWriteClose());
+}
+
+HRESULT C3DStreamHelper::ChunkReadClose() {
+    return CountClose(_ChunkReadClose());
+}
+
+HRESULT C3DStreamHelper::_ChunkWriteClose() {
+    return Route(
+        compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkWriteClose(); },
+        [&] { return CGWStreamHelper::ChunkWriteClose(); });
+}
+
+HRESULT C3DStreamHelper::_ChunkReadClose() {
+    return Route(
+        compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkReadClose(); },
+        [&] { return CGWStreamHelper::ChunkReadClose(); });
+}
