@@ -90,6 +90,15 @@ TEST_P(StreamTest, ReadingUpToTheEndSucceeds) {
     EXPECT_EQ(got, 2u);
 }
 
+TEST_P(StreamTest, ReadingPastTheEndGivesNothingAndSucceeds) {
+    ASSERT_EQ(stream_->Write("abc", 3, nullptr), S_OK);
+    ASSERT_EQ(stream_->Seek(Offset(0x7FFF0000), STREAM_SEEK_SET, nullptr), S_OK);
+    char buffer[8];
+    ULONG got = 99;
+    EXPECT_EQ(stream_->Read(buffer, sizeof buffer, &got), S_OK);
+    EXPECT_EQ(got, 0u);
+}
+
 TEST_P(StreamTest, RefusedSeeksKeepThePosition) {
     ASSERT_EQ(stream_->Write("abc", 3, nullptr), S_OK);
     EXPECT_EQ(stream_->Seek(Offset(-4), STREAM_SEEK_CUR, nullptr), STG_E_INVALIDFUNCTION);

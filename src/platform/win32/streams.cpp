@@ -48,6 +48,16 @@ public:
             return STG_E_INVALIDPOINTER;
         if (!CanRead(mode_))
             return STG_E_ACCESSDENIED;
+        // The system's memory stream miscounts what is left when its position is past its end.
+        if (inMemory_) {
+            ULONGLONG position = 0, size = 0;
+            if (HRESULT hr = Position(position); FAILED(hr))
+                return hr;
+            if (HRESULT hr = Size(size); FAILED(hr))
+                return hr;
+            if (position >= size)
+                return S_OK;
+        }
         HRESULT hr = inner_->Read(buffer, count, read);
         return hr == S_FALSE ? S_OK : hr;
     }
