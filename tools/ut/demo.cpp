@@ -107,6 +107,79 @@ int ShowMemoryPool() {
     return reused && keptBefore == 1 && pool.TotalFreeCount == 0 ? 0 : 1;
 }
 
+// A small scene: objects with a name, an id, a transform and a chunk of parameters.
+constexpr int kSceneObjects = 200;
+
+void WriteScene(C3DStreamHelper& out) {
+    for (int i = 0; i < kSceneObjects; ++i) {
+        out.ChunkWriteOpen("OBJ ", 3);
+        out.PutString(CKXString(L"object") + std::to_wstring(i).c_str());
+        out.PutUInt32(static_cast<ULONG>(1000 + i));
+        for (int k = 0; k < 12; ++k)
+            out.PutDouble(k % 5 == 0 ? 1.0 : (k == 11 ? i * 0.5 : 0.0));
+        out.ChunkWriteOpen("PARM", 1);
+        out.PutInt32(-i);
+        out.PutDouble(0.1 * i);
+        out.ChunkWriteClose();
+        out.ChunkWriteClose();
+    }
+}
+
+// Reads the scene back and answers how many objects it found with the ids they were given.
+int ReadScene(C3DStreamHelper& in) {
+    int found = 0;
+    for (int i = 0; i < kSceneObjects; ++i) {
+        ULONG version = 0, id = 0;
+        CKXString name;
+        if (in.ChunkReadOpen("OBJ ", &version) != S_OK || FAILED(in.GetString(name)) ||
+            FAILED(in.GetUInt32(id)))
+            break;
+        found += id == static_cast<ULONG>(1000 + i) ? 1 : 0;
+        in.ChunkReadClose(); // skips the transform and the parameters
+    }
+    return found;
+}
+
+ULONGLONG StreamSize(IStream* stream) {
+    STATSTG stat{};
+    return SUCCEEDED(stream->Stat(&stat, STATFLAG_NONAME)) ? stat.cbSize.QuadPart : 0;
+}
+
+int ShowPersistence() {
+    ut::ComPtr<IStream> plain, compact, saving;
+    if (FAILED(ut::platform::CreateMemoryStream(plain.Put())) ||
+        FAILED(ut::platform::CreateMemoryStream(compact.Put())))
+        return 1;
+    {
+        C3DStreamHelper out(plain.Get()); // a bare stream: the plain form older savers wrote
+        WriteScene(out);
+    }
+    if (FAILED(KXOpenPersistStreamForSave(compact.Get(), nullptr, saving.Put())))
+        return 1;
+    {
+        C3DStreamHelper out(saving.Get());
+        WriteScene(out);
+    }
+    KXClosePersistStream(saving.Get());
+    saving.Reset();
+
+    LARGE_INTEGER start{};
+    compact->Seek(start, STREAM_SEEK_SET, nullptr);
+    ut::ComPtr<IStream> loading;
+    if (FAILED(KXOpenPersistStreamForLoad(compact.Get(), nullptr, loading.Put())))
+        return 1;
+    C3DStreamHelper in(loading.Get());
+    int found = ReadScene(in);
+    ULONGLONG plainBytes = StreamSize(plain.Get()), compactBytes = StreamSize(compact.Get());
+    std::printf("persist     %d objects: plain %llu bytes, compact %llu bytes (%.0f%%); read back %d\n",
+                kSceneObjects, static_cast<unsigned long long>(plainBytes),
+                static_cast<unsigned long long>(compactBytes),
+                plainBytes ? 100.0 * static_cast<double>(compactBytes) / static_cast<double>(plainBytes)
+                           : 0.0,
+                found);
+    return found == kSceneObjects ? 0 : 1;
+}
+
 } // namespace
 
 int Demo(const Arguments&) {
@@ -115,8 +188,8 @@ int Demo(const Arguments&) {
         std::fprintf(stderr, "ut: the reference host did not start\n");
         return 1;
     }
-    int failures =
-        ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowVersions() + ShowMemoryPool();
+    int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowPersistence() +
+                   ShowVersions() + ShowMemoryPool();
     return failures ? 1 : 0;
 }
 
