@@ -14,33 +14,10 @@ constexpr USHORT kMaxDimensions = 64;
 // Bytes of the value of a plain numeric type, 0 for the types without a value, -1 for types
 // that are not plain numbers.
 int PlainSize(VARTYPE type) {
-    switch (type) {
-    case VT_EMPTY:
-    case VT_NULL:
+    if (type == VT_EMPTY || type == VT_NULL)
         return 0;
-    case VT_I1:
-    case VT_UI1:
-        return 1;
-    case VT_I2:
-    case VT_UI2:
-    case VT_BOOL:
-        return 2;
-    case VT_I4:
-    case VT_UI4:
-    case VT_INT:
-    case VT_UINT:
-    case VT_R4:
-    case VT_ERROR:
-        return 4;
-    case VT_I8:
-    case VT_UI8:
-    case VT_R8:
-    case VT_CY:
-    case VT_DATE:
-        return 8;
-    default:
-        return -1;
-    }
+    ULONG size = ut::NumericSize(type);
+    return size ? static_cast<int>(size) : -1;
 }
 
 // The fewest stream bytes one element of an array of `type` takes, or 0 when arrays of that

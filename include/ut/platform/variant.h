@@ -8,6 +8,35 @@
 
 namespace ut {
 
+// Bytes of a value of a fixed-size numeric type (VT_I1 to VT_DATE, booleans and error codes
+// included), 0 for every other type.
+constexpr ULONG NumericSize(VARTYPE type) {
+    switch (type) {
+    case VT_I1:
+    case VT_UI1:
+        return 1;
+    case VT_I2:
+    case VT_UI2:
+    case VT_BOOL:
+        return 2;
+    case VT_I4:
+    case VT_UI4:
+    case VT_R4:
+    case VT_INT:
+    case VT_UINT:
+    case VT_ERROR:
+        return 4;
+    case VT_I8:
+    case VT_UI8:
+    case VT_R8:
+    case VT_CY:
+    case VT_DATE:
+        return 8;
+    default:
+        return 0;
+    }
+}
+
 struct BstrDeleter {
     void operator()(OLECHAR* text) const noexcept { SysFreeString(text); }
 };

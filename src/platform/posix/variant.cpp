@@ -35,27 +35,9 @@ BSTR AllocateBstr(std::size_t bytes) {
 }
 
 ULONG ElementSize(VARTYPE type) {
+    if (ULONG size = ut::NumericSize(type))
+        return size;
     switch (type) {
-    case VT_I1:
-    case VT_UI1:
-        return 1;
-    case VT_I2:
-    case VT_UI2:
-    case VT_BOOL:
-        return 2;
-    case VT_I4:
-    case VT_UI4:
-    case VT_R4:
-    case VT_INT:
-    case VT_UINT:
-    case VT_ERROR:
-        return 4;
-    case VT_I8:
-    case VT_UI8:
-    case VT_R8:
-    case VT_CY:
-    case VT_DATE:
-        return 8;
     case VT_BSTR:
     case VT_UNKNOWN:
     case VT_DISPATCH:
