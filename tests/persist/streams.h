@@ -11,42 +11,12 @@
 #include <ut/persist.h>
 #include <ut/platform/stream.h>
 
+#include "support/streams.h"
+
 namespace ut::test {
 
-using Bytes = std::vector<std::uint8_t>;
-
 inline ComPtr<IStream> NewMemoryStream() {
-    ComPtr<IStream> stream;
-    EXPECT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
-    return stream;
-}
-
-inline ComPtr<IStream> StreamOf(const Bytes& bytes) {
-    ComPtr<IStream> stream = NewMemoryStream();
-    ULONG written = 0;
-    if (!bytes.empty()) {
-        EXPECT_EQ(stream->Write(bytes.data(), static_cast<ULONG>(bytes.size()), &written), S_OK);
-    }
-    LARGE_INTEGER start{};
-    stream->Seek(start, STREAM_SEEK_SET, nullptr);
-    return stream;
-}
-
-// The whole content of a stream; its position is left as it was.
-inline Bytes BytesOf(IStream* stream) {
-    LARGE_INTEGER zero{};
-    ULARGE_INTEGER position{};
-    stream->Seek(zero, STREAM_SEEK_CUR, &position);
-    stream->Seek(zero, STREAM_SEEK_SET, nullptr);
-    Bytes bytes;
-    std::uint8_t chunk[4096];
-    ULONG got = 0;
-    while (SUCCEEDED(stream->Read(chunk, sizeof chunk, &got)) && got > 0)
-        bytes.insert(bytes.end(), chunk, chunk + got);
-    LARGE_INTEGER back{};
-    back.QuadPart = static_cast<LONGLONG>(position.QuadPart);
-    stream->Seek(back, STREAM_SEEK_SET, nullptr);
-    return bytes;
+    return StreamOf();
 }
 
 // The 12 bytes of the marker chunk that opens every compact stream.

@@ -11,50 +11,23 @@
 #include <ut/sdk/stream_helper.h>
 #include <ut/sdk/variant.h>
 
+#include "support/streams.h"
+
 namespace {
 
-using Bytes = std::vector<std::uint8_t>;
 using ut::ComPtr;
-
-ComPtr<IStream> MemoryStream(const Bytes& content = {}) {
-    ComPtr<IStream> stream;
-    EXPECT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
-    ULONG written = 0;
-    if (!content.empty()) {
-        stream->Write(content.data(), static_cast<ULONG>(content.size()), &written);
-        LARGE_INTEGER start{};
-        stream->Seek(start, STREAM_SEEK_SET, nullptr);
-    }
-    return stream;
-}
-
-ULONGLONG PositionOf(IStream* stream) {
-    LARGE_INTEGER zero{};
-    ULARGE_INTEGER position{};
-    stream->Seek(zero, STREAM_SEEK_CUR, &position);
-    return position.QuadPart;
-}
-
-Bytes ContentOf(IStream* stream) {
-    ULONGLONG position = PositionOf(stream);
-    LARGE_INTEGER offset{};
-    stream->Seek(offset, STREAM_SEEK_SET, nullptr);
-    Bytes bytes(1 << 20);
-    ULONG got = 0;
-    stream->Read(bytes.data(), static_cast<ULONG>(bytes.size()), &got);
-    bytes.resize(got);
-    offset.QuadPart = static_cast<LONGLONG>(position);
-    stream->Seek(offset, STREAM_SEEK_SET, nullptr);
-    return bytes;
-}
+using ut::test::Bytes;
+using ut::test::BytesOf;
+using ut::test::PositionOf;
+using ut::test::StreamOf;
 
 Bytes Written(const std::function<void(CGWStreamHelper&)>& write) {
-    ComPtr<IStream> stream = MemoryStream();
+    ComPtr<IStream> stream = StreamOf();
     {
         CGWStreamHelper helper(stream.Get());
         write(helper);
     }
-    return ContentOf(stream.Get());
+    return BytesOf(stream.Get());
 }
 
 TEST(StreamHelperEncoding, FixedWidthValuesAreTheirLittleEndianBytes) {
@@ -103,7 +76,7 @@ TEST(StreamHelperEncoding, WideTextIsUtf16OnTheStream) {
               (Bytes{0xFF, 0xFF, 0xFF, 0xFF}));
     EXPECT_EQ(Written([](CGWStreamHelper& h) { h.PutAnsiString("ab"); }), (Bytes{2, 0, 0, 0, 'a', 'b'}));
 
-    ComPtr<IStream> stream = MemoryStream(expected);
+    ComPtr<IStream> stream = StreamOf(expected);
     CGWStreamHelper h(stream.Get());
     ULONG length = 0;
     ASSERT_EQ(h.GetStringLength(&length), S_OK);
@@ -116,7 +89,7 @@ TEST(StreamHelperEncoding, WideTextIsUtf16OnTheStream) {
 }
 
 TEST(StreamHelperEncoding, CountedFormsKeepNullsEmbeddedZerosAndTheirCounts) {
-    ComPtr<IStream> stream = MemoryStream();
+    ComPtr<IStream> stream = StreamOf();
     CGWStreamHelper h(stream.Get());
     ut::UniqueBstr withZero(SysAllocStringLen(L"a\0b", 3));
     const double values[] = {1.5, -2, 1e300};
@@ -204,7 +177,7 @@ TEST(StreamHelperVariants, EveryStoredTypeReadsBack) {
     SafeArrayUnaccessData(nested->parray);
     unknown->vt = VT_UNKNOWN;
 
-    ComPtr<IStream> stream = MemoryStream();
+    ComPtr<IStream> stream = StreamOf();
     CGWStreamHelper h(stream.Get());
     EXPECT_EQ(h.PutVARIANT(*unknown.Get()), DISP_E_BADVARTYPE);
     EXPECT_EQ(h.Buffer().Position(), 0u) << "a refused value leaves no trace";
@@ -308,7 +281,7 @@ TEST(StreamHelperReading, BadInputFailsAndConsumesNothing) {
     };
     for (const Read& r : reads) {
         SCOPED_TRACE(r.what);
-        ComPtr<IStream> stream = MemoryStream(r.bytes);
+        ComPtr<IStream> stream = StreamOf(r.bytes);
         CGWStreamHelper h(stream.Get());
         EXPECT_TRUE(FAILED(r.read(h)));
         EXPECT_EQ(h.Buffer().Position(), 0u);
@@ -318,7 +291,7 @@ TEST(StreamHelperReading, BadInputFailsAndConsumesNothing) {
 // Chunks of the host framing.
 
 TEST(StreamBuffer, PositionsStayExactAcrossTheWindow) {
-    ComPtr<IStream> stream = MemoryStream();
+    ComPtr<IStream> stream = StreamOf();
     const ULONG big = 3 * ut::sdk::StreamBuffer::kCapacity + 17;
     {
         CGWStreamHelper h(stream.Get());
@@ -334,7 +307,7 @@ TEST(StreamBuffer, PositionsStayExactAcrossTheWindow) {
         h.MovePos(STMHELPER_BACKWARD, static_cast<ULONG>(h.Buffer().Position()) - 12);
         h.PutUInt32(0x11111111); // and far behind it
     }
-    Bytes content = ContentOf(stream.Get());
+    Bytes content = BytesOf(stream.Get());
     ULONG bodySize = (big / 4) * 4 + 4 + ut::sdk::StreamBuffer::kCapacity + 3;
     ASSERT_EQ(content.size(), 12 + bodySize);
     ULONG size = 0;
@@ -356,7 +329,7 @@ TEST(StreamBuffer, PositionsStayExactAcrossTheWindow) {
 }
 
 TEST(StreamBuffer, HelpersOnOneBufferedStreamInterleave) {
-    ComPtr<IStream> target = MemoryStream();
+    ComPtr<IStream> target = StreamOf();
     ComPtr<IStream> buffered;
     ASSERT_EQ(ut::sdk::CreateBufferedStream(target.Get(), buffered.Put()), S_OK);
     {
@@ -370,16 +343,16 @@ TEST(StreamBuffer, HelpersOnOneBufferedStreamInterleave) {
         BYTE direct = 4;
         buffered->Write(&direct, 1, &written);
     }
-    EXPECT_EQ(ContentOf(target.Get()), Bytes()) << "bytes stay in the buffer until it is flushed";
+    EXPECT_EQ(BytesOf(target.Get()), Bytes()) << "bytes stay in the buffer until it is flushed";
     STATSTG stat{};
     ASSERT_EQ(buffered->Stat(&stat, STATFLAG_NONAME), S_OK);
     EXPECT_EQ(stat.cbSize.QuadPart, 4u);
-    EXPECT_EQ(ContentOf(target.Get()), (Bytes{1, 2, 3, 4}));
+    EXPECT_EQ(BytesOf(target.Get()), (Bytes{1, 2, 3, 4}));
 }
 
 TEST(StreamBuffer, AHelperOverAPlainStreamLeavesItAtTheLogicalPosition) {
     Bytes content(1000, 7);
-    ComPtr<IStream> stream = MemoryStream(content);
+    ComPtr<IStream> stream = StreamOf(content);
     {
         CGWStreamHelper h(stream.Get());
         ULONG value = 0;
@@ -387,7 +360,7 @@ TEST(StreamBuffer, AHelperOverAPlainStreamLeavesItAtTheLogicalPosition) {
         h.PutUInt16(0x0101);
     }
     EXPECT_EQ(PositionOf(stream.Get()), 6u) << "the read-ahead is given back";
-    EXPECT_EQ(ContentOf(stream.Get())[4], 1);
+    EXPECT_EQ(BytesOf(stream.Get())[4], 1);
 }
 
 } // namespace
