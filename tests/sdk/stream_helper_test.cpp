@@ -3,6 +3,7 @@
 #include <cstring>
 #include <functional>
 #include <string>
+#include <type_traits>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -11,41 +12,15 @@
 #include <ut/sdk/stream_helper.h>
 #include <ut/sdk/variant.h>
 
+#include "persist/streams.h"
+
 namespace {
 
-using Bytes = std::vector<std::uint8_t>;
 using ut::ComPtr;
+using ut::test::Bytes;
 
 ComPtr<IStream> MemoryStream(const Bytes& content = {}) {
-    ComPtr<IStream> stream;
-    EXPECT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
-    ULONG written = 0;
-    if (!content.empty()) {
-        stream->Write(content.data(), static_cast<ULONG>(content.size()), &written);
-        LARGE_INTEGER start{};
-        stream->Seek(start, STREAM_SEEK_SET, nullptr);
-    }
-    return stream;
-}
-
-ULONGLONG PositionOf(IStream* stream) {
-    LARGE_INTEGER zero{};
-    ULARGE_INTEGER position{};
-    stream->Seek(zero, STREAM_SEEK_CUR, &position);
-    return position.QuadPart;
-}
-
-Bytes ContentOf(IStream* stream) {
-    ULONGLONG position = PositionOf(stream);
-    LARGE_INTEGER offset{};
-    stream->Seek(offset, STREAM_SEEK_SET, nullptr);
-    Bytes bytes(1 << 20);
-    ULONG got = 0;
-    stream->Read(bytes.data(), static_cast<ULONG>(bytes.size()), &got);
-    bytes.resize(got);
-    offset.QuadPart = static_cast<LONGLONG>(position);
-    stream->Seek(offset, STREAM_SEEK_SET, nullptr);
-    return bytes;
+    return ut::test::StreamOf(content);
 }
 
 Bytes Written(const std::function<void(CGWStreamHelper&)>& write) {
@@ -54,7 +29,7 @@ Bytes Written(const std::function<void(CGWStreamHelper&)>& write) {
         CGWStreamHelper helper(stream.Get());
         write(helper);
     }
-    return ContentOf(stream.Get());
+    return ut::test::BytesOf(stream.Get());
 }
 
 TEST(StreamHelperEncoding, FixedWidthValuesAreTheirLittleEndianBytes) {
@@ -242,6 +217,17 @@ Bytes DeepArrays() {
     return deep;
 }
 
+template <class T>
+std::function<HRESULT(CGWStreamHelper&)> Getter(HRESULT (CGWStreamHelper::*get)(T)) {
+    return [get](CGWStreamHelper& h) {
+        std::remove_pointer_t<std::remove_reference_t<T>> value{};
+        if constexpr (std::is_pointer_v<T>)
+            return (h.*get)(&value);
+        else
+            return (h.*get)(value);
+    };
+}
+
 TEST(StreamHelperReading, BadInputFailsAndConsumesNothing) {
     struct Read {
         const char* what;
@@ -249,29 +235,15 @@ TEST(StreamHelperReading, BadInputFailsAndConsumesNothing) {
         std::function<HRESULT(CGWStreamHelper&)> read;
     };
     const Read reads[] = {
-        {"UInt32",
-         {1, 2, 3},
-         [](CGWStreamHelper& h) {
-             ULONG v;
-             return h.GetUInt32(v);
-         }},
-        {"GUID", Bytes(15, 1),
-         [](CGWStreamHelper& h) {
-             GUID v;
-             return h.GetGUID(v);
-         }},
+        {"UInt32", {1, 2, 3}, Getter(&CGWStreamHelper::GetUInt32)},
+        {"GUID", Bytes(15, 1), Getter(&CGWStreamHelper::GetGUID)},
         {"string body",
          {5, 0, 0, 0, 'a', 0},
          [](CGWStreamHelper& h) {
              wchar_t t[9];
              return h.GetUnicodeString(t, 9);
          }},
-        {"string length",
-         {0xFE, 0xFF, 0xFF, 0x7F},
-         [](CGWStreamHelper& h) {
-             ULONG n;
-             return h.GetStringLength(&n);
-         }},
+        {"string length", {0xFE, 0xFF, 0xFF, 0x7F}, Getter(&CGWStreamHelper::GetStringLength)},
         {"ANSI",
          {9, 0, 0, 0, 'a'},
          [](CGWStreamHelper& h) {
@@ -334,7 +306,7 @@ TEST(StreamBuffer, PositionsStayExactAcrossTheWindow) {
         h.MovePos(STMHELPER_BACKWARD, static_cast<ULONG>(h.Buffer().Position()) - 12);
         h.PutUInt32(0x11111111); // and far behind it
     }
-    Bytes content = ContentOf(stream.Get());
+    Bytes content = ut::test::BytesOf(stream.Get());
     ULONG bodySize = (big / 4) * 4 + 4 + ut::sdk::StreamBuffer::kCapacity + 3;
     ASSERT_EQ(content.size(), 12 + bodySize);
     ULONG size = 0;
@@ -370,11 +342,11 @@ TEST(StreamBuffer, HelpersOnOneBufferedStreamInterleave) {
         BYTE direct = 4;
         buffered->Write(&direct, 1, &written);
     }
-    EXPECT_EQ(ContentOf(target.Get()), Bytes()) << "bytes stay in the buffer until it is flushed";
+    EXPECT_EQ(ut::test::BytesOf(target.Get()), Bytes()) << "bytes stay in the buffer until it is flushed";
     STATSTG stat{};
     ASSERT_EQ(buffered->Stat(&stat, STATFLAG_NONAME), S_OK);
     EXPECT_EQ(stat.cbSize.QuadPart, 4u);
-    EXPECT_EQ(ContentOf(target.Get()), (Bytes{1, 2, 3, 4}));
+    EXPECT_EQ(ut::test::BytesOf(target.Get()), (Bytes{1, 2, 3, 4}));
 }
 
 TEST(StreamBuffer, AHelperOverAPlainStreamLeavesItAtTheLogicalPosition) {
@@ -386,8 +358,10 @@ TEST(StreamBuffer, AHelperOverAPlainStreamLeavesItAtTheLogicalPosition) {
         h.GetUInt32(value);
         h.PutUInt16(0x0101);
     }
-    EXPECT_EQ(PositionOf(stream.Get()), 6u) << "the read-ahead is given back";
-    EXPECT_EQ(ContentOf(stream.Get())[4], 1);
+    ULARGE_INTEGER position{};
+    stream->Seek(LARGE_INTEGER{}, STREAM_SEEK_CUR, &position);
+    EXPECT_EQ(position.QuadPart, 6u) << "the read-ahead is given back";
+    EXPECT_EQ(ut::test::BytesOf(stream.Get())[4], 1);
 }
 
 } // namespace
