@@ -1,18 +1,14 @@
 // The compact encoding, byte for byte, and what its reader does with bytes it did not write.
 #include <cmath>
 #include <cstring>
-#include <cwchar>
 #include <limits>
 #include <utility>
 
-#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <ut/sdk/ambient.h>
-#include <ut/sdk/version.h>
+#include <ut/host/reference_host.h>
 
 #include "persist/streams.h"
-#include "support/com_mock.h"
 
 namespace {
 
@@ -63,6 +59,9 @@ TEST_F(Compact, PacksUnsignedIntegers) {
                             {0x10000000, {0xB0, 0x00, 0x00, 0x00, 0x10}},
                             {0xFFFFFFFF, {0xB0, 0xFF, 0xFF, 0xFF, 0xFF}}},
                            &C3DStreamHelper::PutUInt32, &C3DStreamHelper::GetUInt32);
+    // Patch-back slots keep a fixed size whatever the value.
+    ExpectEncodings<ULONG>({{3, {0xB0, 0x03, 0x00, 0x00, 0x00}}}, &C3DStreamHelper::StoreUInt32,
+                           &C3DStreamHelper::GetUInt32);
 }
 
 TEST_F(Compact, PacksSignedIntegersWithSymmetricBounds) {
@@ -116,17 +115,6 @@ TEST_F(Compact, PacksDoublesByTheirShortestExactForm) {
         EXPECT_TRUE(std::isnan(x));
         EXPECT_EQ(h.GetDouble(x), S_OK);
         EXPECT_EQ(x, -std::numeric_limits<double>::infinity());
-    });
-}
-
-TEST_F(Compact, PatchBackSlotsHaveAFixedSize) {
-    ut::test::Saved saved =
-        Save(Form::Compact, [](C3DStreamHelper& h) { EXPECT_EQ(h.StoreUInt32(3), S_OK); });
-    EXPECT_EQ(saved.data, ut::test::Concat(kMarker, {0xB0, 0x03, 0x00, 0x00, 0x00}));
-    Load(saved, [](C3DStreamHelper& h) {
-        ULONG value = 0;
-        EXPECT_EQ(h.GetUInt32(value), S_OK);
-        EXPECT_EQ(value, 3u);
     });
 }
 
@@ -353,57 +341,22 @@ TEST_F(Compact, ATableClaimingMoreThan256RowsIsRefused) {
     EXPECT_TRUE(FAILED(KXOpenPersistStreamForLoad(data.Get(), table.Get(), stream.Put())));
 }
 
-// Host services the compressor consults.
-
-class MockVersionInfo : public ut::test::ComMock<IGWVersionInfo> {
-public:
-    MockVersionInfo() : ComMock(IID_IGWVersionInfo) {}
-    MOCK_METHOD(HRESULT, GetVersionString, (ULONG, wchar_t**), (override, Calltype(STDMETHODCALLTYPE)));
-};
-
-class MockAmbient : public ut::test::ComMock<IGWAmbientValues> {
-public:
-    MockAmbient() : ComMock(IID_IGWAmbientValues) {}
-    MOCK_METHOD(HRESULT, GetBool, (const wchar_t*, BOOL*), (override, Calltype(STDMETHODCALLTYPE)));
-    MOCK_METHOD(HRESULT, GetInt, (const wchar_t*, LONG*), (override, Calltype(STDMETHODCALLTYPE)));
-    MOCK_METHOD(HRESULT, SetBool, (const wchar_t*, BOOL), (override, Calltype(STDMETHODCALLTYPE)));
-    MOCK_METHOD(HRESULT, SetInt, (const wchar_t*, LONG), (override, Calltype(STDMETHODCALLTYPE)));
-};
-
-HRESULT TaskString(const wchar_t* text, wchar_t** out) {
-    if (!text) {
-        *out = nullptr;
-        return S_FALSE;
-    }
-    std::size_t bytes = (std::wcslen(text) + 1) * sizeof(wchar_t);
-    *out = static_cast<wchar_t*>(CoTaskMemAlloc(bytes));
-    std::memcpy(*out, text, bytes);
-    return S_OK;
-}
-
 TEST_F(CompressorInterface, StartDepthFollowsTheHostVersion) {
     struct Host {
-        const wchar_t* product;
+        const wchar_t* product; // "": the host does not have the string
         const wchar_t* build;
         const wchar_t* major;
         ULONG known;
         ULONG startDepth;
     };
     const Host hosts[] = {
-        {nullptr, L"1200", L"2002", 0, 0xFFFFFFFF}, {L"App", L"1200", L"2002", 1, 0},
-        {L"App", L"1014", L"2001", 1, 0xFFFFFFFF},  {L"App", L"1015", L"2001", 1, 0},
-        {L"App", L"1500", L"2000", 1, 0xFFFFFFFF},  {L"App", nullptr, nullptr, 1, 0},
+        {L"", L"1200", L"2002", 0, 0xFFFFFFFF},    {L"App", L"1200", L"2002", 1, 0},
+        {L"App", L"1014", L"2001", 1, 0xFFFFFFFF}, {L"App", L"1015", L"2001", 1, 0},
+        {L"App", L"1500", L"2000", 1, 0xFFFFFFFF}, {L"App", L"", L"", 1, 0},
     };
     for (const Host& host : hosts) {
-        MockVersionInfo info;
-        ut::test::ScopedGenericObject installed(CLSID_GWVersionInfo, &info);
-        EXPECT_CALL(info, GetVersionString(testing::_, testing::_))
-            .WillRepeatedly([&](ULONG index, wchar_t** out) {
-                return TaskString(index == GWVERSION_PRODUCT ? host.product
-                                  : index == GWVERSION_BUILD ? host.build
-                                                             : host.major,
-                                  out);
-            });
+        ut::host::ReferenceHost installed(
+            {.productName = host.product, .build = host.build, .major = host.major});
         ULONG known = 9, depth = 9;
         EXPECT_EQ(Open(kMarker)->GetStartCount(known, depth), S_OK);
         EXPECT_EQ(known, host.known);
@@ -423,10 +376,7 @@ TEST_F(Compact, ImportingADeltaLeavesTheReaderInsideTheChunk) {
         h.PutUInt32(2);
         h.ChunkWriteClose();
     });
-    MockAmbient ambient;
-    ut::test::ScopedGenericObject installed(CLSID_GWAmbientValues, &ambient);
-    EXPECT_CALL(ambient, GetBool(testing::StrEq(L"referencing.importingdelta"), testing::_))
-        .WillRepeatedly(testing::DoAll(testing::SetArgPointee<1>(TRUE), testing::Return(S_OK)));
+    ut::host::ReferenceHost host({.importingDelta = true});
     Load(saved, [](C3DStreamHelper& h) {
         ASSERT_EQ(h.ChunkReadOpen(1, nullptr), S_OK);
         ULONG value = 0;

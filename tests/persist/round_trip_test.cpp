@@ -1,7 +1,6 @@
 // Random object trees saved and loaded through the same calling code in every form, and a
 // realistic scene-like stream to compare the sizes of the forms.
 #include <cstring>
-#include <iostream>
 #include <random>
 #include <variant>
 
@@ -252,10 +251,6 @@ TEST(SampleScene, CompactFormIsSmaller) {
         GTEST_SKIP() << "compression is switched off in this run";
     std::size_t plain = ut::test::Save(Form::Plain, WriteScene).data.size();
     std::size_t compact = ut::test::Save(Form::Compact, WriteScene).data.size();
-    ut::test::Saved table = ut::test::Save(Form::CompactTable, WriteScene);
-    std::cout << "sample scene: plain " << plain << " bytes, compact " << compact << " bytes (ratio "
-              << static_cast<double>(compact) / static_cast<double>(plain) << "), compact with table apart "
-              << table.data.size() << " + " << table.table.size() << " bytes\n";
     RecordProperty("plain_bytes", static_cast<int>(plain));
     RecordProperty("compact_bytes", static_cast<int>(compact));
     EXPECT_LT(compact * 10, plain * 6);

@@ -3,6 +3,7 @@
 #include <cstring>
 #include <functional>
 #include <string>
+#include <type_traits>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -215,6 +216,17 @@ Bytes DeepArrays() {
     return deep;
 }
 
+template <class T>
+std::function<HRESULT(CGWStreamHelper&)> Getter(HRESULT (CGWStreamHelper::*get)(T)) {
+    return [get](CGWStreamHelper& h) {
+        std::remove_pointer_t<std::remove_reference_t<T>> value{};
+        if constexpr (std::is_pointer_v<T>)
+            return (h.*get)(&value);
+        else
+            return (h.*get)(value);
+    };
+}
+
 TEST(StreamHelperReading, BadInputFailsAndConsumesNothing) {
     struct Read {
         const char* what;
@@ -222,29 +234,15 @@ TEST(StreamHelperReading, BadInputFailsAndConsumesNothing) {
         std::function<HRESULT(CGWStreamHelper&)> read;
     };
     const Read reads[] = {
-        {"UInt32",
-         {1, 2, 3},
-         [](CGWStreamHelper& h) {
-             ULONG v;
-             return h.GetUInt32(v);
-         }},
-        {"GUID", Bytes(15, 1),
-         [](CGWStreamHelper& h) {
-             GUID v;
-             return h.GetGUID(v);
-         }},
+        {"UInt32", {1, 2, 3}, Getter(&CGWStreamHelper::GetUInt32)},
+        {"GUID", Bytes(15, 1), Getter(&CGWStreamHelper::GetGUID)},
         {"string body",
          {5, 0, 0, 0, 'a', 0},
          [](CGWStreamHelper& h) {
              wchar_t t[9];
              return h.GetUnicodeString(t, 9);
          }},
-        {"string length",
-         {0xFE, 0xFF, 0xFF, 0x7F},
-         [](CGWStreamHelper& h) {
-             ULONG n;
-             return h.GetStringLength(&n);
-         }},
+        {"string length", {0xFE, 0xFF, 0xFF, 0x7F}, Getter(&CGWStreamHelper::GetStringLength)},
         {"ANSI",
          {9, 0, 0, 0, 'a'},
          [](CGWStreamHelper& h) {
