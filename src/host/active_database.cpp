@@ -1,6 +1,7 @@
 #include "active_database.h"
 
 #include <ut/sdk/objects.h>
+#include <ut/sdk/testing.h>
 
 namespace ut::host {
 

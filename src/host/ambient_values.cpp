@@ -3,6 +3,7 @@
 #include <new>
 
 #include <ut/sdk/objects.h>
+#include <ut/sdk/testing.h>
 
 namespace ut::host {
 

@@ -3,6 +3,7 @@
 #include <cwchar>
 
 #include <ut/sdk/objects.h>
+#include <ut/sdk/testing.h>
 
 namespace ut::host {
 

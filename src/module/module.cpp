@@ -3,6 +3,8 @@
 #include <ut/platform/process.h>
 #include <ut/sdk/resources.h>
 
+#include <ut/detail/names.h>
+
 #include "module/state.h"
 
 namespace ut::module {
@@ -15,7 +17,7 @@ State& MutableState() {
     return *state;
 }
 
-constexpr int kRegistryKeyCapacity = 260;
+constexpr int kRegistryKeyCapacity = ut::kPathCapacity;
 
 } // namespace
 
@@ -29,7 +31,7 @@ HRESULT OnModuleAttach(HINSTANCE self) {
     ut::module::State& state = ut::module::MutableState();
     state = {};
     state.instance = self;
-    if (HRESULT hr = KXDictRegisterInstance(self, L"QVXUT"); FAILED(hr))
+    if (HRESULT hr = KXDictRegisterInstance(self, ut::kDictionaryName); FAILED(hr))
         return hr;
     wchar_t key[ut::module::kRegistryKeyCapacity];
     if (LONG error = GWResourceConstructRegKey(self, L"", key, ut::module::kRegistryKeyCapacity); error != ERROR_SUCCESS)
@@ -41,7 +43,7 @@ HRESULT OnModuleAttach(HINSTANCE self) {
 }
 
 void OnModuleDetach() {
-    KXDictUnregisterInstance(L"QVXUT");
+    KXDictUnregisterInstance(ut::kDictionaryName);
     ut::module::MutableState().loaded = false;
 }
 

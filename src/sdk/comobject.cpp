@@ -1,4 +1,5 @@
 #include <ut/sdk/comobject.h>
+#include <ut/sdk/testing.h>
 
 namespace {
 std::atomic<long> g_liveObjects{0};
@@ -12,9 +13,9 @@ CGWCOMObject::~CGWCOMObject() {
     g_liveObjects.fetch_sub(1, std::memory_order_relaxed);
 }
 
-long CGWCOMObject::LiveCount() {
-    return g_liveObjects.load(std::memory_order_relaxed);
-}
+namespace ut::sdk {
+long LiveCount() { return g_liveObjects.load(std::memory_order_relaxed); }
+} // namespace ut::sdk
 
 HRESULT CGWCOMObject::QueryInterface(REFIID iid, void** object) {
     if (!object)

@@ -4,6 +4,7 @@
 #include <mutex>
 
 #include <ut/sdk/objects.h>
+#include <ut/sdk/testing.h>
 
 namespace {
 

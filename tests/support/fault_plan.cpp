@@ -1,6 +1,7 @@
 #include "support/fault_plan.h"
 
 #include <ut/sdk/objects.h>
+#include <ut/sdk/testing.h>
 
 namespace ut::test {
 

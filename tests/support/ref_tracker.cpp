@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <ut/sdk/comobject.h>
+#include <ut/sdk/testing.h>
 
 namespace ut::test {
 
@@ -22,10 +23,10 @@ ULONG RefTracker::References(IUnknown* object) {
     return object->Release();
 }
 
-LiveObjectCheck::LiveObjectCheck() : before_(CGWCOMObject::LiveCount()) {}
+LiveObjectCheck::LiveObjectCheck() : before_(ut::sdk::LiveCount()) {}
 
 LiveObjectCheck::~LiveObjectCheck() {
-    EXPECT_EQ(CGWCOMObject::LiveCount(), before_) << "COM objects created by the test are still alive";
+    EXPECT_EQ(ut::sdk::LiveCount(), before_) << "COM objects created by the test are still alive";
 }
 
 } // namespace ut::test

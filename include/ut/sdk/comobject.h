@@ -39,9 +39,6 @@ public:
     // Second-phase construction, run by factories after `new`; a failure destroys the object.
     virtual HRESULT Construct();
 
-    // Objects of this base alive in the process (for leak checks in tests and tools).
-    static long LiveCount();
-
     CGWCOMObject(const CGWCOMObject&) = delete;
     CGWCOMObject& operator=(const CGWCOMObject&) = delete;
 

@@ -6,9 +6,7 @@
 // E_NOINTERFACE. Out-parameters are cleared first; a null one answers E_POINTER.
 #pragma once
 
-#include <functional>
 #include <new>
-#include <string_view>
 
 #include <ut/platform/com.h>
 #include <ut/sdk/comobject.h>
@@ -30,14 +28,6 @@ UT_SDK_API HRESULT GWRegisterClassFactory(REFCLSID clsid, IClassFactory* factory
 UT_SDK_API HRESULT GWRevokeClassFactory(REFCLSID clsid);
 
 namespace ut::sdk {
-
-// Fault injection for tests of failure paths: when set, every host call made through this
-// layer (the queries and creations above, and host services that choose to consult it) first
-// asks the hook, and a failure code it returns is answered instead of doing the call.
-using HostFaultHook = std::function<HRESULT(std::string_view operation)>;
-UT_SDK_API void SetHostFaultHook(HostFaultHook hook);
-// S_OK when no hook is set or the hook lets the call through.
-UT_SDK_API HRESULT CheckHostFault(std::string_view operation);
 
 // A class factory that creates `Object` (a CGWCOMObject) with `new` and Construct.
 UT_SDK_API HRESULT CreateClassFactory(CGWCOMObject* (*create)(), IClassFactory** factory);
