@@ -292,8 +292,9 @@ public:
     virtual HRESULT ChunkSafeWriteOpen(ULONG id, ULONG version);
 
 private:
-    HRESULT _ChunkWriteClose();
-    HRESULT _ChunkReadClose();
+    // The closes themselves, without the counting of open chunks.
+    HRESULT RawChunkWriteClose();
+    HRESULT RawChunkReadClose();
     HRESULT CountWriteOpen(HRESULT hr);
     HRESULT CountReadOpen(HRESULT hr);
     HRESULT CountClose(HRESULT hr);

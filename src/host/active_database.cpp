@@ -1,3 +1,4 @@
+// The reference host's active database: the mode it reports.
 #include "active_database.h"
 
 #include <ut/sdk/objects.h>

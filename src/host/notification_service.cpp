@@ -1,3 +1,4 @@
+// The reference host's notification service: sinks advised by name, re-entrant broadcasts.
 #include "notification_service.h"
 
 #include <algorithm>

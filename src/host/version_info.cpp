@@ -1,3 +1,4 @@
+// The reference host's version-information object.
 #include "version_info.h"
 
 #include <cwchar>

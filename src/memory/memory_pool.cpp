@@ -1,3 +1,4 @@
+// CMemoryPool: size-classed free lists over the C runtime, emptied on state changes.
 #include <cstdlib>
 #include <cwchar>
 #include <memory>

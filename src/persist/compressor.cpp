@@ -1,7 +1,9 @@
+// C3DStreamCompressor: packed integers and doubles, and chunk headers as table indexes.
 #include <cwchar>
 #include <new>
 
 #include <ut/persist.h>
+#include <ut/platform/detail/boundary.h>
 #include <ut/sdk/ambient.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/version.h>
@@ -71,11 +73,12 @@ HRESULT C3DStreamCompressor::Init(IStream* stream, int tableMode, int) {
     helper_.reset();
     buffer_ = nullptr;
     tableMode_ = tableMode;
-    try {
-        helper_ = std::make_shared<CGWStreamHelper>(stream);
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
+    if (HRESULT hr = ut::ExportBoundary([&] {
+            helper_ = std::make_shared<CGWStreamHelper>(stream);
+            return S_OK;
+        });
+        FAILED(hr))
+        return hr;
     buffer_ = &helper_->Buffer();
     if (!stream)
         return S_OK;
@@ -394,21 +397,17 @@ HRESULT C3DStreamCompressor::GetChunkHeader(ULONG& id, ULONG& version, bool reco
 // Chunks.
 
 HRESULT C3DStreamCompressor::PushReadEnd(ULONGLONG end) {
-    try {
+    return ut::ExportBoundary([&] {
         readEnds_.push_back(end);
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
-    return S_OK;
+        return S_OK;
+    });
 }
 
 HRESULT C3DStreamCompressor::PushWriteStart() {
-    try {
+    return ut::ExportBoundary([&] {
         writeStarts_.push_back(buffer_->Position());
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
-    return S_OK;
+        return S_OK;
+    });
 }
 
 HRESULT C3DStreamCompressor::ChunkWriteOpen(ULONG id, ULONG version) {

@@ -7,7 +7,7 @@
 
 #include <ut/persist.h>
 #include <ut/sdk/comobject.h>
-#include <ut/sdk/stream_buffer.h>
+#include <ut/sdk/detail/stream_buffer.h>
 
 #include "module/state.h"
 

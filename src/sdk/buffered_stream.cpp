@@ -3,7 +3,7 @@
 #include <new>
 
 #include <ut/sdk/comobject.h>
-#include <ut/sdk/stream_buffer.h>
+#include <ut/sdk/detail/stream_buffer.h>
 
 namespace ut::sdk {
 namespace {

@@ -1,3 +1,4 @@
+// CMemoryPool's reuse, growth, purge and registration rules.
 #include <limits>
 
 #include <gmock/gmock.h>

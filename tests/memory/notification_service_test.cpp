@@ -1,3 +1,4 @@
+// The reference notification service: advise, unadvise and re-entrant broadcasts.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 

@@ -8,7 +8,7 @@
 
 #include <ut/host/reference_host.h>
 
-#include "persist/streams.h"
+#include "persist/save_load.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "persist/streams.h"
+#include "persist/save_load.h"
 #include "support/com_mock.h"
 #include "support/ref_tracker.h"
 

@@ -1,3 +1,4 @@
+// CGWCOMObject's interface maps and reference counts.
 #include <gtest/gtest.h>
 
 #include <ut/sdk/comobject.h>

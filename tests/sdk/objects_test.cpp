@@ -1,3 +1,4 @@
+// Generic objects and class factories: install, query, create, revoke.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 

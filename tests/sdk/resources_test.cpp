@@ -1,3 +1,4 @@
+// Module registry keys and string dictionaries.
 #include <gtest/gtest.h>
 
 #include <ut/platform/process.h>

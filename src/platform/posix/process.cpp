@@ -1,3 +1,4 @@
+// Process queries on POSIX: environment, module file names, the executable.
 #include <cstdlib>
 #include <dlfcn.h>
 

@@ -1,3 +1,4 @@
+// Process queries on Windows: environment, module file names, the executable.
 #include <string>
 
 #include <ut/platform/process.h>

@@ -1,3 +1,4 @@
+// C3DStreamHelper: routes values and chunks to the stream's compressor, and counts open chunks.
 #include <cstdlib>
 
 #include <ut/persist.h>
@@ -44,7 +45,7 @@ C3DStreamHelper::~C3DStreamHelper() {
     if (openDepth_ == 0 || openDepth_ == kCountingOff)
         return;
     for (ULONG remaining = openDepth_; remaining > 0; --remaining)
-        CountClose(lastOpenWasRead_ ? _ChunkReadClose() : _ChunkWriteClose());
+        CountClose(lastOpenWasRead_ ? RawChunkReadClose() : RawChunkWriteClose());
 }
 
 // Counting of open chunks. Writing always counts, even on a stream where reading does not.
@@ -176,20 +177,20 @@ HRESULT C3DStreamHelper::ChunkSafeReadOpen(ULONG id, ULONG* version) {
 }
 
 HRESULT C3DStreamHelper::ChunkWriteClose() {
-    return CountClose(_ChunkWriteClose());
+    return CountClose(RawChunkWriteClose());
 }
 
 HRESULT C3DStreamHelper::ChunkReadClose() {
-    return CountClose(_ChunkReadClose());
+    return CountClose(RawChunkReadClose());
 }
 
-HRESULT C3DStreamHelper::_ChunkWriteClose() {
+HRESULT C3DStreamHelper::RawChunkWriteClose() {
     return Route(
         compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkWriteClose(); },
         [&] { return CGWStreamHelper::ChunkWriteClose(); });
 }
 
-HRESULT C3DStreamHelper::_ChunkReadClose() {
+HRESULT C3DStreamHelper::RawChunkReadClose() {
     return Route(
         compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkReadClose(); },
         [&] { return CGWStreamHelper::ChunkReadClose(); });
