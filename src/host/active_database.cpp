@@ -8,7 +8,7 @@ namespace ut::host {
 
 std::span<const CGWCOMObject::InterfaceEntry> ActiveDatabase::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        UT_INTERFACE_ENTRY(ActiveDatabase, IGWActiveDatabase, IID_IGWActiveDatabase)};
+        ut::sdk::Entry<ActiveDatabase, IGWActiveDatabase>(IID_IGWActiveDatabase)};
     return map;
 }
 

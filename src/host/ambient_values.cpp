@@ -15,7 +15,7 @@ AmbientValues::AmbientValues(const Settings& settings)
 
 std::span<const CGWCOMObject::InterfaceEntry> AmbientValues::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        UT_INTERFACE_ENTRY(AmbientValues, IGWAmbientValues, IID_IGWAmbientValues)};
+        ut::sdk::Entry<AmbientValues, IGWAmbientValues>(IID_IGWAmbientValues)};
     return map;
 }
 

@@ -16,7 +16,7 @@ auto FindSink(Sinks& sinks, IGwNotifySink* sink) {
 
 std::span<const CGWCOMObject::InterfaceEntry> NotificationService::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        UT_INTERFACE_ENTRY(NotificationService, IGWNotificationService, IID_IGWNotificationService)};
+        ut::sdk::Entry<NotificationService, IGWNotificationService>(IID_IGWNotificationService)};
     return map;
 }
 

@@ -69,15 +69,12 @@ FaultState& Faults() {
     return *state;
 }
 
-class ObjectFactory final : public CGWCOMObject, public IClassFactory {
+class ObjectFactory final : public ut::sdk::ComObject<IClassFactory> {
 public:
     explicit ObjectFactory(CGWCOMObject* (*create)()) : create_(create) {}
 
-    UT_COM_OBJECT_IUNKNOWN()
-
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {
-            UT_INTERFACE_ENTRY(ObjectFactory, IClassFactory, IID_IClassFactory)};
+        static const InterfaceEntry map[] = {ut::sdk::Entry<ObjectFactory, IClassFactory>(IID_IClassFactory)};
         return map;
     }
 

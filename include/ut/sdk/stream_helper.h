@@ -35,8 +35,8 @@
 
 #include <ut/platform/stream.h>
 #include <ut/platform/variant.h>
-#include <ut/sdk/export.h>
 #include <ut/sdk/detail/stream_buffer.h>
+#include <ut/sdk/export.h>
 
 enum STMHELPERDIR : ULONG { STMHELPER_FORWARD = 0, STMHELPER_BACKWARD = 1 };
 
@@ -58,7 +58,8 @@ protected:
     ~IGWStreamCapabilities() = default;
 };
 
-UT_INTERFACE_ID(IGWStreamCapabilities, IID_IGWStreamCapabilities);
+template <>
+struct ut::InterfaceId<IGWStreamCapabilities> : ut::Iid<IID_IGWStreamCapabilities> {};
 
 class UT_SDK_API CGWStreamHelper {
 public:

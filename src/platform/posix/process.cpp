@@ -13,6 +13,10 @@ bool HasEnvironmentVariable(const char* name) {
     return name && std::getenv(name) != nullptr;
 }
 
+bool RunningUnderCompatibilityLayer() {
+    return false;
+}
+
 HINSTANCE ModuleOf(const void* address) {
     Dl_info info{};
     if (!address || ::dladdr(address, &info) == 0)

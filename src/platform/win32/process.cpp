@@ -24,6 +24,12 @@ bool HasEnvironmentVariable(const char* name) {
     return GetLastError() != ERROR_ENVVAR_NOT_FOUND;
 }
 
+// Wine's own ntdll exports its version; the system's does not.
+bool RunningUnderCompatibilityLayer() {
+    HMODULE ntdll = GetModuleHandleW(L"ntdll.dll");
+    return ntdll && GetProcAddress(ntdll, "wine_get_version");
+}
+
 HINSTANCE ModuleOf(const void* address) {
     HMODULE module = nullptr;
     constexpr DWORD kFlags =

@@ -5,6 +5,9 @@
 #include <ut/sdk/resources.h>
 #include <ut/ut.h>
 
+// Defined for the home the plug-in is built on.
+bool SystemHeadersWhole();
+
 int main() {
     if (g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureCurrent] == 0 || !KXDictFindInstance(L"QVXUT")) {
         std::puts("the library did not load");
@@ -13,6 +16,10 @@ int main() {
     ut::ComPtr<IStream> stream;
     if (FAILED(ut::platform::CreateMemoryStream(stream.Put())) || FAILED(stream->Write("ok", 2, nullptr))) {
         std::puts("no memory stream");
+        return 1;
+    }
+    if (!SystemHeadersWhole()) {
+        std::puts("the system headers were cut short");
         return 1;
     }
     std::puts("consumer: ut found, loaded and usable");

@@ -46,7 +46,8 @@ protected:
     ~IGWStreamBufferSource() = default;
 };
 
-UT_INTERFACE_ID(IGWStreamBufferSource, IID_IGWStreamBufferSource);
+template <>
+struct ut::InterfaceId<IGWStreamBufferSource> : ut::Iid<IID_IGWStreamBufferSource> {};
 
 namespace ut::sdk {
 
