@@ -231,6 +231,8 @@ private:
 
     HRESULT PutChunkHeader(ULONG id, ULONG version);
     HRESULT GetChunkHeader(ULONG& id, ULONG& version, bool record);
+    // Drops the rows recorded after `lastKept` (by an open that then failed).
+    void ForgetRowsAfter(int lastKept);
 
     bool Packing(int kind) const { return active_ && kind; }
     HRESULT PushReadEnd(ULONGLONG end);

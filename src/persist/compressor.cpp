@@ -94,8 +94,12 @@ HRESULT C3DStreamCompressor::Init(IStream* stream, int tableMode, int) {
     streamName_ = name.get();
 
     if (stat.cbSize.QuadPart == 0) {
-        if (ut::module::Current().streamCompressionDisabled)
+        // Switched off for new streams: a compressor rebound from a compact stream must not keep
+        // writing compact values onto a stream that carries no marker.
+        if (ut::module::Current().streamCompressionDisabled) {
+            active_ = 0;
             return S_OK;
+        }
         helper_->ChunkWriteOpen(kMarkerId, kMarkerVersion);
         helper_->ChunkWriteClose();
         active_ = 1;
@@ -414,23 +418,31 @@ HRESULT C3DStreamCompressor::ChunkWriteOpen(ULONG id, ULONG version) {
     if (!active_)
         return STG_E_OLDFORMAT;
     ut::sdk::Rewind rewind(*buffer_);
+    const int rowsBefore = lastIndex_;
     HRESULT hr = PutChunkHeader(id, version);
     if (SUCCEEDED(hr))
         hr = buffer_->WriteValue(ULONG{0});
     if (SUCCEEDED(hr))
         hr = PushWriteStart();
+    if (FAILED(hr))
+        ForgetRowsAfter(rowsBefore); // their definitions are rewound with the rest
     return rewind(hr);
 }
 
+void C3DStreamCompressor::ForgetRowsAfter(int lastKept) {
+    for (int row = lastKept + 1; row <= lastIndex_; ++row)
+        headerTable_[row] = {};
+    lastIndex_ = lastKept;
+}
+
+// Only running out of memory is reported: a failed header write shows at the chunk's close and
+// at the stream's flush, as it does for every other value written.
 HRESULT C3DStreamCompressor::ChunkSafeWriteOpen(ULONG id, ULONG version) {
     if (!active_)
         return STG_E_OLDFORMAT;
-    ut::sdk::Rewind rewind(*buffer_);
     ULONG header[3] = {id, version, 0};
-    HRESULT hr = buffer_->WriteValue(header);
-    if (SUCCEEDED(hr))
-        hr = PushWriteStart();
-    return rewind(hr);
+    (void)buffer_->WriteValue(header); // see above
+    return PushWriteStart();
 }
 
 HRESULT C3DStreamCompressor::ChunkWriteClose() {
@@ -443,9 +455,10 @@ HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
     if (!active_)
         return STG_E_OLDFORMAT;
     ut::sdk::Rewind rewind(*buffer_);
+    // A header that cannot be read reports an id of its own, so that a reader probing for an
+    // optional last chunk is told "another chunk" at the end of the stream too.
     ULONG foundId = 0, foundVersion = 0;
-    if (HRESULT hr = GetChunkHeader(foundId, foundVersion, true); FAILED(hr))
-        return rewind(hr);
+    (void)GetChunkHeader(foundId, foundVersion, true);
     if (foundId != id)
         return rewind(STG_E_INVALIDHEADER);
     ULONG size = 0;
