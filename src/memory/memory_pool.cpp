@@ -1,8 +1,8 @@
 // CMemoryPool: size-classed free lists over the C runtime, emptied on state changes.
 #include <algorithm>
 #include <cstdlib>
-#include <iterator>
 #include <cwchar>
+#include <iterator>
 #include <memory>
 
 #include <ut/memory.h>
@@ -230,7 +230,8 @@ void CMemoryPool::Diagnostics() {
     for (int sizeClass = 0; sizeClass < kSizeClasses; ++sizeClass) {
         FreeBytes[sizeClass] = 0;
         FreeCounts[sizeClass] = 0;
-        for (const Descriptor* descriptor = freeLists_[sizeClass]; descriptor; descriptor = descriptor->Next) {
+        for (const Descriptor* descriptor = freeLists_[sizeClass]; descriptor;
+             descriptor = descriptor->Next) {
             FreeBytes[sizeClass] += descriptor->Capacity;
             ++FreeCounts[sizeClass];
         }
@@ -255,7 +256,8 @@ void CMemoryPool::Unregister() {
     // Cleared before the call, so that a notification arriving meanwhile finds the pool withdrawn.
     ut::ComPtr<IGWNotificationService> service = std::move(notifier_);
     if (service)
-        service->Unadvise(ut::sdk::kAppStateChange, this);
+        (void)service->Unadvise(ut::sdk::kAppStateChange,
+                                this); // withdrawn either way: the service is let go
 }
 
 ULONG CMemoryPool::AddRef() {

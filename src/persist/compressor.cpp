@@ -100,14 +100,15 @@ HRESULT C3DStreamCompressor::Init(IStream* stream, int tableMode, int) {
             active_ = 0;
             return S_OK;
         }
-        helper_->ChunkWriteOpen(kMarkerId, kMarkerVersion);
-        helper_->ChunkWriteClose();
+        // Into the window: a stream that refuses the bytes says so when the window is written back.
+        (void)helper_->ChunkWriteOpen(kMarkerId, kMarkerVersion);
+        (void)helper_->ChunkWriteClose();
         active_ = 1;
         return S_OK;
     }
     ULONG version = 0;
     if (helper_->ChunkReadOpen(kMarkerId, &version) == S_OK) {
-        helper_->ChunkReadClose();
+        (void)helper_->ChunkReadClose(); // an empty chunk: nothing to step over
         active_ = 1;
     } else {
         active_ = 0;
@@ -201,7 +202,7 @@ HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, ULONG& 
         return S_OK;
     }
     BYTE bytes[kDecodeWindow] = {};
-    buffer.ReadValue(bytes[0]); // unchecked: a missing tag stays 0, which no form has
+    (void)buffer.ReadValue(bytes[0]); // a missing tag stays 0, which no form has
     if (bytes[0] < lowestTag)
         return E_FAIL;
     if (HRESULT hr = buffer.Read(bytes + 1, ut::persist::PayloadBytes(bytes[0])); FAILED(hr))
@@ -217,7 +218,7 @@ HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
         return length ? S_OK : E_FAIL;
     }
     BYTE bytes[kDecodeWindow] = {};
-    buffer.ReadValue(bytes[0]); // unchecked, as above
+    (void)buffer.ReadValue(bytes[0]); // as above
     double probe = 0;
     ULONG length = ut::persist::UnpackDouble(bytes, probe);
     if (!length)
@@ -471,17 +472,18 @@ HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
     return S_OK;
 }
 
-// Reads of the plain header go unchecked: a header cut short reads as zeros.
+// Reads of the plain header go unchecked: a header cut short reads as zeros, which the id
+// comparison and the later reads of the body then refuse.
 HRESULT C3DStreamCompressor::ChunkSafeReadOpen(ULONG id, ULONG* version) {
     if (!active_)
         return STG_E_OLDFORMAT;
     ut::sdk::Rewind rewind(*buffer_);
     ULONG foundId = 0, foundVersion = 0, size = 0;
-    buffer_->ReadValue(foundId);
+    (void)buffer_->ReadValue(foundId);
     if (foundId != id)
         return rewind(STG_E_INVALIDHEADER);
-    buffer_->ReadValue(foundVersion);
-    buffer_->ReadValue(size);
+    (void)buffer_->ReadValue(foundVersion);
+    (void)buffer_->ReadValue(size);
     if (HRESULT hr = PushReadEnd(buffer_->Position() + size); FAILED(hr))
         return rewind(hr);
     if (version)

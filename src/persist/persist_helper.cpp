@@ -22,7 +22,7 @@ HRESULT Route(I3DStreamCompressor* compressor, ViaCompressor viaCompressor, ViaB
 C3DStreamHelper::C3DStreamHelper(IStream* stream) : CGWStreamHelper(stream) {
     if (!stream)
         return;
-    stream->QueryInterface(IID_I3DStreamCompressor, compressor_.PutVoid());
+    (void)stream->QueryInterface(IID_I3DStreamCompressor, compressor_.PutVoid()); // none: the plain form
     ut::ComPtr<IUnknown> counting;
     if (SUCCEEDED(stream->QueryInterface(IID_IGWChunkCountingStream, counting.PutVoid())) && counting)
         return;
@@ -32,7 +32,7 @@ C3DStreamHelper::C3DStreamHelper(IStream* stream) : CGWStreamHelper(stream) {
     }
     ULONG hostVersionKnown = 0;
     ULONG startDepth = 0;
-    compressor_->GetStartCount(hostVersionKnown, startDepth);
+    (void)compressor_->GetStartCount(hostVersionKnown, startDepth); // a failure leaves depth 0: counting on
     openDepth_ = startDepth;
     ut::ComPtr<IGWStreamCapabilities> capabilities;
     if (SUCCEEDED(stream->QueryInterface(IID_IGWStreamCapabilities, capabilities.PutVoid())) &&
@@ -45,7 +45,8 @@ C3DStreamHelper::~C3DStreamHelper() {
     if (openDepth_ == 0 || openDepth_ == kCountingOff)
         return;
     for (ULONG remaining = openDepth_; remaining > 0; --remaining)
-        CountClose(lastOpenWasRead_ ? RawChunkReadClose() : RawChunkWriteClose());
+        (void)CountClose(lastOpenWasRead_ ? RawChunkReadClose()
+                                          : RawChunkWriteClose()); // runs its full count
 }
 
 // Counting of open chunks. Writing always counts, even on a stream where reading does not.

@@ -37,7 +37,7 @@ public:
     PersistStream(ComPtr<IStream> buffered, ComPtr<IStream> table, bool saving)
         : buffered_(std::move(buffered)), table_(std::move(table)), saving_(saving), compressor_(*this) {
         ComPtr<IGWStreamBufferSource> source;
-        buffered_->QueryInterface(IID_IGWStreamBufferSource, source.PutVoid());
+        (void)buffered_->QueryInterface(IID_IGWStreamBufferSource, source.PutVoid()); // ours: always answers
         buffer_ = source->GetStreamBuffer();
     }
 

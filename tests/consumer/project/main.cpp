@@ -1,6 +1,7 @@
 // A plug-in's view of the installed library: the headers compile, the libraries link and load.
 #include <cstdio>
 
+#include <ut/detail/names.h>
 #include <ut/platform/stream.h>
 #include <ut/sdk/resources.h>
 #include <ut/ut.h>
@@ -9,7 +10,8 @@
 bool SystemHeadersWhole();
 
 int main() {
-    if (g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureCurrent] == 0 || !KXDictFindInstance(L"QVXUT")) {
+    if (g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureCurrent] == 0 ||
+        !KXDictFindInstance(ut::kDictionaryName)) {
         std::puts("the library did not load");
         return 1;
     }
