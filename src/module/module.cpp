@@ -1,4 +1,6 @@
 // The library's load and unload steps.
+#include <new>
+
 #include <ut/platform/module_entry.h>
 #include <ut/platform/process.h>
 #include <ut/sdk/resources.h>
@@ -38,13 +40,18 @@ HRESULT OnModuleAttach(HINSTANCE self) {
         return HRESULT_FROM_WIN32(static_cast<DWORD>(error));
     state.baseKey = key;
     state.streamCompressionDisabled = HasEnvironmentVariable("KX_DISABLE_STREAM_COMPRESSION");
+    state.time.reset(new (std::nothrow) ut::module::TimeState);
+    if (!state.time)
+        return E_OUTOFMEMORY;
     state.loaded = true;
     return S_OK;
 }
 
 void OnModuleDetach() {
     KXDictUnregisterInstance(ut::kDictionaryName);
-    ut::module::MutableState().loaded = false;
+    ut::module::State& state = ut::module::MutableState();
+    state.loaded = false;
+    state.time.reset();
 }
 
 } // namespace ut::platform

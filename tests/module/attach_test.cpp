@@ -37,8 +37,11 @@ TEST_F(AttachTest, AKnownModuleLoadsWithItsKey) {
     EXPECT_TRUE(ut::module::Loaded());
     EXPECT_EQ(ut::module::Current().baseKey, L"Software\\ut\\Modules\\ut_module_tests\\");
     EXPECT_EQ(KXDictFindInstance(L"QVXUT"), ThisExecutable());
+    ASSERT_NE(ut::module::Current().time, nullptr);
+    EXPECT_FALSE(ut::module::Current().time->renderTime.IsDefined());
     ut::platform::OnModuleDetach();
     EXPECT_FALSE(ut::module::Loaded());
+    EXPECT_EQ(ut::module::Current().time, nullptr);
 }
 
 } // namespace
