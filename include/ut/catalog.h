@@ -48,12 +48,12 @@ UT_API void KXGetCDError(DWORD code, wchar_t* buffer, int size);
 // dialog takes them, and "avi" as the default extension. The open dialogs require an existing file
 // and allow a multiple selection. Non-zero when the user chose; 0 when cancelled, on error, or
 // without a dialog service (the service's GetExtendedError then says why).
-UT_API int KXSelectSaveFileName(wchar_t* title, const wchar_t* filter, const wchar_t* initialDir, wchar_t* file,
-                                int fileSize);
-UT_API int KXSelectLoadFileName(wchar_t* title, const wchar_t* filter, const wchar_t* initialDir, wchar_t* file,
-                                int fileSize);
-UT_API int KXSelectLoadFileNameEx(HWND owner, wchar_t* title, const wchar_t* filter, const wchar_t* initialDir,
-                                  wchar_t* file, int fileSize);
+UT_API int KXSelectSaveFileName(wchar_t* title, const wchar_t* filter, const wchar_t* initialDir,
+                                wchar_t* file, int fileSize);
+UT_API int KXSelectLoadFileName(wchar_t* title, const wchar_t* filter, const wchar_t* initialDir,
+                                wchar_t* file, int fileSize);
+UT_API int KXSelectLoadFileNameEx(HWND owner, wchar_t* title, const wchar_t* filter,
+                                  const wchar_t* initialDir, wchar_t* file, int fileSize);
 
 // Turns a multiple selection (folder, names, each terminated, then an empty string) into one
 // string with `ch` after every piece: C:\dir, a.avi, b.avi become "C:\dir|a.avi|b.avi|" for '|'.

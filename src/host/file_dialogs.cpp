@@ -9,9 +9,13 @@ std::span<const CGWCOMObject::InterfaceEntry> FileDialogs::GetInterfaceMap() con
     return map;
 }
 
-HRESULT FileDialogs::ShowOpenDialog(OPENFILENAMEW* record) { return Show("IGWFileDialogs::ShowOpenDialog", record); }
+HRESULT FileDialogs::ShowOpenDialog(OPENFILENAMEW* record) {
+    return Show("IGWFileDialogs::ShowOpenDialog", record);
+}
 
-HRESULT FileDialogs::ShowSaveDialog(OPENFILENAMEW* record) { return Show("IGWFileDialogs::ShowSaveDialog", record); }
+HRESULT FileDialogs::ShowSaveDialog(OPENFILENAMEW* record) {
+    return Show("IGWFileDialogs::ShowSaveDialog", record);
+}
 
 HRESULT FileDialogs::GetExtendedError(DWORD* code) {
     if (HRESULT hr = ut::sdk::CheckHostFault("IGWFileDialogs::GetExtendedError"); FAILED(hr))

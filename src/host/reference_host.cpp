@@ -77,7 +77,8 @@ HRESULT ReferenceHost::InstallClass(REFCLSID clsid, IClassFactory* factory) {
 
 HRESULT ReferenceHost::OpenContainer() {
     ut::ComPtr<IUnknown> container;
-    if (HRESULT hr = Record(KXCreateInstance(CLSID_GWContentContainer, IID_IUnknown, container.PutVoid())); FAILED(hr))
+    if (HRESULT hr = Record(KXCreateInstance(CLSID_GWContentContainer, IID_IUnknown, container.PutVoid()));
+        FAILED(hr))
         return hr;
     containerOpened_ = true;
     return Record(GWContentSetCurrentContainer(container.Get()));

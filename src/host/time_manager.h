@@ -16,7 +16,8 @@ public:
     UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
 
-    HRESULT STDMETHODCALLTYPE GetFormat(GWTIMEFORMATTYPE type, tagGWTIMEFORMAT* format, double* rate) override;
+    HRESULT STDMETHODCALLTYPE GetFormat(GWTIMEFORMATTYPE type, tagGWTIMEFORMAT* format,
+                                        double* rate) override;
     HRESULT STDMETHODCALLTYPE GetDisplayFormat(GWTIMEDISPLAYFORMAT* display, tagGWTIMEFORMAT* format,
                                                double* rate) override;
 

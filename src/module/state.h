@@ -30,6 +30,8 @@ struct State {
 
 const State& Current();
 
-inline bool Loaded() { return Current().loaded; }
+inline bool Loaded() {
+    return Current().loaded;
+}
 
 } // namespace ut::module

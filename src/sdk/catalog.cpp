@@ -43,7 +43,8 @@ CKXCatalog::CKXCatalog(const wchar_t* name) : m_name(name ? name : L"") {}
 HRESULT CKXCatalog::GetMsgEx(CKXString& out, ULONG id, va_list arguments) {
     m_lastResult = ut::ExportBoundary([&] {
         HRESULT found = S_OK;
-        const wchar_t* format = ut::sdk::FindText(ut::sdk::TextKind::Catalog, m_name.View(), id, nullptr, &found);
+        const wchar_t* format =
+            ut::sdk::FindText(ut::sdk::TextKind::Catalog, m_name.View(), id, nullptr, &found);
         if (FAILED(found))
             return found;
         if (!format)
@@ -67,13 +68,21 @@ HRESULT CKXCatalog::GetMsg(CKXString& out, ULONG id, ...) {
 
 CKXErrorHandling::~CKXErrorHandling() = default;
 
-HRESULT CKXErrorHandling::OnCreateMsgMap() { return S_OK; }
+HRESULT CKXErrorHandling::OnCreateMsgMap() {
+    return S_OK;
+}
 
-wchar_t* CKXErrorHandling::GetCatalogName() { return nullptr; }
+wchar_t* CKXErrorHandling::GetCatalogName() {
+    return nullptr;
+}
 
-HRESULT CKXErrorHandling::LogMessage(CKXMsgString& message) { return KXLogMessage(message, KXLOG_ERROR); }
+HRESULT CKXErrorHandling::LogMessage(CKXMsgString& message) {
+    return KXLogMessage(message, KXLOG_ERROR);
+}
 
-ULONG CKXErrorHandling::GetMsgMapKey() { return 0; }
+ULONG CKXErrorHandling::GetMsgMapKey() {
+    return 0;
+}
 
 HRESULT CKXErrorHandling::ReportMsg(ULONG id, ...) {
     if (!m_msgMapCreated) {

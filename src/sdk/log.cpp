@@ -33,7 +33,8 @@ std::wstring KindName(ULONG kind) {
     }
 }
 
-HRESULT WriteToStandardError(void*, ULONG kind, const wchar_t* text, const wchar_t* source, const wchar_t* details) {
+HRESULT WriteToStandardError(void*, ULONG kind, const wchar_t* text, const wchar_t* source,
+                             const wchar_t* details) {
     std::wstring line = KindName(kind) + L": " + text;
     if (source && *source)
         line += std::wstring(L" [") + source + L"]";

@@ -99,7 +99,8 @@ HINSTANCE KXDictFindInstance(const wchar_t* name) {
 const wchar_t* DictLoadIdstring(const wchar_t* dictionary, unsigned short id) {
     if (!dictionary || !*dictionary)
         return L"";
-    return ut::ExportBoundary([&] { return DictionaryText(dictionary, id, KXDictFindInstance(dictionary)); }, L"");
+    return ut::ExportBoundary([&] { return DictionaryText(dictionary, id, KXDictFindInstance(dictionary)); },
+                              L"");
 }
 
 const wchar_t* KXDictLoadInstanceIdstring(HINSTANCE module, unsigned int id) {
@@ -116,5 +117,6 @@ const wchar_t* KXDictLoadInstanceIdstring(HINSTANCE module, unsigned int id) {
 HRESULT KXDictLoadFile(const wchar_t* name, const wchar_t* path) {
     if (!name)
         return E_INVALIDARG;
-    return ut::ExportBoundary([&] { return ut::sdk::LoadTextTable(ut::sdk::TextKind::Dictionary, name, path); });
+    return ut::ExportBoundary(
+        [&] { return ut::sdk::LoadTextTable(ut::sdk::TextKind::Dictionary, name, path); });
 }

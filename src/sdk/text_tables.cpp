@@ -26,7 +26,9 @@ Tables& AllTables() {
     return *tables;
 }
 
-const wchar_t* Extension(TextKind kind) { return kind == TextKind::Dictionary ? L".dict" : L".cat"; }
+const wchar_t* Extension(TextKind kind) {
+    return kind == TextKind::Dictionary ? L".dict" : L".cat";
+}
 
 std::wstring Unescape(std::string_view text) {
     std::string plain;
@@ -67,7 +69,8 @@ std::vector<std::wstring> TextFolders(HINSTANCE module) {
         return {};
     const wchar_t separator = file[slash];
     std::vector<std::wstring> folders;
-    for (std::wstring relative : {std::wstring(L"../share/ut"), ut::platform::WideFromUtf8(UT_INSTALLED_TEXTS)}) {
+    for (std::wstring relative :
+         {std::wstring(L"../share/ut"), ut::platform::WideFromUtf8(UT_INSTALLED_TEXTS)}) {
         std::replace(relative.begin(), relative.end(), L'/', separator);
         std::wstring folder = file.substr(0, slash + 1) + relative + separator;
         if (std::find(folders.begin(), folders.end(), folder) == folders.end())
@@ -76,7 +79,9 @@ std::vector<std::wstring> TextFolders(HINSTANCE module) {
     return folders;
 }
 
-HINSTANCE ThisLibrary() { return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisLibrary)); }
+HINSTANCE ThisLibrary() {
+    return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisLibrary));
+}
 
 HRESULT ReadTable(const wchar_t* path, TextEntries& entries) {
     std::string content;

@@ -40,7 +40,8 @@ double CGWTime::GetTicksPerSecond() const {
     return rate_;
 }
 
-HRESULT CGWTimeManagerHelper::GetTimeFormatW(GWTIMEFORMATTYPE type, tagGWTIMEFORMAT* format, double* rate) const {
+HRESULT CGWTimeManagerHelper::GetTimeFormatW(GWTIMEFORMATTYPE type, tagGWTIMEFORMAT* format,
+                                             double* rate) const {
     HRESULT hr = S_OK;
     ut::ComPtr<IGWTimeManager> manager = FindTimeManager(hr);
     return manager ? manager->GetFormat(type, format, rate) : hr;

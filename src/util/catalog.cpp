@@ -115,9 +115,13 @@ HRESULT C3DCatalog::LogMsg(ULONG kind, ULONG messageId, ...) {
 
 C3DErrorHandling::~C3DErrorHandling() = default;
 
-wchar_t* C3DErrorHandling::GetCatalogName() { return const_cast<wchar_t*>(ut::kCatalogName); }
+wchar_t* C3DErrorHandling::GetCatalogName() {
+    return const_cast<wchar_t*>(ut::kCatalogName);
+}
 
-HRESULT C3DErrorHandling::LogMessage(CKXMsgString& message) { return KXLogMessage(message, KXLOG_ERROR); }
+HRESULT C3DErrorHandling::LogMessage(CKXMsgString& message) {
+    return KXLogMessage(message, KXLOG_ERROR);
+}
 
 wchar_t* KXLoadString(HINSTANCE module, unsigned int id) {
     using ut::util::TaskString;
@@ -150,12 +154,14 @@ void KXGetCDError(DWORD code, wchar_t* buffer, int size) {
 
 int KXSelectSaveFileName(wchar_t* title, const wchar_t* filter, const wchar_t* initialDir, wchar_t* file,
                          int fileSize) {
-    return ut::util::RunFileDialog(ut::util::Dialog::Save, nullptr, title, filter, initialDir, file, fileSize);
+    return ut::util::RunFileDialog(ut::util::Dialog::Save, nullptr, title, filter, initialDir, file,
+                                   fileSize);
 }
 
 int KXSelectLoadFileName(wchar_t* title, const wchar_t* filter, const wchar_t* initialDir, wchar_t* file,
                          int fileSize) {
-    return ut::util::RunFileDialog(ut::util::Dialog::Load, nullptr, title, filter, initialDir, file, fileSize);
+    return ut::util::RunFileDialog(ut::util::Dialog::Load, nullptr, title, filter, initialDir, file,
+                                   fileSize);
 }
 
 int KXSelectLoadFileNameEx(HWND owner, wchar_t* title, const wchar_t* filter, const wchar_t* initialDir,
@@ -172,4 +178,3 @@ void KXReplaceEmbededNullCharByChar(wchar_t* text, wchar_t ch) {
         piece += length + 1;
     }
 }
-

@@ -24,7 +24,9 @@ bool RateIsTheManagers(tagGWTIMEFORMAT format) {
     return format == GWTIMEFORMAT_FRAMES || format == GWTIMEFORMAT_FIELDS || format == GWTIMEFORMAT_SAMPLES;
 }
 
-ut::module::TimeState* Time() { return ut::module::Current().time.get(); }
+ut::module::TimeState* Time() {
+    return ut::module::Current().time.get();
+}
 
 // Turns the manager's answer into the function's result, putting the fallback in place of a
 // failed answer. Only 0 counts as an answer.
@@ -38,7 +40,8 @@ HRESULT AcceptOrFallBack(HRESULT managerResult, tagGWTIMEFORMAT& format, double&
 
 HRESULT SceneFormat(tagGWTIMEFORMAT& format, double& rate) {
     ut::module::TimeState* time = Time();
-    HRESULT hr = time ? time->timeManager.GetTimeFormatW(GWTIMEFORMATTYPE_SCENE, &format, &rate) : E_UNEXPECTED;
+    HRESULT hr =
+        time ? time->timeManager.GetTimeFormatW(GWTIMEFORMATTYPE_SCENE, &format, &rate) : E_UNEXPECTED;
     return AcceptOrFallBack(hr, format, rate);
 }
 
@@ -155,8 +158,8 @@ HRESULT KXGetDisplayTimeFormat(GWTIMEDISPLAYFORMAT* display, tagGWTIMEFORMAT* fo
         return E_UNEXPECTED;
     tagGWTIMEFORMAT sceneFormat = ut::util::kFallbackFormat;
     double sceneRate = ut::util::kFallbackRate;
-    HRESULT hr = ut::util::AcceptOrFallBack(state->timeManager.GetDisplayFormat(display, &sceneFormat, &sceneRate),
-                                            sceneFormat, sceneRate);
+    HRESULT hr = ut::util::AcceptOrFallBack(
+        state->timeManager.GetDisplayFormat(display, &sceneFormat, &sceneRate), sceneFormat, sceneRate);
     return ut::util::StoreFormat(hr, sceneFormat, sceneRate, format, rate, ticksPerSecond);
 }
 
@@ -171,7 +174,8 @@ double KXSecondsToFrames(double seconds) {
 LONG KXSecondsToNearestFrame(double seconds) {
     constexpr LONG kIndefinite = std::numeric_limits<LONG>::min();
     double frame = std::floor(ut::util::ConversionTime().toUnits(seconds) + CGWTime::Epsilon);
-    if (!(frame >= static_cast<double>(kIndefinite) && frame <= static_cast<double>(std::numeric_limits<LONG>::max())))
+    if (!(frame >= static_cast<double>(kIndefinite) &&
+          frame <= static_cast<double>(std::numeric_limits<LONG>::max())))
         return kIndefinite;
     return static_cast<LONG>(frame);
 }

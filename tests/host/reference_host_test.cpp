@@ -31,7 +31,7 @@ std::wstring VersionString(ULONG index) {
 
 TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
     const CLSID services[] = {CLSID_GWVersionInfo, CLSID_GWAmbientValues, CLSID_GWActiveDatabase,
-                              CLSID_GWTimeManager,  CLSID_GWPlayControl,   CLSID_GWFileDialogs};
+                              CLSID_GWTimeManager, CLSID_GWPlayControl,   CLSID_GWFileDialogs};
     ut::test::LiveObjectCheck live;
     {
         ut::host::ReferenceHost host;
@@ -101,10 +101,18 @@ TEST(TimeServices, AnswerTheScenesSettingsInSeconds) {
     };
     const Case cases[] = {
         {{}, 1.0 / 30.0, 1.0 / 30.0, 100.0 / 30.0}, // a scene at 30 frames a second
-        {{.timeFormat = GWTIMEFORMAT_PAL, .frameRate = 25.0, .timeDisplay = GWTIMEDISPLAY_TIMECODE, .playFrame = 50.0,
-          .firstFrame = -25.0, .lastFrame = 0.0},
-         2.0, -1.0, 0.0},
-        {{.timeFormat = GWTIMEFORMAT_SAMPLES, .frameRate = 48000.0, .playFrame = 24000.0}, 0.5, 1.0 / 48000.0,
+        {{.timeFormat = GWTIMEFORMAT_PAL,
+          .frameRate = 25.0,
+          .timeDisplay = GWTIMEDISPLAY_TIMECODE,
+          .playFrame = 50.0,
+          .firstFrame = -25.0,
+          .lastFrame = 0.0},
+         2.0,
+         -1.0,
+         0.0},
+        {{.timeFormat = GWTIMEFORMAT_SAMPLES, .frameRate = 48000.0, .playFrame = 24000.0},
+         0.5,
+         1.0 / 48000.0,
          100.0 / 48000.0},
     };
     for (const Case& c : cases) {

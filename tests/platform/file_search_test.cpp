@@ -27,8 +27,8 @@ std::vector<Entry> FindAll(const std::wstring& name) {
     if (!search.Valid())
         return entries;
     do {
-        entries.push_back({found.cFileName, (found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0,
-                           found.nFileSizeLow});
+        entries.push_back(
+            {found.cFileName, (found.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0, found.nFileSizeLow});
     } while (FindNextFileW(search.Get(), &found));
     std::sort(entries.begin(), entries.end());
     return entries;
@@ -50,8 +50,13 @@ TEST(FileSearch, FindsOneEntryByNameAndListsAFoldersMatches) {
         {temp.Path(), {{temp.Path().substr(temp.Path().find_last_of(L"/\\") + 1), true, 0}}},
         {temp.Path(L"*.avi"), {{L"a.avi", false, 5}, {L"b.avi", false, 0}}},
         {temp.Path(L"?.txt"), {{L"c.txt", false, 1}}},
-        {temp.Path(L"*"), {{L".", true, 0}, {L"..", true, 0}, {L"a.avi", false, 5}, {L"b.avi", false, 0},
-                           {L"c.txt", false, 1}, {L"sub", true, 0}}},
+        {temp.Path(L"*"),
+         {{L".", true, 0},
+          {L"..", true, 0},
+          {L"a.avi", false, 5},
+          {L"b.avi", false, 0},
+          {L"c.txt", false, 1},
+          {L"sub", true, 0}}},
         {temp.Path(L"*.mov"), {}},
         {temp.Path(L"missing"), {}},
         {temp.Path(L"missing") + L"/*", {}},

@@ -23,7 +23,9 @@ namespace {
 
 using TaskString = std::unique_ptr<wchar_t, ut::TaskMemDeleter>;
 
-HINSTANCE ThisProgram() { return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisProgram)); }
+HINSTANCE ThisProgram() {
+    return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisProgram));
+}
 
 // A dictionary of this program, read from a file and registered under "UTTEST" for the test.
 class ProgramDictionary {
@@ -59,7 +61,9 @@ TEST(LoadString, CopiesTextsOfAnyLengthAroundEachDoubling) {
     }
 }
 
-std::wstring Entry(unsigned short id) { return DictLoadIdstring(L"QVXUT", id); }
+std::wstring Entry(unsigned short id) {
+    return DictLoadIdstring(L"QVXUT", id);
+}
 
 TEST(CommonDialogError, MapsEveryCodeToItsDictionaryEntry) {
     struct Case {
@@ -67,9 +71,9 @@ TEST(CommonDialogError, MapsEveryCodeToItsDictionaryEntry) {
         unsigned short entry;
     };
     std::vector<Case> cases = {
-        {0xFFFF, 6022}, {1, 6024},      {2, 6025},      {3, 6026},      {4, 6050},      {5, 6027},
-        {6, 6028},      {7, 6029},      {8, 6030},      {9, 6031},      {10, 6032},     {11, 6033},
-        {0x2001, 6045}, {0x3001, 6046}, {0x3002, 6047}, {0x3003, 6048}, {12, 6049},     {0x1000, 6049},
+        {0xFFFF, 6022}, {1, 6024},      {2, 6025},      {3, 6026},      {4, 6050},       {5, 6027},
+        {6, 6028},      {7, 6029},      {8, 6030},      {9, 6031},      {10, 6032},      {11, 6033},
+        {0x2001, 6045}, {0x3001, 6046}, {0x3002, 6047}, {0x3003, 6048}, {12, 6049},      {0x1000, 6049},
         {0x100C, 6049}, {0x2002, 6049}, {0x3004, 6049}, {0xFFFE, 6049}, {0x10000, 6049},
     };
     for (DWORD code = 0x1001; code <= 0x100B; ++code)
@@ -130,7 +134,8 @@ public:
     std::vector<Logged> lines;
 
 private:
-    static HRESULT Sink(void* context, ULONG kind, const wchar_t* text, const wchar_t* source, const wchar_t*) {
+    static HRESULT Sink(void* context, ULONG kind, const wchar_t* text, const wchar_t* source,
+                        const wchar_t*) {
         auto* self = static_cast<LogCapture*>(context);
         self->lines.push_back({kind, text, source ? source : L""});
         return self->answer_;
@@ -148,19 +153,37 @@ TEST(CatalogLogMsg, FormatsThenLogsAndStopsAtTheFirstFailure) {
         std::vector<std::wstring> logged;
     };
     const Case cases[] = {
-        {L"kxmsgcat", S_OK, [](C3DCatalog& c) { return c.LogMsg(KXLOG_WARNING, 100, L"a.scn"); }, S_OK,
+        {L"kxmsgcat",
+         S_OK,
+         [](C3DCatalog& c) { return c.LogMsg(KXLOG_WARNING, 100, L"a.scn"); },
+         S_OK,
          {L"The file a.scn could not be opened."}},
-        {L"kxmsgcat", S_OK, [](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 300, 5, 1, 3); }, S_OK,
+        {L"kxmsgcat",
+         S_OK,
+         [](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 300, 5, 1, 3); },
+         S_OK,
          {L"Frame 5 lies outside the range 1 to 3."}},
-        {L"kxmsgcat", S_OK, [](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 301, 29.97); }, S_OK,
+        {L"kxmsgcat",
+         S_OK,
+         [](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 301, 29.97); },
+         S_OK,
          {L"The scene runs at 29.97 frames a second."}},
-        {L"kxmsgcat", S_OK, [&](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 1, longName.c_str()); }, S_OK,
+        {L"kxmsgcat",
+         S_OK,
+         [&](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 1, longName.c_str()); },
+         S_OK,
          {longName}},
         {L"kxmsgcat", S_OK, [](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 9999); }, KX_E_MSG_NOT_FOUND, {}},
-        {L"nosuchcat", S_OK, [](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 100, L"a"); }, STG_E_FILENOTFOUND,
+        {L"nosuchcat",
+         S_OK,
+         [](C3DCatalog& c) { return c.LogMsg(KXLOG_INFO, 100, L"a"); },
+         STG_E_FILENOTFOUND,
          {}},
-        {L"kxmsgcat", E_ACCESSDENIED, [](C3DCatalog& c) { return c.LogMsg(KXLOG_ERROR, 100, L"b"); },
-         E_ACCESSDENIED, {L"The file b could not be opened."}},
+        {L"kxmsgcat",
+         E_ACCESSDENIED,
+         [](C3DCatalog& c) { return c.LogMsg(KXLOG_ERROR, 100, L"b"); },
+         E_ACCESSDENIED,
+         {L"The file b could not be opened."}},
     };
     for (const Case& c : cases) {
         LogCapture log(c.sinkAnswer);
@@ -209,7 +232,7 @@ TEST(ReplaceEmbeddedNulls, JoinsAFoldersSelectionAndLeavesEverythingElse) {
         {Selection({folder, L"a.avi"}), L';', folder + L";a.avi;" + L'\0'},
         {Selection({folder}), L'|', folder + L"|" + L'\0'},
         {Selection({folder + L"|x", L"a.avi"}), L'|', Selection({folder + L"|x", L"a.avi"})}, // holds ch
-        {Selection({file}), L'|', Selection({file})},                                       // a single file
+        {Selection({file}), L'|', Selection({file})},                                         // a single file
         {Selection({missing, L"a.avi"}), L'|', Selection({missing, L"a.avi"})},
     };
     for (const Case& c : cases) {
@@ -225,8 +248,12 @@ class RecordingDialogs : public ut::test::ComMock<IGWFileDialogs> {
 public:
     RecordingDialogs() : ComMock(IID_IGWFileDialogs) {}
 
-    HRESULT STDMETHODCALLTYPE ShowOpenDialog(OPENFILENAMEW* record) override { return Record(L"open", record); }
-    HRESULT STDMETHODCALLTYPE ShowSaveDialog(OPENFILENAMEW* record) override { return Record(L"save", record); }
+    HRESULT STDMETHODCALLTYPE ShowOpenDialog(OPENFILENAMEW* record) override {
+        return Record(L"open", record);
+    }
+    HRESULT STDMETHODCALLTYPE ShowSaveDialog(OPENFILENAMEW* record) override {
+        return Record(L"save", record);
+    }
     HRESULT STDMETHODCALLTYPE GetExtendedError(DWORD* code) override {
         *code = 0;
         return S_OK;
@@ -245,7 +272,7 @@ private:
 };
 
 TEST(FileDialogs, FillTheRequestForTheirDialog) {
-    using Select = std::function<int(wchar_t* file)>;
+    using Select = std::function<int(wchar_t * file)>;
     const auto owner = reinterpret_cast<HWND>(static_cast<std::uintptr_t>(0x1234));
     wchar_t title[] = L"Pick";
     const wchar_t* filter = L"Clips\0*.avi\0";
@@ -257,12 +284,12 @@ TEST(FileDialogs, FillTheRequestForTheirDialog) {
         DWORD flags;
     };
     const Case cases[] = {
-        {[&](wchar_t* file) { return KXSelectSaveFileName(title, filter, folder, file, 64); }, L"save", nullptr,
-         0x280000},
-        {[&](wchar_t* file) { return KXSelectLoadFileName(title, filter, folder, file, 64); }, L"open", nullptr,
-         0x281200},
-        {[&](wchar_t* file) { return KXSelectLoadFileNameEx(owner, title, filter, folder, file, 64); }, L"open",
-         owner, 0x281200},
+        {[&](wchar_t* file) { return KXSelectSaveFileName(title, filter, folder, file, 64); }, L"save",
+         nullptr, 0x280000},
+        {[&](wchar_t* file) { return KXSelectLoadFileName(title, filter, folder, file, 64); }, L"open",
+         nullptr, 0x281200},
+        {[&](wchar_t* file) { return KXSelectLoadFileNameEx(owner, title, filter, folder, file, 64); },
+         L"open", owner, 0x281200},
     };
     for (const Case& c : cases) {
         wchar_t file[64] = L"start.avi";

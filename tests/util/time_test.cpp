@@ -22,11 +22,13 @@ double SecondsOf(const ut::host::Settings& scene, double frames) {
 }
 
 bool SameTime(const tagGWTIME& a, const tagGWTIME& b) {
-    return a.format == b.format && a.rate == b.rate && (a.time == b.time || (std::isnan(a.time) && std::isnan(b.time)));
+    return a.format == b.format && a.rate == b.rate &&
+           (a.time == b.time || (std::isnan(a.time) && std::isnan(b.time)));
 }
 
 std::string Describe(const tagGWTIME& t) {
-    return "{" + std::to_string(t.format) + ", " + std::to_string(t.rate) + ", " + std::to_string(t.time) + "}";
+    return "{" + std::to_string(t.format) + ", " + std::to_string(t.rate) + ", " + std::to_string(t.time) +
+           "}";
 }
 
 // Every test leaves the render time undefined, as the library starts.
@@ -85,8 +87,14 @@ TEST_F(TimeTest, NearestFrameRoundsDownAfterAnEpsilonOfBias) {
     };
     const double eps = CGWTime::Epsilon;
     const Case cases[] = {
-        {24.0 - eps / 2, 24}, {24.0 - 2 * eps, 23}, {23.6, 23},  {24.1, 24},
-        {0.0, 0},             {-eps / 2, 0},        {-0.5, -1},  {-24.0, -24},
+        {24.0 - eps / 2, 24},
+        {24.0 - 2 * eps, 23},
+        {23.6, 23},
+        {24.1, 24},
+        {0.0, 0},
+        {-eps / 2, 0},
+        {-0.5, -1},
+        {-24.0, -24},
         {1.0e6, 1000000},
         {2147483648.0, std::numeric_limits<LONG>::min()}, // beyond 32 bits: the indefinite integer
         {-1e12, std::numeric_limits<LONG>::min()},
@@ -98,8 +106,8 @@ TEST_F(TimeTest, NearestFrameRoundsDownAfterAnEpsilonOfBias) {
 }
 
 TEST_F(TimeTest, AFailingTimeManagerGivesSecondsAtRateOne) {
-    ut::host::ReferenceHost host({.timeFormat = GWTIMEFORMAT_PAL, .frameRate = 25.0,
-                                  .timeDisplay = GWTIMEDISPLAY_TIMECODE});
+    ut::host::ReferenceHost host(
+        {.timeFormat = GWTIMEFORMAT_PAL, .frameRate = 25.0, .timeDisplay = GWTIMEDISPLAY_TIMECODE});
     // The manager is found, then asked: failing either falls back.
     for (int n = 1;; ++n) {
         ut::test::FaultPlan plan(n);
@@ -180,8 +188,8 @@ TEST_F(TimeTest, AFiniteRenderTimeOverridesThePlayPositionUntilAnUndefinedOneIsS
 }
 
 TEST_F(TimeTest, TheCurrentTimeFallsBackFromThePositionToTheRangeStartToZero) {
-    const ut::host::Settings scene = {.timeFormat = GWTIMEFORMAT_FILM, .frameRate = 24.0, .playFrame = 36.0,
-                                      .firstFrame = 12.0};
+    const ut::host::Settings scene = {
+        .timeFormat = GWTIMEFORMAT_FILM, .frameRate = 24.0, .playFrame = 36.0, .firstFrame = 12.0};
     ut::host::ReferenceHost host(scene);
     const tagGWTIME expected[] = {
         {scene.timeFormat, scene.frameRate, SecondsOf(scene, 36.0)}, // clean
@@ -250,8 +258,8 @@ TEST_F(TimeTest, WithoutACurrentContainerEachCallWorksOnANewOne) {
 }
 
 TEST_F(TimeTest, KeyTimeFaultsFallBackOrAreReturnedAndLeaveNothingBehind) {
-    const ut::host::Settings scene = {.timeFormat = GWTIMEFORMAT_FILM, .frameRate = 24.0, .playFrame = 6.0,
-                                      .keyFrame = 12.0};
+    const ut::host::Settings scene = {
+        .timeFormat = GWTIMEFORMAT_FILM, .frameRate = 24.0, .playFrame = 6.0, .keyFrame = 12.0};
     ut::host::ReferenceHost host(scene);
     ASSERT_EQ(KXSetKeyTime(1.0, 0, 0), S_OK); // the current container now differs from a new one
     struct Outcome {
@@ -261,11 +269,10 @@ TEST_F(TimeTest, KeyTimeFaultsFallBackOrAreReturnedAndLeaveNothingBehind) {
     // Host calls in order: current container, key-time property, its value, then the conversion's
     // time manager and its format.
     const Outcome reads[] = {
-        {S_OK, 1.0},  // clean
-        {S_OK, 0.5},  // no current container: a new one, at the host's key frame
-        {S_OK, 0.25}, // no key-time property: the current time, the play position
-        {E_FAIL, -1.0},
-        {S_OK, 24.0}, // frames counted one a second
+        {S_OK, 1.0},                  // clean
+        {S_OK, 0.5},                  // no current container: a new one, at the host's key frame
+        {S_OK, 0.25},                 // no key-time property: the current time, the play position
+        {E_FAIL, -1.0}, {S_OK, 24.0}, // frames counted one a second
         {S_OK, 24.0},
     };
     for (int n = 1;; ++n) {
@@ -283,13 +290,11 @@ TEST_F(TimeTest, KeyTimeFaultsFallBackOrAreReturnedAndLeaveNothingBehind) {
     // Host calls in order: current container, key-time property, time manager, format, the
     // parameter's setter, the refresh.
     const Outcome writes[] = {
-        {S_OK, 2.0},   // clean
-        {S_OK, 1.0},   // a new container took the time and went
-        {E_FAIL, 1.0}, // no key-time property
-        {S_OK, 2.0 / 24.0}, // 2 seconds counted as 2 frames
-        {S_OK, 2.0 / 24.0},
-        {E_FAIL, 1.0},
-        {E_FAIL, 2.0}, // the refresh failed after the time was set
+        {S_OK, 2.0},                                      // clean
+        {S_OK, 1.0},                                      // a new container took the time and went
+        {E_FAIL, 1.0},                                    // no key-time property
+        {S_OK, 2.0 / 24.0},                               // 2 seconds counted as 2 frames
+        {S_OK, 2.0 / 24.0}, {E_FAIL, 1.0}, {E_FAIL, 2.0}, // the refresh failed after the time was set
     };
     for (int n = 1;; ++n) {
         HRESULT hr = S_OK;

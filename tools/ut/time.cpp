@@ -76,7 +76,8 @@ CLI::App* AddConversion(CLI::App& time, const char* name, const char* summary, c
                         const std::shared_ptr<TimeOptions>& options) {
     CLI::App* command = time.add_subcommand(name, summary);
     command->add_option(values, options->values)->required();
-    command->add_option("--fps", options->fps, "count at this many frames a second")->check(CLI::PositiveNumber);
+    command->add_option("--fps", options->fps, "count at this many frames a second")
+        ->check(CLI::PositiveNumber);
     command->add_option("--format", options->format, "count in this format, by name or number")
         ->transform(CLI::CheckedTransformer(kFormatNames, CLI::ignore_case));
     return command;
@@ -85,14 +86,18 @@ CLI::App* AddConversion(CLI::App& time, const char* name, const char* summary, c
 } // namespace
 
 void AddTimeCommand(CLI::App& app) {
-    CLI::App* time = app.add_subcommand("time", "convert between frames and seconds under a scene's time format");
+    CLI::App* time =
+        app.add_subcommand("time", "convert between frames and seconds under a scene's time format");
     time->require_subcommand(1);
     auto options = std::make_shared<TimeOptions>();
     AddConversion(*time, "frames-to-seconds", "the seconds of each frame count", "frames", options)
-        ->callback([options] { PrintEach(*options, [](double frames) { return Shortest(KXFramesToSeconds(frames)); }); });
+        ->callback([options] {
+            PrintEach(*options, [](double frames) { return Shortest(KXFramesToSeconds(frames)); });
+        });
     AddConversion(*time, "seconds-to-frame", "the frame each time in seconds falls in", "seconds", options)
         ->callback([options] {
-            PrintEach(*options, [](double seconds) { return std::to_string(KXSecondsToNearestFrame(seconds)); });
+            PrintEach(*options,
+                      [](double seconds) { return std::to_string(KXSecondsToNearestFrame(seconds)); });
         });
 }
 

@@ -3,8 +3,9 @@
 //
 // On POSIX a name whose last part holds `*` or `?` lists the entries of its folder that match it
 // as the shell matches (case-sensitive; "." and ".." match "*", as on Windows), in no particular
-// order; any other name finds that one entry, a folder included. Attributes reported there: FILE_ATTRIBUTE_DIRECTORY, FILE_ATTRIBUTE_READONLY (no
-// write permission) and FILE_ATTRIBUTE_NORMAL when neither applies.
+// order; any other name finds that one entry, a folder included. Attributes reported there:
+// FILE_ATTRIBUTE_DIRECTORY, FILE_ATTRIBUTE_READONLY (no write permission) and FILE_ATTRIBUTE_NORMAL when
+// neither applies.
 #pragma once
 
 #include <ut/platform/com.h>

@@ -37,6 +37,7 @@ using KXLogSinkProc = HRESULT (*)(void* context, ULONG kind, const wchar_t* text
 UT_SDK_API void KXSetLogSink(KXLogSinkProc sink, void* context);
 
 // Logs `text`; `source` and `details` may be null. E_POINTER for a null text.
-UT_SDK_API HRESULT KXLogMessage(ULONG kind, const wchar_t* text, const wchar_t* source, const wchar_t* details);
+UT_SDK_API HRESULT KXLogMessage(ULONG kind, const wchar_t* text, const wchar_t* source,
+                                const wchar_t* details);
 // Logs the message's text with "<catalog> <number>" as its source (none for a plain text).
 UT_SDK_API HRESULT KXLogMessage(CKXMsgString& message, ULONG kind);

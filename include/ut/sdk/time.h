@@ -13,18 +13,18 @@
 #include <ut/sdk/export.h>
 
 enum tagGWTIMEFORMAT : LONG {
-    GWTIMEFORMAT_FILM = 1,         // 24 frames a second
-    GWTIMEFORMAT_PAL = 2,          // 25 frames a second
-    GWTIMEFORMAT_NTSC = 3,         // 30000/1001 frames a second
-    GWTIMEFORMAT_VIDEO30 = 4,      // 30 frames a second
-    GWTIMEFORMAT_PAL_FIELDS = 5,   // 50 fields a second
-    GWTIMEFORMAT_NTSC_FIELDS = 6,  // 60000/1001 fields a second
-    GWTIMEFORMAT_VIDEO60 = 7,      // 60 frames a second
-    GWTIMEFORMAT_SECONDS = 10,     // one unit a second; also what is used when nothing else is known
-    GWTIMEFORMAT_FRAMES = 11,      // frames at the time's own rate
-    GWTIMEFORMAT_FIELDS = 12,      // fields at the time's own rate
+    GWTIMEFORMAT_FILM = 1,          // 24 frames a second
+    GWTIMEFORMAT_PAL = 2,           // 25 frames a second
+    GWTIMEFORMAT_NTSC = 3,          // 30000/1001 frames a second
+    GWTIMEFORMAT_VIDEO30 = 4,       // 30 frames a second
+    GWTIMEFORMAT_PAL_FIELDS = 5,    // 50 fields a second
+    GWTIMEFORMAT_NTSC_FIELDS = 6,   // 60000/1001 fields a second
+    GWTIMEFORMAT_VIDEO60 = 7,       // 60 frames a second
+    GWTIMEFORMAT_SECONDS = 10,      // one unit a second; also what is used when nothing else is known
+    GWTIMEFORMAT_FRAMES = 11,       // frames at the time's own rate
+    GWTIMEFORMAT_FIELDS = 12,       // fields at the time's own rate
     GWTIMEFORMAT_MILLISECONDS = 20, // 1000 units a second
-    GWTIMEFORMAT_SAMPLES = 31,     // audio samples at the time's own rate
+    GWTIMEFORMAT_SAMPLES = 31,      // audio samples at the time's own rate
 };
 
 // Which format the time manager is asked for.
@@ -120,7 +120,8 @@ inline constexpr IID IID_IGWTimeManager = {
 // Every output may be null (it is then not written); on failure the outputs are left as they were.
 struct IGWTimeManager : IUnknown {
     // The format and rate of `type`; E_INVALIDARG for a type the manager does not know.
-    virtual HRESULT STDMETHODCALLTYPE GetFormat(GWTIMEFORMATTYPE type, tagGWTIMEFORMAT* format, double* rate) = 0;
+    virtual HRESULT STDMETHODCALLTYPE GetFormat(GWTIMEFORMATTYPE type, tagGWTIMEFORMAT* format,
+                                                double* rate) = 0;
     // How the scene's times are shown, with the scene's format and rate.
     virtual HRESULT STDMETHODCALLTYPE GetDisplayFormat(GWTIMEDISPLAYFORMAT* display, tagGWTIMEFORMAT* format,
                                                        double* rate) = 0;
