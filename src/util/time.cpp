@@ -45,15 +45,23 @@ HRESULT SceneFormat(tagGWTIMEFORMAT& format, double& rate) {
     return AcceptOrFallBack(hr, format, rate);
 }
 
-HRESULT StoreFormat(HRESULT result, tagGWTIMEFORMAT sceneFormat, double sceneRate, tagGWTIMEFORMAT* format,
-                    double* rate, double* ticksPerSecond) {
+// Asks the time manager with `query`, falls back when it fails, and stores what the caller asked
+// for, with the units a second of the format and rate.
+template <class Query>
+HRESULT ReportFormat(Query query, tagGWTIMEFORMAT* format, double* rate, double* ticksPerSecond) {
+    ut::module::TimeState* time = Time();
+    if (!time)
+        return E_UNEXPECTED;
+    tagGWTIMEFORMAT sceneFormat = kFallbackFormat;
+    double sceneRate = kFallbackRate;
+    HRESULT hr = AcceptOrFallBack(query(time->timeManager, sceneFormat, sceneRate), sceneFormat, sceneRate);
     if (format)
         *format = sceneFormat;
     if (rate)
         *rate = sceneRate;
     if (ticksPerSecond)
         *ticksPerSecond = CGWTime(sceneFormat, 0.0, sceneRate).GetTicksPerSecond();
-    return result;
+    return hr;
 }
 
 // The time object the conversions count with.
@@ -143,24 +151,20 @@ HRESULT KXSetCurrentRenderTime(tagGWTIME* time) {
 }
 
 HRESULT KXGetTimeFormat(tagGWTIMEFORMAT* format, double* rate, double* ticksPerSecond) {
-    if (!ut::module::Loaded())
-        return E_UNEXPECTED;
-    tagGWTIMEFORMAT sceneFormat = ut::util::kFallbackFormat;
-    double sceneRate = ut::util::kFallbackRate;
-    HRESULT hr = ut::util::SceneFormat(sceneFormat, sceneRate);
-    return ut::util::StoreFormat(hr, sceneFormat, sceneRate, format, rate, ticksPerSecond);
+    return ut::util::ReportFormat(
+        [](const CGWTimeManagerHelper& manager, tagGWTIMEFORMAT& sceneFormat, double& sceneRate) {
+            return manager.GetTimeFormatW(GWTIMEFORMATTYPE_SCENE, &sceneFormat, &sceneRate);
+        },
+        format, rate, ticksPerSecond);
 }
 
 HRESULT KXGetDisplayTimeFormat(GWTIMEDISPLAYFORMAT* display, tagGWTIMEFORMAT* format, double* rate,
                                double* ticksPerSecond) {
-    ut::module::TimeState* state = ut::util::Time();
-    if (!state)
-        return E_UNEXPECTED;
-    tagGWTIMEFORMAT sceneFormat = ut::util::kFallbackFormat;
-    double sceneRate = ut::util::kFallbackRate;
-    HRESULT hr = ut::util::AcceptOrFallBack(
-        state->timeManager.GetDisplayFormat(display, &sceneFormat, &sceneRate), sceneFormat, sceneRate);
-    return ut::util::StoreFormat(hr, sceneFormat, sceneRate, format, rate, ticksPerSecond);
+    return ut::util::ReportFormat(
+        [display](const CGWTimeManagerHelper& manager, tagGWTIMEFORMAT& sceneFormat, double& sceneRate) {
+            return manager.GetDisplayFormat(display, &sceneFormat, &sceneRate);
+        },
+        format, rate, ticksPerSecond);
 }
 
 double KXFramesToSeconds(double frames) {
