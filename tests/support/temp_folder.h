@@ -1,5 +1,4 @@
-// A folder of its own under the system's temporary folder, removed with everything in it when the
-// test is done.
+// A folder of the test's own under the system's temporary folder, removed with its content after.
 #pragma once
 
 #include <filesystem>
@@ -13,29 +12,24 @@ namespace ut::test {
 
 class TempFolder {
 public:
-    TempFolder() {
-        const ::testing::TestInfo* test = ::testing::UnitTest::GetInstance()->current_test_info();
-        root_ = std::filesystem::temp_directory_path() /
-                (std::string("ut_") + (test ? test->name() : "test") + "_" + std::to_string(Counter()++));
+    TempFolder() : root_(std::filesystem::temp_directory_path() / UniqueName()) {
         std::filesystem::remove_all(root_);
         std::filesystem::create_directories(root_);
     }
     ~TempFolder() {
-        std::error_code ignored; // a folder that cannot be removed is the system's to clean
+        std::error_code ignored; // what cannot be removed is the system's to clean
         std::filesystem::remove_all(root_, ignored);
     }
     TempFolder(const TempFolder&) = delete;
     TempFolder& operator=(const TempFolder&) = delete;
 
-    // The wide path of `name` inside the folder (the folder itself for an empty name).
+    // The path of `name` inside the folder, or of the folder itself.
     std::wstring Path(std::wstring_view name = {}) const {
-        return name.empty() ? root_.wstring() : (root_ / name).wstring();
+        return (name.empty() ? root_ : root_ / name).wstring();
     }
-    // Writes `content` as it is into file `name`; returns its path.
+    // Writes file `name` with `content` as it is; returns its path.
     std::wstring Write(std::wstring_view name, std::string_view content) const {
-        std::ofstream file(root_ / name, std::ios::binary);
-        file.write(content.data(), static_cast<std::streamsize>(content.size()));
-        EXPECT_TRUE(file.good());
+        std::ofstream(root_ / name, std::ios::binary).write(content.data(), std::streamsize(content.size()));
         return Path(name);
     }
     std::wstring MakeFolder(std::wstring_view name) const {
@@ -44,9 +38,10 @@ public:
     }
 
 private:
-    static int& Counter() {
-        static int counter = 0;
-        return counter;
+    static std::string UniqueName() {
+        static int count = 0;
+        return "ut_" + std::string(::testing::UnitTest::GetInstance()->current_test_info()->name()) + "_" +
+               std::to_string(count++);
     }
 
     std::filesystem::path root_;

@@ -41,7 +41,8 @@ bool Describe(const std::string& path, const std::string& name, WIN32_FIND_DATAW
     found.ftCreationTime = FileTimeOf(info.st_ctim);
     found.ftLastAccessTime = FileTimeOf(info.st_atim);
     found.ftLastWriteTime = FileTimeOf(info.st_mtim);
-    auto size = static_cast<std::uint64_t>(info.st_size);
+    // A folder has no size of its own, as on Windows.
+    auto size = S_ISDIR(info.st_mode) ? 0 : static_cast<std::uint64_t>(info.st_size);
     found.nFileSizeHigh = static_cast<DWORD>(size >> 32);
     found.nFileSizeLow = static_cast<DWORD>(size);
     std::wstring wide = ut::platform::WideFromUtf8(name);
