@@ -38,13 +38,13 @@ HRESULT KXCatalogLoadFile(const wchar_t* name, const wchar_t* path) {
     return ut::ExportBoundary([&] { return ut::sdk::LoadTextTable(ut::sdk::TextKind::Catalog, name, path); });
 }
 
-CKXCatalog::CKXCatalog(const wchar_t* name) : m_name(name ? name : L"") {}
+CKXCatalog::CKXCatalog(const wchar_t* name) : name_(name ? name : L"") {}
 
 HRESULT CKXCatalog::GetMsgEx(CKXString& out, ULONG id, va_list arguments) {
-    m_lastResult = ut::ExportBoundary([&] {
+    lastResult_ = ut::ExportBoundary([&] {
         HRESULT found = S_OK;
         const wchar_t* format =
-            ut::sdk::FindText(ut::sdk::TextKind::Catalog, m_name.View(), id, nullptr, &found);
+            ut::sdk::FindText(ut::sdk::TextKind::Catalog, name_.View(), id, nullptr, &found);
         if (FAILED(found))
             return found;
         if (!format)
@@ -55,7 +55,7 @@ HRESULT CKXCatalog::GetMsgEx(CKXString& out, ULONG id, va_list arguments) {
         out = CKXString(std::move(text));
         return S_OK;
     });
-    return m_lastResult;
+    return lastResult_;
 }
 
 HRESULT CKXCatalog::GetMsg(CKXString& out, ULONG id, ...) {
@@ -85,11 +85,11 @@ ULONG CKXErrorHandling::GetMsgMapKey() {
 }
 
 HRESULT CKXErrorHandling::ReportMsg(ULONG id, ...) {
-    if (!m_msgMapCreated) {
+    if (!msgMapCreated_) {
         if (HRESULT hr = OnCreateMsgMap(); FAILED(hr))
             return hr;
-        m_msgMapKey = GetMsgMapKey();
-        m_msgMapCreated = TRUE;
+        msgMapKey_ = GetMsgMapKey();
+        msgMapCreated_ = TRUE;
     }
     const wchar_t* name = GetCatalogName();
     if (!name)

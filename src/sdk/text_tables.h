@@ -2,12 +2,12 @@
 //
 // A table file is UTF-8 text, one entry per line: a decimal number, blanks (spaces or tabs), and
 // the text up to the end of the line, in which \n, \t and \\ stand for a line break, a tab and a
-// backslash (any other backslash is itself). Blank lines, lines starting with '#' and lines that do not start
-// with a number are skipped; a number given twice keeps its last text.
+// backslash (any other backslash is itself). Blank lines, lines starting with '#' and lines that
+// do not start with a number are skipped; a number given twice keeps its last text.
 //
 // The file of table <name> is "<name>.dict" for a dictionary and "<name>.cat" for a catalog, found
-// in "../share/ut" beside a module: first the module given with the lookup, then this library.
-// That is where installation puts them, and where the build tree keeps them.
+// in "../share/ut" from the folder of a module (the build tree's layout), or where installation
+// puts the texts from there: first beside the module given with the lookup, then beside this library.
 #pragma once
 
 #include <map>

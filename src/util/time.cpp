@@ -28,6 +28,15 @@ ut::module::TimeState* Time() {
     return ut::module::Current().time.get();
 }
 
+// The time state for an export that needs `pointer`: E_POINTER without it, E_UNEXPECTED when the
+// library did not load.
+HRESULT TimeFor(const void* pointer, ut::module::TimeState*& state) {
+    if (!pointer)
+        return E_POINTER;
+    state = Time();
+    return state ? S_OK : E_UNEXPECTED;
+}
+
 // Turns the manager's answer into the function's result, putting the fallback in place of a
 // failed answer. Only 0 counts as an answer.
 HRESULT AcceptOrFallBack(HRESULT managerResult, tagGWTIMEFORMAT& format, double& rate) {
@@ -119,12 +128,19 @@ HRESULT CurrentOrNewContainer(ut::ComPtr<IGWContentContainer>& container) {
     return KXCreateInstance(CLSID_GWContentContainer, IID_IGWContentContainer, container.PutVoid());
 }
 
-// The container's key-time property; a container without one answers a failure.
-HRESULT FindKeyTime(IGWContentContainer& container, ut::ComPtr<IGWProperty>& keyTime) {
-    HRESULT hr = container.FindProperty(GUID_GWKeyTimeProperty, IID_IGWProperty, keyTime.PutVoid());
-    if (SUCCEEDED(hr) && !keyTime)
-        return E_NOINTERFACE;
-    return hr;
+// The key-time property of the current (or a new) content container. The result is the failure
+// to reach a container (or a library that did not load); `found` is the property's lookup, which
+// fails when the container has none.
+HRESULT OpenKeyTime(ut::ComPtr<IGWProperty>& keyTime, HRESULT& found) {
+    if (!ut::module::Loaded())
+        return E_UNEXPECTED;
+    ut::ComPtr<IGWContentContainer> container;
+    if (HRESULT hr = CurrentOrNewContainer(container); FAILED(hr))
+        return hr;
+    found = container->FindProperty(GUID_GWKeyTimeProperty, IID_IGWProperty, keyTime.PutVoid());
+    if (SUCCEEDED(found) && !keyTime)
+        found = E_NOINTERFACE;
+    return S_OK;
 }
 
 HRESULT SetKeyTimeValue(IGWProperty& keyTime, const tagGWREQUEST& request, const GWVARIANT& frames,
@@ -141,11 +157,9 @@ HRESULT SetKeyTimeValue(IGWProperty& keyTime, const tagGWREQUEST& request, const
 } // namespace ut::util
 
 HRESULT KXSetCurrentRenderTime(tagGWTIME* time) {
-    if (!time)
-        return E_POINTER;
-    ut::module::TimeState* state = ut::util::Time();
-    if (!state)
-        return E_UNEXPECTED;
+    ut::module::TimeState* state = nullptr;
+    if (HRESULT hr = ut::util::TimeFor(time, state); FAILED(hr))
+        return hr;
     state->renderTime = CGWTime(*time);
     return S_OK;
 }
@@ -185,11 +199,9 @@ LONG KXSecondsToNearestFrame(double seconds) {
 }
 
 HRESULT KXGetCurrentTime(tagGWTIME* time) {
-    if (!time)
-        return E_POINTER;
-    ut::module::TimeState* state = ut::util::Time();
-    if (!state)
-        return E_UNEXPECTED;
+    ut::module::TimeState* state = nullptr;
+    if (HRESULT hr = ut::util::TimeFor(time, state); FAILED(hr))
+        return hr;
     if (state->renderTime.IsDefined()) {
         *time = state->renderTime.ToRecord();
         return S_OK;
@@ -213,13 +225,11 @@ HRESULT KXGetCurrentTimeSpan(tagGWTIMESPAN* span) {
 HRESULT KXGetKeyTime(double* seconds) {
     if (!seconds)
         return E_POINTER;
-    if (!ut::module::Loaded())
-        return E_UNEXPECTED;
-    ut::ComPtr<IGWContentContainer> container;
-    if (HRESULT hr = ut::util::CurrentOrNewContainer(container); FAILED(hr))
-        return hr;
     ut::ComPtr<IGWProperty> keyTime;
-    if (FAILED(ut::util::FindKeyTime(*container, keyTime))) {
+    HRESULT found = S_OK;
+    if (HRESULT hr = ut::util::OpenKeyTime(keyTime, found); FAILED(hr))
+        return hr;
+    if (FAILED(found)) {
         tagGWTIME now{};
         HRESULT hr = KXGetCurrentTime(&now);
         if (SUCCEEDED(hr))
@@ -234,14 +244,12 @@ HRESULT KXGetKeyTime(double* seconds) {
 }
 
 HRESULT KXSetKeyTime(double seconds, int refresh, int throughParameter) {
-    if (!ut::module::Loaded())
-        return E_UNEXPECTED;
-    ut::ComPtr<IGWContentContainer> container;
-    if (HRESULT hr = ut::util::CurrentOrNewContainer(container); FAILED(hr))
-        return hr;
     ut::ComPtr<IGWProperty> keyTime;
-    if (HRESULT hr = ut::util::FindKeyTime(*container, keyTime); FAILED(hr))
+    HRESULT found = S_OK;
+    if (HRESULT hr = ut::util::OpenKeyTime(keyTime, found); FAILED(hr))
         return hr;
+    if (FAILED(found))
+        return found;
     CGWVariant frames(KXSecondsToFrames(seconds));
     const tagGWREQUEST request = {GWREQUEST_PLUGIN};
     if (HRESULT hr = ut::util::SetKeyTimeValue(*keyTime, request, frames, throughParameter != 0); FAILED(hr))

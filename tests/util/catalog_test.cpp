@@ -148,14 +148,20 @@ TEST(Catalogs, FormatThenLogAndStopAtTheFirstFailure) {
     };
     // clang-format off
     const Case cases[] = {
-        {S_OK, [&] { return catalog.LogMsg(KXLOG_WARNING, 100, L"a.scn"); }, S_OK, L"1 The file a.scn could not be opened. []"},
-        {S_OK, [&] { return catalog.LogMsg(KXLOG_INFO, 300, 5, 1, 3); }, S_OK, L"0 Frame 5 lies outside the range 1 to 3. []"},
-        {S_OK, [&] { return catalog.LogMsg(KXLOG_INFO, 301, 29.97); }, S_OK, L"0 The scene runs at 29.97 frames a second. []"},
-        {S_OK, [&] { return catalog.LogMsg(KXLOG_INFO, 1, longName.c_str()); }, S_OK, L"0 " + longName + L" []"},
+        {S_OK, [&] { return catalog.LogMsg(KXLOG_WARNING, 100, L"a.scn"); },
+         S_OK, L"1 The file a.scn could not be opened. []"},
+        {S_OK, [&] { return catalog.LogMsg(KXLOG_INFO, 300, 5, 1, 3); },
+         S_OK, L"0 Frame 5 lies outside the range 1 to 3. []"},
+        {S_OK, [&] { return catalog.LogMsg(KXLOG_INFO, 301, 29.97); },
+         S_OK, L"0 The scene runs at 29.97 frames a second. []"},
+        {S_OK, [&] { return catalog.LogMsg(KXLOG_INFO, 1, longName.c_str()); },
+         S_OK, L"0 " + longName + L" []"},
         {S_OK, [&] { return catalog.LogMsg(KXLOG_INFO, 9999); }, KX_E_MSG_NOT_FOUND, L""},
         {S_OK, [&] { return missing.LogMsg(KXLOG_INFO, 100, L"a"); }, STG_E_FILENOTFOUND, L""},
-        {E_ACCESSDENIED, [&] { return catalog.LogMsg(KXLOG_ERROR, 100, L"b"); }, E_ACCESSDENIED, L"2 The file b could not be opened. []"},
-        {S_OK, [&] { return copy.ReportMsg(400, 2, 7); }, S_OK, L"2 2 of 7 objects could not be loaded. [kxmsgcat 400]"},
+        {E_ACCESSDENIED, [&] { return catalog.LogMsg(KXLOG_ERROR, 100, L"b"); },
+         E_ACCESSDENIED, L"2 The file b could not be opened. []"},
+        {S_OK, [&] { return copy.ReportMsg(400, 2, 7); },
+         S_OK, L"2 2 of 7 objects could not be loaded. [kxmsgcat 400]"},
         {S_OK, [&] { return copy.ReportMsg(9999); }, KX_E_MSG_NOT_FOUND, L""}};
     // clang-format on
     for (const Case& c : cases) {

@@ -24,9 +24,9 @@ class UT_SDK_API CKXCatalog {
 public:
     explicit CKXCatalog(const wchar_t* name);
 
-    const CKXString& GetName() const { return m_name; }
+    const CKXString& GetName() const { return name_; }
     // What the last GetMsgEx answered (S_OK before the first).
-    HRESULT GetLastResult() const { return m_lastResult; }
+    HRESULT GetLastResult() const { return lastResult_; }
 
     // Formats message `id` with `arguments` into `out`. The failure to read the catalog, or
     // KX_E_MSG_NOT_FOUND; `out` is left as it was on failure.
@@ -34,8 +34,8 @@ public:
     HRESULT GetMsg(CKXString& out, ULONG id, ...);
 
 private:
-    CKXString m_name;
-    HRESULT m_lastResult = S_OK;
+    CKXString name_;
+    HRESULT lastResult_ = S_OK;
 };
 
 // Reports numbered messages of a catalog. A derived class names the catalog and may say how its
@@ -63,6 +63,6 @@ protected:
     virtual ULONG GetMsgMapKey();
 
 private:
-    ULONG m_msgMapKey = 0;
-    BOOL m_msgMapCreated = FALSE;
+    ULONG msgMapKey_ = 0;
+    BOOL msgMapCreated_ = FALSE;
 };

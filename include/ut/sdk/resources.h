@@ -29,7 +29,8 @@ UT_SDK_API const wchar_t* DictLoadIdstring(const wchar_t* dictionary, unsigned s
 UT_SDK_API const wchar_t* KXDictLoadInstanceIdstring(HINSTANCE module, unsigned int id);
 // Reads dictionary `name` from the file `path`, replacing what was read before. The file is UTF-8
 // text, one entry a line: a decimal number, blanks, and the text to the end of the line, where
-// \n, \t and \\ stand for a line break, a tab and a backslash. Blank lines, lines starting with
-// '#' and lines that do not start with a number are skipped; a number given twice keeps its last
-// text. E_INVALIDARG for a null path or an empty name; the failure to read the file otherwise.
+// \n, \t and \\ stand for a line break, a tab and a backslash (any other backslash is itself).
+// Blank lines, lines starting with '#' and lines that do not start with a number are skipped; a
+// number given twice keeps its last text. E_INVALIDARG for a null path or an empty name; the failure to read
+// the file otherwise.
 UT_SDK_API HRESULT KXDictLoadFile(const wchar_t* name, const wchar_t* path);
