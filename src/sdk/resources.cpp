@@ -3,9 +3,11 @@
 #include <mutex>
 #include <string>
 
-#include <ut/platform/process.h>
 #include <ut/platform/detail/boundary.h>
+#include <ut/platform/process.h>
 #include <ut/sdk/resources.h>
+
+#include "text_tables.h"
 
 namespace {
 
@@ -30,6 +32,21 @@ struct Dictionaries {
 Dictionaries& AllDictionaries() {
     static Dictionaries* dictionaries = new Dictionaries;
     return *dictionaries;
+}
+
+// The name `module` registered its dictionary under, or empty.
+std::wstring DictionaryOf(HINSTANCE module) {
+    Dictionaries& all = AllDictionaries();
+    std::lock_guard lock(all.mutex);
+    for (const auto& [name, owner] : all.byName)
+        if (owner == module)
+            return name;
+    return {};
+}
+
+const wchar_t* DictionaryText(const std::wstring& name, unsigned id, HINSTANCE owner) {
+    const wchar_t* text = ut::sdk::FindText(ut::sdk::TextKind::Dictionary, name, id, owner, nullptr);
+    return text ? text : L"";
 }
 
 LONG ConstructRegKey(HINSTANCE module, const wchar_t* subKey, wchar_t* buffer, int capacity) {
@@ -91,4 +108,29 @@ HINSTANCE KXDictFindInstance(const wchar_t* name) {
             return it == all.byName.end() ? HINSTANCE{} : it->second;
         },
         HINSTANCE{});
+}
+
+const wchar_t* DictLoadIdstring(const wchar_t* dictionary, unsigned short id) {
+    if (!dictionary || !*dictionary)
+        return L"";
+    return ut::ExportBoundary([&] { return DictionaryText(dictionary, id, KXDictFindInstance(dictionary)); },
+                              L"");
+}
+
+const wchar_t* KXDictLoadInstanceIdstring(HINSTANCE module, unsigned int id) {
+    if (!module)
+        return L"";
+    return ut::ExportBoundary(
+        [&] {
+            std::wstring name = DictionaryOf(module);
+            return name.empty() ? L"" : DictionaryText(name, id, module);
+        },
+        L"");
+}
+
+HRESULT KXDictLoadFile(const wchar_t* name, const wchar_t* path) {
+    if (!name)
+        return E_INVALIDARG;
+    return ut::ExportBoundary(
+        [&] { return ut::sdk::LoadTextTable(ut::sdk::TextKind::Dictionary, name, path); });
 }

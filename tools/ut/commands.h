@@ -5,10 +5,17 @@
 #include <string>
 #include <vector>
 
+namespace CLI {
+class App;
+}
+
 namespace ut::tool {
 
 using Arguments = std::vector<std::string>;
 
 int Demo(const Arguments& args);
+
+// ut time frames-to-seconds | seconds-to-frame (tools/ut/time.cpp, written for CLI11).
+void AddTimeCommand(CLI::App& app);
 
 } // namespace ut::tool

@@ -1,0 +1,50 @@
+// A folder of the test's own under the system's temporary folder, removed with its content after.
+#pragma once
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <string_view>
+
+#include <gtest/gtest.h>
+
+namespace ut::test {
+
+class TempFolder {
+public:
+    TempFolder() : root_(std::filesystem::temp_directory_path() / UniqueName()) {
+        std::filesystem::remove_all(root_);
+        std::filesystem::create_directories(root_);
+    }
+    ~TempFolder() {
+        std::error_code ignored; // what cannot be removed is the system's to clean
+        std::filesystem::remove_all(root_, ignored);
+    }
+    TempFolder(const TempFolder&) = delete;
+    TempFolder& operator=(const TempFolder&) = delete;
+
+    // The path of `name` inside the folder, or of the folder itself.
+    std::wstring Path(std::wstring_view name = {}) const {
+        return (name.empty() ? root_ : root_ / name).wstring();
+    }
+    // Writes file `name` with `content` as it is; returns its path.
+    std::wstring Write(std::wstring_view name, std::string_view content) const {
+        std::ofstream(root_ / name, std::ios::binary).write(content.data(), std::streamsize(content.size()));
+        return Path(name);
+    }
+    std::wstring MakeFolder(std::wstring_view name) const {
+        std::filesystem::create_directories(root_ / name);
+        return Path(name);
+    }
+
+private:
+    static std::string UniqueName() {
+        static int count = 0;
+        return "ut_" + std::string(::testing::UnitTest::GetInstance()->current_test_info()->name()) + "_" +
+               std::to_string(count++);
+    }
+
+    std::filesystem::path root_;
+};
+
+} // namespace ut::test
