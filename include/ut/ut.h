@@ -5,4 +5,5 @@
 #include <ut/export.h>
 #include <ut/memory.h>
 #include <ut/persist.h>
+#include <ut/scene.h>
 #include <ut/time.h>

@@ -119,11 +119,11 @@ TEST(ContentContainer, KeepsOneCurrentContainerWhoseKeyTimeTakesOnlyFrameCounts)
     EXPECT_TRUE(current == again);
     EXPECT_FALSE(current == made);
     void* none = &none;
-    EXPECT_EQ(current->FindProperty(GUID_GWValueParameter, IID_IGWProperty, &none), DISP_E_MEMBERNOTFOUND);
+    EXPECT_EQ(current->FindObject(GUID_GWValueParameter, IID_IGWProperties, &none), DISP_E_MEMBERNOTFOUND);
     EXPECT_EQ(none, nullptr);
 
-    ut::ComPtr<IGWProperty> keyTime;
-    ASSERT_EQ(current->FindProperty(GUID_GWKeyTimeProperty, IID_IGWProperty, keyTime.PutVoid()), S_OK);
+    ut::ComPtr<IGWProperties> keyTime;
+    ASSERT_EQ(current->FindObject(GUID_GWKeyTimeProperty, IID_IGWProperties, keyTime.PutVoid()), S_OK);
     const tagGWREQUEST request = {GWREQUEST_PLUGIN};
     CGWVariant text, frames(9.0), other;
     text.vt = VT_BSTR;
