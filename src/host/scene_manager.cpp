@@ -97,9 +97,17 @@ HRESULT Scene::AddProperty(REFGUID clsid, IGWProperties* set, LONG, ULONG) {
     ut::ComPtr<PropertySet> own = OwnPropertySet(set);
     if (!own)
         return E_INVALIDARG;
+    // One set per class: a set of a class the scene has replaces the one it had.
+    std::vector<ut::ComPtr<PropertySet>>& members = Data().members;
+    own->Data().clsid = clsid;
+    for (ut::ComPtr<PropertySet>& member : members) {
+        if (IsEqualGUID(member->Data().clsid, clsid)) {
+            member = std::move(own);
+            return S_OK;
+        }
+    }
     return ut::ExportBoundary([&] {
-        own->Data().clsid = clsid;
-        Data().members.push_back(std::move(own));
+        members.push_back(std::move(own));
         return S_OK;
     });
 }

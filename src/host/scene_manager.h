@@ -28,8 +28,8 @@ public:
 
     HRESULT STDMETHODCALLTYPE GetContainer(REFGUID key, REFIID iid, void** container) override;
     HRESULT STDMETHODCALLTYPE GetSceneProperty(REFGUID clsid, REFIID iid, void** property) override;
-    // Takes only the host's own property sets (E_INVALIDARG for others); `kind` and `flags` are
-    // not kept.
+    // Takes only the host's own property sets (E_INVALIDARG for others), one per class: a set of a
+    // class the scene has replaces the one it had. `kind` and `flags` are not kept.
     HRESULT STDMETHODCALLTYPE AddProperty(REFGUID clsid, IGWProperties* set, LONG kind, ULONG flags) override;
     HRESULT STDMETHODCALLTYPE ListObjects(REFGUID family, LONG how, I3DList** objects) override;
     HRESULT STDMETHODCALLTYPE GetModel(IUnknown** model) override;

@@ -12,6 +12,10 @@
 #include <ut/sdk/dialogs.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/play.h>
+#include <ut/sdk/components.h>
+#include <ut/sdk/scene.h>
+#include <ut/sdk/undo.h>
+#include <ut/sdk/views.h>
 #include <ut/sdk/version.h>
 
 #include "support/ref_tracker.h"
@@ -31,8 +35,10 @@ std::wstring VersionString(ULONG index) {
 }
 
 TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
-    const CLSID services[] = {CLSID_GWVersionInfo, CLSID_GWAmbientValues, CLSID_GWActiveDatabase,
-                              CLSID_GWTimeManager, CLSID_GWPlayControl,   CLSID_GWFileDialogs};
+    const CLSID services[] = {CLSID_GWVersionInfo,    CLSID_GWAmbientValues,    CLSID_GWActiveDatabase,
+                              CLSID_GWTimeManager,    CLSID_GWPlayControl,      CLSID_GWFileDialogs,
+                              CLSID_3DSceneManagerFactory, CLSID_GWUndoManager, CLSID_GWDeleteAllBracket,
+                              CLSID_GWViewManager,    CLSID_GWViewerControllerFactory, CLSID_GWSetValueProxy};
     ut::test::LiveObjectCheck live;
     {
         ut::host::ReferenceHost host;
@@ -46,9 +52,10 @@ TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
         void* out = nullptr;
         EXPECT_EQ(GWQueryGenericObject(clsid, &out), REGDB_E_CLASSNOTREG);
     }
-    // Its container class and its current container are gone too.
+    // Its classes and its current container are gone too.
     void* out = nullptr;
-    EXPECT_EQ(KXCreateInstance(CLSID_GWContentContainer, IID_IUnknown, &out), REGDB_E_CLASSNOTREG);
+    for (const CLSID& clsid : {CLSID_GWContentContainer, CLSID_3DList, GUID_GWTimeMappingProperty})
+        EXPECT_EQ(KXCreateInstance(clsid, IID_IUnknown, &out), REGDB_E_CLASSNOTREG);
     EXPECT_EQ(GWContentGetCurrentContainer(IID_IUnknown, &out), E_FAIL);
 }
 
