@@ -33,7 +33,8 @@ ut::ComPtr<IUnknown> Member(Arguments&&... arguments) {
 
 std::span<const CGWCOMObject::InterfaceEntry> TransientObjectContainer::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        ut::sdk::Entry<TransientObjectContainer, I3DTransientObjectContainer>(IID_I3DTransientObjectContainer)};
+        ut::sdk::Entry<TransientObjectContainer, I3DTransientObjectContainer>(
+            IID_I3DTransientObjectContainer)};
     return map;
 }
 
@@ -75,7 +76,8 @@ HRESULT TransientObjectContainer::Reset() {
 }
 
 std::span<const CGWCOMObject::InterfaceEntry> SceneDefaults::GetInterfaceMap() const {
-    static const InterfaceEntry map[] = {ut::sdk::Entry<SceneDefaults, I3DSceneDefaults>(IID_I3DSceneDefaults)};
+    static const InterfaceEntry map[] = {
+        ut::sdk::Entry<SceneDefaults, I3DSceneDefaults>(IID_I3DSceneDefaults)};
     return map;
 }
 

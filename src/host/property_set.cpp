@@ -98,8 +98,9 @@ private:
 } // namespace
 
 ParameterDescription* PropertyData::FindParameter(REFGUID id) {
-    auto found = std::find_if(parameters.begin(), parameters.end(),
-                              [&](const ParameterDescription& parameter) { return IsEqualGUID(parameter.id, id); });
+    auto found =
+        std::find_if(parameters.begin(), parameters.end(),
+                     [&](const ParameterDescription& parameter) { return IsEqualGUID(parameter.id, id); });
     return found == parameters.end() ? nullptr : &*found;
 }
 
@@ -242,7 +243,8 @@ HRESULT PropertiesObject<Interfaces...>::EnumProperties(ULONG selection, IEnumGW
                 listed.push_back({parameter.id, GWPROPERTY_PARAMETERS, parameter.name, parameter.value, {}});
         if (selection & GWPROPERTY_MEMBERS)
             for (const ut::ComPtr<PropertySet>& member : data_.members)
-                listed.push_back({member->Data().clsid, GWPROPERTY_MEMBERS, member->Data().name, 0.0, member});
+                listed.push_back(
+                    {member->Data().clsid, GWPROPERTY_MEMBERS, member->Data().name, 0.0, member});
         *entries = Make<PropertyEnumerator>(std::move(listed)).Detach();
         return *entries ? S_OK : E_OUTOFMEMORY;
     });
@@ -297,7 +299,8 @@ bool AddPropertySets(const std::vector<PropertySetDescription>& descriptions,
     return true;
 }
 
-std::vector<PropertySetDescription> DescribePropertySets(const std::vector<ut::ComPtr<PropertySet>>& members) {
+std::vector<PropertySetDescription>
+DescribePropertySets(const std::vector<ut::ComPtr<PropertySet>>& members) {
     std::vector<PropertySetDescription> described;
     for (const ut::ComPtr<PropertySet>& member : members)
         described.push_back(member->Describe());
@@ -305,7 +308,8 @@ std::vector<PropertySetDescription> DescribePropertySets(const std::vector<ut::C
 }
 
 std::span<const CGWCOMObject::InterfaceEntry> PropertySetFactory::GetInterfaceMap() const {
-    static const InterfaceEntry map[] = {ut::sdk::Entry<PropertySetFactory, IClassFactory>(IID_IClassFactory)};
+    static const InterfaceEntry map[] = {
+        ut::sdk::Entry<PropertySetFactory, IClassFactory>(IID_IClassFactory)};
     return map;
 }
 

@@ -94,16 +94,20 @@ ParameterDescription ReadParameter(const Json& json, const std::string& path) {
     Expect(json.contains("id"), Member(path, "id"), "missing");
     ParameterDescription parameter;
     parameter.id = Guid(json["id"], Member(path, "id"));
-    Optional(json, "name", path, [&](const Json& value, const std::string& at) { parameter.name = Text(value, at); });
-    Optional(json, "value", path, [&](const Json& value, const std::string& at) { parameter.value = Value(value, at); });
+    Optional(json, "name", path,
+             [&](const Json& value, const std::string& at) { parameter.name = Text(value, at); });
+    Optional(json, "value", path,
+             [&](const Json& value, const std::string& at) { parameter.value = Value(value, at); });
     return parameter;
 }
 
 PropertySetDescription ReadPropertySet(const Json& json, const std::string& path) {
     OnlyKeys(json, path, {"class", "name", "parameters", "properties"});
     PropertySetDescription set;
-    Optional(json, "class", path, [&](const Json& value, const std::string& at) { set.clsid = Guid(value, at); });
-    Optional(json, "name", path, [&](const Json& value, const std::string& at) { set.name = Text(value, at); });
+    Optional(json, "class", path,
+             [&](const Json& value, const std::string& at) { set.clsid = Guid(value, at); });
+    Optional(json, "name", path,
+             [&](const Json& value, const std::string& at) { set.name = Text(value, at); });
     Each(json, "parameters", path, set.parameters, ReadParameter);
     Each(json, "properties", path, set.properties, ReadPropertySet);
     return set;
@@ -112,11 +116,14 @@ PropertySetDescription ReadPropertySet(const Json& json, const std::string& path
 ObjectDescription ReadObject(const Json& json, const std::string& path) {
     OnlyKeys(json, path, {"name", "model", "selected", "hidden", "families", "properties", "children"});
     ObjectDescription object;
-    Optional(json, "name", path, [&](const Json& value, const std::string& at) { object.name = Text(value, at); });
-    Optional(json, "model", path, [&](const Json& value, const std::string& at) { object.model = Truth(value, at); });
+    Optional(json, "name", path,
+             [&](const Json& value, const std::string& at) { object.name = Text(value, at); });
+    Optional(json, "model", path,
+             [&](const Json& value, const std::string& at) { object.model = Truth(value, at); });
     Optional(json, "selected", path,
              [&](const Json& value, const std::string& at) { object.selected = Truth(value, at); });
-    Optional(json, "hidden", path, [&](const Json& value, const std::string& at) { object.hidden = Truth(value, at); });
+    Optional(json, "hidden", path,
+             [&](const Json& value, const std::string& at) { object.hidden = Truth(value, at); });
     Each(json, "families", path, object.families, Guid);
     Each(json, "properties", path, object.properties, ReadPropertySet);
     Each(json, "children", path, object.children, ReadObject);
@@ -126,7 +133,7 @@ ObjectDescription ReadObject(const Json& json, const std::string& path) {
 // The containers, in the order of ContainersDescription, by their JSON names.
 struct ContainerName {
     const char* key;
-    std::vector<std::wstring> ContainersDescription::* members;
+    std::vector<std::wstring> ContainersDescription::*members;
 };
 const ContainerName kContainers[] = {
     {"layers", &ContainersDescription::layers},
@@ -150,7 +157,8 @@ ContainersDescription ReadContainers(const Json& json, const std::string& path) 
 SceneDescription ReadScene(const Json& json) {
     OnlyKeys(json, "", {"name", "properties", "objects", "containers"});
     SceneDescription scene;
-    Optional(json, "name", "", [&](const Json& value, const std::string& at) { scene.name = Text(value, at); });
+    Optional(json, "name", "",
+             [&](const Json& value, const std::string& at) { scene.name = Text(value, at); });
     Each(json, "properties", "", scene.properties, ReadPropertySet);
     Each(json, "objects", "", scene.objects, ReadObject);
     Optional(json, "containers", "",

@@ -14,7 +14,7 @@ namespace {
 struct ContainerKind {
     const GUID* key;
     Folder::Role role;
-    std::vector<std::wstring> ContainersDescription::* members;
+    std::vector<std::wstring> ContainersDescription::*members;
 };
 
 const ContainerKind kSceneContainers[] = {
@@ -198,7 +198,8 @@ HRESULT SceneManager::AddObject(I3DObject* object, I3DObject* parent, int select
     if (!scene_)
         return E_FAIL;
     ut::ComPtr<SceneObject> child = SceneObject::Own(object);
-    ut::ComPtr<SceneObject> under = parent ? SceneObject::Own(parent) : ut::ComPtr<SceneObject>(&scene_->Root());
+    ut::ComPtr<SceneObject> under =
+        parent ? SceneObject::Own(parent) : ut::ComPtr<SceneObject>(&scene_->Root());
     if (!child || child->Parent() || child->InScene() || !under || !under->InScene())
         return E_INVALIDARG;
     if (!under->AddChild(*child))

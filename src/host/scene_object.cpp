@@ -36,7 +36,8 @@ ULONG ParameterIndex(const tagGWComponent& component) {
 }
 
 ULONG FlagsOf(const ObjectDescription& description) {
-    return (description.selected ? GWACTIVEDATA_SELECTED : 0) | (description.hidden ? GWACTIVEDATA_HIDDEN : 0);
+    return (description.selected ? GWACTIVEDATA_SELECTED : 0) |
+           (description.hidden ? GWACTIVEDATA_HIDDEN : 0);
 }
 
 } // namespace
@@ -61,8 +62,13 @@ ut::ComPtr<SceneObject> SceneObject::Build(const ObjectDescription& description)
 }
 
 ObjectDescription SceneObject::Describe() const {
-    ObjectDescription description{name_, model_, (flags_ & GWACTIVEDATA_SELECTED) != 0,
-                                  (flags_ & GWACTIVEDATA_HIDDEN) != 0, families_, DescribePropertySets(Sets()), {}};
+    ObjectDescription description{name_,
+                                  model_,
+                                  (flags_ & GWACTIVEDATA_SELECTED) != 0,
+                                  (flags_ & GWACTIVEDATA_HIDDEN) != 0,
+                                  families_,
+                                  DescribePropertySets(Sets()),
+                                  {}};
     for (const ut::ComPtr<SceneObject>& child : children_)
         description.children.push_back(child->Describe());
     return description;
@@ -271,7 +277,8 @@ HRESULT SceneObject::FindParameter(REFGUID id, tagGWComponent* parameter) {
 }
 
 bool SceneObject::InFamily(REFGUID family) const {
-    return std::any_of(families_.begin(), families_.end(), [&](const GUID& own) { return IsEqualGUID(own, family); });
+    return std::any_of(families_.begin(), families_.end(),
+                       [&](const GUID& own) { return IsEqualGUID(own, family); });
 }
 
 bool SceneObject::InScene() const {
@@ -350,12 +357,13 @@ ParameterDescription* SceneObject::ParameterAt(const tagGWComponent& component) 
 }
 
 std::span<const CGWCOMObject::InterfaceEntry> SetValueProxy::GetInterfaceMap() const {
-    static const InterfaceEntry map[] = {ut::sdk::Entry<SetValueProxy, IGWSetValueProxy>(IID_IGWSetValueProxy)};
+    static const InterfaceEntry map[] = {
+        ut::sdk::Entry<SetValueProxy, IGWSetValueProxy>(IID_IGWSetValueProxy)};
     return map;
 }
 
-HRESULT SetValueProxy::SetValue(ULONG, IGWComponentHierarchy* hierarchy, const tagGWComponent& parameter, ULONG,
-                                const GWVARIANT* value, double) {
+HRESULT SetValueProxy::SetValue(ULONG, IGWComponentHierarchy* hierarchy, const tagGWComponent& parameter,
+                                ULONG, const GWVARIANT* value, double) {
     if (HRESULT hr = ut::sdk::CheckHostFault("IGWSetValueProxy::SetValue"); FAILED(hr))
         return hr;
     ut::ComPtr<SceneObject> object = SceneObject::Own(hierarchy);

@@ -18,8 +18,8 @@
 
 namespace ut::host {
 
-class SceneObject final : public ut::sdk::ComObject<I3DObject, I3DModel, IGWPropertyOwner,
-                                                    IGWComponentHierarchy, IGWActiveData> {
+class SceneObject final
+    : public ut::sdk::ComObject<I3DObject, I3DModel, IGWPropertyOwner, IGWComponentHierarchy, IGWActiveData> {
 public:
     SceneObject(std::wstring name, bool model) : name_(std::move(name)), model_(model) {}
     // The objects below outlive this one only when someone else holds them; then they have no parent.

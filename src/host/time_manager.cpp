@@ -50,7 +50,8 @@ PlayControl::PlayControl(const Settings& settings) : position_(SceneTime(setting
     settings_.size = sizeof settings_;
     settings_.mask = GWPLAYSET_ALL;
     settings_.span =
-        CGWTimeSpan(SceneTime(settings, settings.firstFrame), SceneTime(settings, settings.lastFrame)).ToRecord();
+        CGWTimeSpan(SceneTime(settings, settings.firstFrame), SceneTime(settings, settings.lastFrame))
+            .ToRecord();
     settings_.position = position_.GetTime();
     settings_.mode = GWPLAYMODE_REALTIME;
     settings_.format = settings.timeFormat;

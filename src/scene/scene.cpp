@@ -72,7 +72,8 @@ HRESULT On(Operation operation) {
 
 // The object the content container keeps under `key`, asked for `iid`.
 HRESULT ContentMember(REFGUID key, REFIID iid, void** out) {
-    return On<IGWContentContainer>([&](IGWContentContainer& container) { return container.FindObject(key, iid, out); });
+    return On<IGWContentContainer>(
+        [&](IGWContentContainer& container) { return container.FindObject(key, iid, out); });
 }
 
 HRESULT SceneContainer(REFGUID key, REFIID iid, void** out) {
@@ -199,7 +200,8 @@ tagGWPLAYCONTROLSETTINGS ResetSettings(bool full) {
         return settings;
     }
     settings.mask = GWPLAYSET_ALL & ~GWPLAYSET_REALTIME;
-    const CGWTimeSpan span(CGWTime(GWTIMEFORMAT_SECONDS, 1.0, 1.0), CGWTime(GWTIMEFORMAT_SECONDS, 100.0, 1.0));
+    const CGWTimeSpan span(CGWTime(GWTIMEFORMAT_SECONDS, 1.0, 1.0),
+                           CGWTime(GWTIMEFORMAT_SECONDS, 100.0, 1.0));
     settings.span = span.ToRecord();
     settings.position = span.GetStart().GetTime();
     settings.loop = 0;
@@ -321,11 +323,13 @@ HRESULT F3DCreate3DObjectFromPrimitive(I3DPrimitive* primitive, wchar_t* name, I
 HRESULT KXCreate3DModelObject(const wchar_t* name, REFGUID iid, void** out) {
     if (HRESULT hr = ClearOut(out); FAILED(hr))
         return hr;
-    return On<I3DSceneManager>([&](I3DSceneManager& manager) { return manager.CreateModelObject(name, iid, out); });
+    return On<I3DSceneManager>(
+        [&](I3DSceneManager& manager) { return manager.CreateModelObject(name, iid, out); });
 }
 
 HRESULT F3DAdd3DObjectToScene(I3DObject* object, I3DObject* parent, int select) {
-    return On<I3DSceneManager>([&](I3DSceneManager& manager) { return manager.AddObject(object, parent, select); });
+    return On<I3DSceneManager>(
+        [&](I3DSceneManager& manager) { return manager.AddObject(object, parent, select); });
 }
 
 HRESULT F3DRemove3DObjectFromScene(I3DObject* object) {
@@ -362,13 +366,13 @@ HRESULT KXDeleteAll(int flags) {
 }
 
 HRESULT F3DGetLayerContainer(IKXLayerContainer** out) {
-    return Normalised(
-        ut::scene::SceneContainer(GUID_3DLayerContainer, IID_IKXLayerContainer, reinterpret_cast<void**>(out)));
+    return Normalised(ut::scene::SceneContainer(GUID_3DLayerContainer, IID_IKXLayerContainer,
+                                                reinterpret_cast<void**>(out)));
 }
 
 HRESULT F3DGetPassContainer(IKXLayerContainer** out) {
-    return Normalised(
-        ut::scene::SceneContainer(GUID_3DPassContainer, IID_IKXLayerContainer, reinterpret_cast<void**>(out)));
+    return Normalised(ut::scene::SceneContainer(GUID_3DPassContainer, IID_IKXLayerContainer,
+                                                reinterpret_cast<void**>(out)));
 }
 
 HRESULT F3DGetParTypeContainer(REFGUID iid, void** out) {
@@ -382,7 +386,8 @@ HRESULT F3DGetEnvironmentContainer(REFGUID iid, void** out) {
 HRESULT F3DGetRefPlaneFolder(I3DRefPlaneFolder** out) {
     if (HRESULT hr = ClearOut(out); FAILED(hr))
         return hr;
-    return ut::scene::ContentMember(GUID_3DRefPlaneFolderKey, IID_I3DRefPlaneFolder, reinterpret_cast<void**>(out));
+    return ut::scene::ContentMember(GUID_3DRefPlaneFolderKey, IID_I3DRefPlaneFolder,
+                                    reinterpret_cast<void**>(out));
 }
 
 HRESULT F3DGetDeviceManager(REFGUID iid, void** out) {
@@ -476,7 +481,8 @@ HRESULT KXGetCurrentSceneProperty(GUID propertyClass, CGWVariant& value, int cre
         FAILED(hr))
         return hr;
     value.Clear();
-    if (HRESULT hr = created->QueryInterface(IID_IUnknown, reinterpret_cast<void**>(&value.punkVal)); FAILED(hr))
+    if (HRESULT hr = created->QueryInterface(IID_IUnknown, reinterpret_cast<void**>(&value.punkVal));
+        FAILED(hr))
         return hr;
     value.vt = VT_UNKNOWN;
     return S_OK;
@@ -499,7 +505,8 @@ HRESULT KXGetSceneRootProperty(REFGUID a, REFGUID b, void** out) {
 HRESULT F3DGetPropsList(I3DObject* object, REFGUID propertyClass, I3DList** out) {
     if (HRESULT hr = ClearOut(out); FAILED(hr) || !object)
         return E_POINTER;
-    return ut::ExportBoundary([&] { return ut::scene::PropsList(*object, propertyClass, out); }, HRESULT{E_FAIL});
+    return ut::ExportBoundary([&] { return ut::scene::PropsList(*object, propertyClass, out); },
+                              HRESULT{E_FAIL});
 }
 
 HRESULT F3DAddObjectToTransientObjectContainer(IGWComponentHierarchy* object, ULONG flags) {
@@ -542,18 +549,20 @@ HRESULT F3DIsObjectInTransientObjectContainer(IGWComponentHierarchy* object) {
 }
 
 HRESULT F3DIsObjectInTransientObjectContainer(IUnknown* object) {
-    return ut::scene::AsHierarchy(
-        object, [](IGWComponentHierarchy* hierarchy) { return F3DIsObjectInTransientObjectContainer(hierarchy); });
+    return ut::scene::AsHierarchy(object, [](IGWComponentHierarchy* hierarchy) {
+        return F3DIsObjectInTransientObjectContainer(hierarchy);
+    });
 }
 
 HRESULT F3DTransientObjectContainerReset() {
-    return Normalised(
-        ut::scene::OnTransientContainer([](I3DTransientObjectContainer& container) { return container.Reset(); }));
+    return Normalised(ut::scene::OnTransientContainer(
+        [](I3DTransientObjectContainer& container) { return container.Reset(); }));
 }
 
 HRESULT KXTimeControlReset(int reset) {
     ut::ComPtr<IGWPlayControl> play;
-    if (HRESULT hr = GWQueryGenericObject(CLSID_GWPlayControl, IID_IGWPlayControl, play.PutVoid()); FAILED(hr))
+    if (HRESULT hr = GWQueryGenericObject(CLSID_GWPlayControl, IID_IGWPlayControl, play.PutVoid());
+        FAILED(hr))
         return hr;
     const tagGWPLAYCONTROLSETTINGS settings = ut::scene::ResetSettings(reset != 0);
     return Normalised(play->SetSettings(&settings));

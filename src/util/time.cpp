@@ -3,10 +3,10 @@
 #include <cmath>
 #include <limits>
 
+#include <ut/scene.h>
 #include <ut/sdk/content.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/play.h>
-#include <ut/scene.h>
 #include <ut/sdk/variant.h>
 #include <ut/time.h>
 

@@ -7,16 +7,16 @@
 
 #include <ut/host/reference_host.h>
 #include <ut/sdk/ambient.h>
+#include <ut/sdk/components.h>
 #include <ut/sdk/content.h>
 #include <ut/sdk/database.h>
 #include <ut/sdk/dialogs.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/play.h>
-#include <ut/sdk/components.h>
 #include <ut/sdk/scene.h>
 #include <ut/sdk/undo.h>
-#include <ut/sdk/views.h>
 #include <ut/sdk/version.h>
+#include <ut/sdk/views.h>
 
 #include "support/ref_tracker.h"
 
@@ -35,10 +35,18 @@ std::wstring VersionString(ULONG index) {
 }
 
 TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
-    const CLSID services[] = {CLSID_GWVersionInfo,    CLSID_GWAmbientValues,    CLSID_GWActiveDatabase,
-                              CLSID_GWTimeManager,    CLSID_GWPlayControl,      CLSID_GWFileDialogs,
-                              CLSID_3DSceneManagerFactory, CLSID_GWUndoManager, CLSID_GWDeleteAllBracket,
-                              CLSID_GWViewManager,    CLSID_GWViewerControllerFactory, CLSID_GWSetValueProxy};
+    const CLSID services[] = {CLSID_GWVersionInfo,
+                              CLSID_GWAmbientValues,
+                              CLSID_GWActiveDatabase,
+                              CLSID_GWTimeManager,
+                              CLSID_GWPlayControl,
+                              CLSID_GWFileDialogs,
+                              CLSID_3DSceneManagerFactory,
+                              CLSID_GWUndoManager,
+                              CLSID_GWDeleteAllBracket,
+                              CLSID_GWViewManager,
+                              CLSID_GWViewerControllerFactory,
+                              CLSID_GWSetValueProxy};
     ut::test::LiveObjectCheck live;
     {
         ut::host::ReferenceHost host;

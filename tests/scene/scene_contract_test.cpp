@@ -29,7 +29,9 @@ constexpr HRESULT kRefused = E_ACCESSDENIED;
 // Installs a class factory for one scope.
 class ScopedClass {
 public:
-    ScopedClass(REFCLSID clsid, IClassFactory* factory) : clsid_(clsid) { GWRegisterClassFactory(clsid, factory); }
+    ScopedClass(REFCLSID clsid, IClassFactory* factory) : clsid_(clsid) {
+        GWRegisterClassFactory(clsid, factory);
+    }
     ~ScopedClass() { GWRevokeClassFactory(clsid_); }
 
 private:
@@ -133,12 +135,17 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
     wchar_t cube[] = L"Cube";
     const Row rows[] = {
         {"KXStoreCommand", Mapping::kAsReturned,
-         [&](HRESULT r) { EXPECT_CALL(factory, StoreCommand(kSomeId, kOtherId, &context)).WillOnce(Return(r)); },
+         [&](HRESULT r) {
+             EXPECT_CALL(factory, StoreCommand(kSomeId, kOtherId, &context)).WillOnce(Return(r));
+         },
          [&] { return KXStoreCommand(kSomeId, kOtherId, &context); }},
         {"KXPostCommand", Mapping::kAsReturned,
-         [&](HRESULT r) { EXPECT_CALL(factory, PostCommand()).WillOnce(Return(r)); }, [] { return KXPostCommand(); }},
+         [&](HRESULT r) { EXPECT_CALL(factory, PostCommand()).WillOnce(Return(r)); },
+         [] { return KXPostCommand(); }},
         {"F3DGet3DObjectFromName", Mapping::kAsReturned,
-         [&](HRESULT r) { EXPECT_CALL(factory, FindObjectByName(StrEq(L"Cube"), &found)).WillOnce(Return(r)); },
+         [&](HRESULT r) {
+             EXPECT_CALL(factory, FindObjectByName(StrEq(L"Cube"), &found)).WillOnce(Return(r));
+         },
          [&] { return F3DGet3DObjectFromName(cube, &found); }},
         {"F3DSceneNotificationQuietOn", Mapping::kAsReturned,
          [&](HRESULT r) { EXPECT_CALL(factory, SetNotificationMode(1, 0)).WillOnce(Return(r)); },
@@ -148,11 +155,14 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
          [] { return F3DSceneNotificationQuietOff(); }},
         {"F3DCreate3DObjectFromPrimitive", Mapping::kAsReturned,
          [&](HRESULT r) {
-             EXPECT_CALL(factory, CreateObjectFromPrimitive(&primitive, StrEq(L"Cube"), &found)).WillOnce(Return(r));
+             EXPECT_CALL(factory, CreateObjectFromPrimitive(&primitive, StrEq(L"Cube"), &found))
+                 .WillOnce(Return(r));
          },
          [&] { return F3DCreate3DObjectFromPrimitive(&primitive, cube, &found); }},
         {"KXCreate3DModelObject", Mapping::kAsReturned,
-         [&](HRESULT r) { EXPECT_CALL(factory, CreateModelObject(StrEq(L"Robot"), kSomeId, &out)).WillOnce(Return(r)); },
+         [&](HRESULT r) {
+             EXPECT_CALL(factory, CreateModelObject(StrEq(L"Robot"), kSomeId, &out)).WillOnce(Return(r));
+         },
          [&] { return KXCreate3DModelObject(L"Robot", kSomeId, &out); }},
         {"F3DAdd3DObjectToScene", Mapping::kAsReturned,
          [&](HRESULT r) { EXPECT_CALL(factory, AddObject(&object, found, 7)).WillOnce(Return(r)); },
@@ -166,13 +176,15 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
         {"F3DGetLayerContainer", Mapping::kSuccessIsOk,
          [&](HRESULT r) {
              SceneIsCurrent();
-             EXPECT_CALL(scene, GetContainer(GUID_3DLayerContainer, IID_IKXLayerContainer, _)).WillOnce(Return(r));
+             EXPECT_CALL(scene, GetContainer(GUID_3DLayerContainer, IID_IKXLayerContainer, _))
+                 .WillOnce(Return(r));
          },
          [&] { return F3DGetLayerContainer(reinterpret_cast<IKXLayerContainer**>(&out)); }},
         {"F3DGetPassContainer", Mapping::kSuccessIsOk,
          [&](HRESULT r) {
              SceneIsCurrent();
-             EXPECT_CALL(scene, GetContainer(GUID_3DPassContainer, IID_IKXLayerContainer, _)).WillOnce(Return(r));
+             EXPECT_CALL(scene, GetContainer(GUID_3DPassContainer, IID_IKXLayerContainer, _))
+                 .WillOnce(Return(r));
          },
          [&] { return F3DGetPassContainer(reinterpret_cast<IKXLayerContainer**>(&out)); }},
         {"F3DGetParTypeContainer", Mapping::kSuccessIsOk,
@@ -200,7 +212,9 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
          },
          [&] { return KXGetListOfSceneCameras(reinterpret_cast<I3DList**>(&out)); }},
         {"KXGetCacheManager", Mapping::kSuccessIsOk,
-         [&](HRESULT r) { EXPECT_CALL(content, FindObject(GUID_3DCacheManagerKey, kSomeId, &out)).WillOnce(Return(r)); },
+         [&](HRESULT r) {
+             EXPECT_CALL(content, FindObject(GUID_3DCacheManagerKey, kSomeId, &out)).WillOnce(Return(r));
+         },
          [&] { return KXGetCacheManager(kSomeId, &out); }},
         {"KXGetCacheManager(I3DCacheMgr**)", Mapping::kSuccessIsOk,
          [&](HRESULT r) {
@@ -209,29 +223,36 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
          [&] { return KXGetCacheManager(reinterpret_cast<I3DCacheMgr**>(&out)); }},
         {"F3DGetRefPlaneFolder", Mapping::kAsReturned,
          [&](HRESULT r) {
-             EXPECT_CALL(content, FindObject(GUID_3DRefPlaneFolderKey, IID_I3DRefPlaneFolder, _)).WillOnce(Return(r));
+             EXPECT_CALL(content, FindObject(GUID_3DRefPlaneFolderKey, IID_I3DRefPlaneFolder, _))
+                 .WillOnce(Return(r));
          },
          [&] { return F3DGetRefPlaneFolder(reinterpret_cast<I3DRefPlaneFolder**>(&out)); }},
         {"F3DGetDeviceManager", Mapping::kAsReturned,
-         [&](HRESULT r) { EXPECT_CALL(content, FindObject(GUID_3DDeviceManagerKey, kSomeId, &out)).WillOnce(Return(r)); },
+         [&](HRESULT r) {
+             EXPECT_CALL(content, FindObject(GUID_3DDeviceManagerKey, kSomeId, &out)).WillOnce(Return(r));
+         },
          [&] { return F3DGetDeviceManager(kSomeId, &out); }},
         {"F3DGetTransientObjectContainer", Mapping::kAsReturned,
          [&](HRESULT r) {
-             EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, kSomeId, &out)).WillOnce(Return(r));
+             EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, kSomeId, &out))
+                 .WillOnce(Return(r));
          },
          [&] { return F3DGetTransientObjectContainer(kSomeId, &out); }},
         {"KXGetSceneDefaultsObject", Mapping::kAsReturned,
-         reaching(GUID_3DSceneDefaultsKey, IID_I3DSceneDefaults, &defaults,
-                  [&](HRESULT r) { EXPECT_CALL(defaults, GetObjectForClass(kSomeId, _)).WillOnce(Return(r)); }),
+         reaching(
+             GUID_3DSceneDefaultsKey, IID_I3DSceneDefaults, &defaults,
+             [&](HRESULT r) { EXPECT_CALL(defaults, GetObjectForClass(kSomeId, _)).WillOnce(Return(r)); }),
          [&] { return KXGetSceneDefaultsObject(kSomeId, reinterpret_cast<IUnknown**>(&out)); }},
         {"KXGetStreamFromSceneDefaults", Mapping::kOkOrFalse,
-         reaching(GUID_3DSceneDefaultsKey, IID_I3DSceneDefaults, &defaults,
-                  [&](HRESULT r) { EXPECT_CALL(defaults, GetStreamForClass(kSomeId, _)).WillOnce(Return(r)); }),
+         reaching(
+             GUID_3DSceneDefaultsKey, IID_I3DSceneDefaults, &defaults,
+             [&](HRESULT r) { EXPECT_CALL(defaults, GetStreamForClass(kSomeId, _)).WillOnce(Return(r)); }),
          [&] { return KXGetStreamFromSceneDefaults(kSomeId, reinterpret_cast<IStream**>(&out)); }},
         {"KXCreateDefaultInstance", Mapping::kOkOrFalse,
          reaching(GUID_3DSceneDefaultsKey, IID_I3DSceneDefaults, &defaults,
                   [&](HRESULT r) {
-                      EXPECT_CALL(defaults, CreateDefaultInstance(kSomeId, kOtherId, &out, &preset)).WillOnce(Return(r));
+                      EXPECT_CALL(defaults, CreateDefaultInstance(kSomeId, kOtherId, &out, &preset))
+                          .WillOnce(Return(r));
                   }),
          [&] { return KXCreateDefaultInstance(kSomeId, kOtherId, &out, &preset); }},
         {"F3DAddObjectToTransientObjectContainer", Mapping::kSuccessIsOk,
@@ -298,7 +319,8 @@ TEST_F(SceneContract, ANullOutParameterIsRefusedBeforeAnyHostCall) {
         {F3DGetPropsList(nullptr, kSomeId, reinterpret_cast<I3DList**>(&name)), E_POINTER},
         {F3DAddObjectToTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr), 1), E_POINTER},
         {F3DAddObjectToTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
-        {F3DRemoveObjectFromTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr)), E_POINTER},
+        {F3DRemoveObjectFromTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr)),
+         E_POINTER},
         {F3DRemoveObjectFromTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
         {F3DIsObjectInTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr)), E_POINTER},
         {F3DIsObjectInTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
@@ -311,7 +333,8 @@ TEST_F(SceneContract, ANullOutParameterIsRefusedBeforeAnyHostCall) {
         EXPECT_EQ(refusals[i].first, refusals[i].second) << "row " << i;
     EXPECT_FALSE(KXIsActiveDataSelected(nullptr));
     // The transient container's lookup is handed the caller's out-parameter, null or not.
-    EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, kSomeId, nullptr)).WillOnce(Return(E_POINTER));
+    EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, kSomeId, nullptr))
+        .WillOnce(Return(E_POINTER));
     EXPECT_EQ(F3DGetTransientObjectContainer(kSomeId, nullptr), E_POINTER);
 }
 
@@ -336,7 +359,8 @@ TEST_F(SceneContract, TheRootsHandOutWhatTheirQueryAnswersAndNothingElse) {
     EXPECT_EQ(KXGet3DContentContainer(IID_IGWContentContainer, &out, 0), E_FAIL);
     StrictMock<ut::test::MockClassFactory> containers;
     ScopedClass installed(CLSID_GWContentContainer, &containers);
-    EXPECT_CALL(containers, CreateInstance(nullptr, IID_IGWContentContainer, &out)).WillOnce(GiveOut<2>(&content));
+    EXPECT_CALL(containers, CreateInstance(nullptr, IID_IGWContentContainer, &out))
+        .WillOnce(GiveOut<2>(&content));
     EXPECT_EQ(KXGet3DContentContainer(IID_IGWContentContainer, &out, 1), S_OK);
     EXPECT_EQ(out, &content);
     content.Release();
@@ -350,7 +374,8 @@ TEST_F(SceneContract, ViewsComeFromTheirServices) {
     ut::test::MockViewManager views;
     StrictMock<ut::test::MockViewerControllerFactory> controllers;
     ut::test::MockViewerController controller;
-    ut::test::ScopedGenericObject a(CLSID_GWViewManager, &views), b(CLSID_GWViewerControllerFactory, &controllers);
+    ut::test::ScopedGenericObject a(CLSID_GWViewManager, &views),
+        b(CLSID_GWViewerControllerFactory, &controllers);
     void* out = nullptr;
     // The view manager comes as itself whatever interface is asked for.
     EXPECT_EQ(KXGetViewManager(IID_I3DObject, &out), S_OK);
@@ -396,12 +421,10 @@ TEST_F(SceneContract, DeleteAllRunsInsideTheBracketWhenThereIsOne) {
 
 TEST_F(SceneContract, TimeControlResetWritesTheWholeRecordOrOnlyAnUndefinedSpan) {
     std::vector<tagGWPLAYCONTROLSETTINGS> written;
-    EXPECT_CALL(play, SetSettings(_))
-        .Times(3)
-        .WillRepeatedly([&](const tagGWPLAYCONTROLSETTINGS* settings) {
-            written.push_back(*settings);
-            return written.size() == 3 ? kRefused : S_FALSE;
-        });
+    EXPECT_CALL(play, SetSettings(_)).Times(3).WillRepeatedly([&](const tagGWPLAYCONTROLSETTINGS* settings) {
+        written.push_back(*settings);
+        return written.size() == 3 ? kRefused : S_FALSE;
+    });
     EXPECT_EQ(KXTimeControlReset(0), S_OK);
     EXPECT_EQ(KXTimeControlReset(-1), S_OK);
     EXPECT_EQ(KXTimeControlReset(1), kRefused);
@@ -415,8 +438,8 @@ TEST_F(SceneContract, TimeControlResetWritesTheWholeRecordOrOnlyAnUndefinedSpan)
     EXPECT_EQ(full.span.end.format, GWTIMEFORMAT_SECONDS);
     EXPECT_EQ(std::vector<double>({full.span.start.time, full.span.end.time, full.position, full.speed}),
               std::vector<double>({1.0, 100.0, 1.0, 1.0}));
-    EXPECT_EQ(std::vector<LONG>({full.loop, full.preroll, full.mode, full.format, full.realTime, full.step, full.scrub,
-                                 full.audioOffset}),
+    EXPECT_EQ(std::vector<LONG>({full.loop, full.preroll, full.mode, full.format, full.realTime, full.step,
+                                 full.scrub, full.audioOffset}),
               std::vector<LONG>({0, 15, 2, 10, 0, 5, 0, 0}));
     for (BYTE reserved : full.reserved)
         ASSERT_EQ(reserved, 0);
@@ -428,10 +451,12 @@ TEST_F(SceneContract, SetComponentValueAsksForTheParameterAndProxyAndReportsOkWh
     CGWVariant value(4.0);
     {
         ut::test::ScopedGenericObject installedProxy(CLSID_GWSetValueProxy, &proxy);
-        EXPECT_CALL(component, FindParameter(kSomeId, _)).WillOnce(DoAll(SetArgPointee<1>(parameter), Return(S_OK)));
+        EXPECT_CALL(component, FindParameter(kSomeId, _))
+            .WillOnce(DoAll(SetArgPointee<1>(parameter), Return(S_OK)));
         EXPECT_CALL(play, GetTime(_)).WillOnce(DoAll(SetArgPointee<0>(now), Return(S_OK)));
         EXPECT_CALL(proxy, SetValue(0, &hierarchy, _, 0, &value, 2.5))
-            .WillOnce([&](ULONG, IGWComponentHierarchy*, const tagGWComponent& given, ULONG, const GWVARIANT*, double) {
+            .WillOnce([&](ULONG, IGWComponentHierarchy*, const tagGWComponent& given, ULONG, const GWVARIANT*,
+                          double) {
                 EXPECT_EQ(given.id, 2u);
                 return kRefused;
             });
@@ -446,7 +471,8 @@ TEST_F(SceneContract, SetComponentValueAsksForTheParameterAndProxyAndReportsOkWh
 }
 
 TEST_F(SceneContract, SelectionIsBitZeroOfTheActiveDataFlags) {
-    const std::pair<ULONG, bool> flags[] = {{0, false}, {1, true}, {2, false}, {0x8, false}, {0xFFFFFFFF, true}};
+    const std::pair<ULONG, bool> flags[] = {
+        {0, false}, {1, true}, {2, false}, {0x8, false}, {0xFFFFFFFF, true}};
     for (auto [word, selected] : flags) {
         EXPECT_CALL(component, GetFlags(_)).WillOnce(DoAll(SetArgPointee<0>(word), Return(S_OK)));
         EXPECT_EQ(KXIsActiveDataSelected(&component), selected) << word;
@@ -492,7 +518,9 @@ TEST_F(SceneContract, TheTimeMappingIsTheSetHeldByTheScenesTimeMappingProperty) 
         HRESULT read;
         HRESULT expected;
     };
-    const Case cases[] = {{VT_UNKNOWN, S_OK, S_OK}, {VT_UNKNOWN, S_FALSE, S_OK}, {VT_I4, S_OK, E_NOINTERFACE},
+    const Case cases[] = {{VT_UNKNOWN, S_OK, S_OK},
+                          {VT_UNKNOWN, S_FALSE, S_OK},
+                          {VT_I4, S_OK, E_NOINTERFACE},
                           {VT_EMPTY, kRefused, S_FALSE}};
     for (const Case& c : cases) {
         SceneIsCurrent();
@@ -522,15 +550,19 @@ TEST_F(SceneContract, AScenePropertyIsMadeAndAddedOnlyWhenMissingAndAskedFor) {
         HRESULT expected;
         VARTYPE type;
     };
-    const Case cases[] = {{S_OK, 1, S_OK, VT_R8}, {S_FALSE, 0, S_OK, VT_R8}, {kRefused, 0, S_OK, VT_R8},
-                          {S_FALSE, 1, S_OK, VT_UNKNOWN}, {kRefused, 1, kRefused, VT_R8}};
+    const Case cases[] = {{S_OK, 1, S_OK, VT_R8},
+                          {S_FALSE, 0, S_OK, VT_R8},
+                          {kRefused, 0, S_OK, VT_R8},
+                          {S_FALSE, 1, S_OK, VT_UNKNOWN},
+                          {kRefused, 1, kRefused, VT_R8}};
     for (const Case& c : cases) {
         CGWVariant value;
         SceneIsCurrent();
-        EXPECT_CALL(sceneProperties, GetProperty(kSomeId, &value, 0)).WillOnce([&](REFGUID, GWVARIANT* read, LONG) {
-            read->vt = VT_R8;
-            return c.read;
-        });
+        EXPECT_CALL(sceneProperties, GetProperty(kSomeId, &value, 0))
+            .WillOnce([&](REFGUID, GWVARIANT* read, LONG) {
+                read->vt = VT_R8;
+                return c.read;
+            });
         if (c.read != S_OK && c.create) {
             SceneIsCurrent();
             EXPECT_CALL(classes, CreateInstance(nullptr, IID_IGWProperties, _)).WillOnce(GiveOut<2>(&made));
@@ -554,7 +586,8 @@ TEST_F(SceneContract, PropsListWalksTheSetsOfKindPropertySetAndListsTheirPropert
         InSequence order;
         EXPECT_CALL(lists, CreateInstance(nullptr, IID_I3DList, _)).WillOnce(GiveOut<2>(&list));
         EXPECT_CALL(owner, GetPropertySets(_)).WillOnce(GiveOut<0>(&sets));
-        EXPECT_CALL(sets, CountMembers(GUID_GWPropertySetKind, _)).WillOnce(DoAll(SetArgPointee<1>(2), Return(S_OK)));
+        EXPECT_CALL(sets, CountMembers(GUID_GWPropertySetKind, _))
+            .WillOnce(DoAll(SetArgPointee<1>(2), Return(S_OK)));
         EXPECT_CALL(sets, GetMembers(GUID_GWPropertySetKind, 0, 2, _))
             .WillOnce([&](REFGUID, ULONG, ULONG, IGWProperties** items) {
                 items[0] = &first, items[1] = &second;
@@ -600,7 +633,9 @@ TEST_F(SceneContract, TheComplexUndoBracketOpensOnlyOutsideAnotherAndClosesOnceP
         outside(FALSE);
         EXPECT_CALL(undo, OpenComplexUndo(StrEq(L"Move"), 0)).WillOnce(Return(S_OK));
         outside(TRUE); // the nested one stays inert
-        EXPECT_CALL(undo, CloseComplexUndo()).Times(2).WillRepeatedly(Return(kRefused)); // the copy closes again
+        EXPECT_CALL(undo, CloseComplexUndo())
+            .Times(2)
+            .WillRepeatedly(Return(kRefused)); // the copy closes again
     }
     {
         C3DComplexUndo bracket(L"Move");

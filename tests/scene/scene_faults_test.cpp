@@ -85,30 +85,70 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
     const Walk walks[] = {
         // The roots.
         {"KXGetSceneManager",
-         [] { void* out = nullptr; return Out(KXGetSceneManager(IID_I3DSceneManager, &out, 1), out); },
-         "S_OK set", {denied}},
-        {"KXGetCurrentScene", [] { void* out = nullptr; return Out(KXGetCurrentScene(IID_I3DScene, &out), out); },
-         "S_OK set", {denied}},
+         [] {
+             void* out = nullptr;
+             return Out(KXGetSceneManager(IID_I3DSceneManager, &out, 1), out);
+         },
+         "S_OK set",
+         {denied}},
+        {"KXGetCurrentScene",
+         [] {
+             void* out = nullptr;
+             return Out(KXGetCurrentScene(IID_I3DScene, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         // A failing look-up of the current container is answered with a new one.
         {"KXGet3DContentContainer",
-         [] { void* out = nullptr; return Out(KXGet3DContentContainer(IID_IGWContentContainer, &out, 1), out); },
-         "S_OK set", {"S_OK set"}},
+         [] {
+             void* out = nullptr;
+             return Out(KXGet3DContentContainer(IID_IGWContentContainer, &out, 1), out);
+         },
+         "S_OK set",
+         {"S_OK set"}},
         {"KXGet3DContentContainer without creation",
-         [] { void* out = nullptr; return Out(KXGet3DContentContainer(IID_IGWContentContainer, &out, 0), out); },
-         "S_OK set", {denied}},
+         [] {
+             void* out = nullptr;
+             return Out(KXGet3DContentContainer(IID_IGWContentContainer, &out, 0), out);
+         },
+         "S_OK set",
+         {denied}},
         // Managers and views.
-        {"KXGetCacheManager", [] { void* out = nullptr; return Out(KXGetCacheManager(IID_I3DCacheMgr, &out), out); },
-         "S_OK set", {"S_OK set", denied}},
-        {"KXGetCacheManager(I3DCacheMgr**)", [] { I3DCacheMgr* out = nullptr; return Out(KXGetCacheManager(&out), out); },
-         "S_OK set", {"S_OK set", denied}},
-        {"KXGetViewManager", [] { void* out = nullptr; return Out(KXGetViewManager(IID_IUnknown, &out), out); },
-         "S_OK set", {denied}},
+        {"KXGetCacheManager",
+         [] {
+             void* out = nullptr;
+             return Out(KXGetCacheManager(IID_I3DCacheMgr, &out), out);
+         },
+         "S_OK set",
+         {"S_OK set", denied}},
+        {"KXGetCacheManager(I3DCacheMgr**)",
+         [] {
+             I3DCacheMgr* out = nullptr;
+             return Out(KXGetCacheManager(&out), out);
+         },
+         "S_OK set",
+         {"S_OK set", denied}},
+        {"KXGetViewManager",
+         [] {
+             void* out = nullptr;
+             return Out(KXGetViewManager(IID_IUnknown, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         {"KXGetViewerControler",
-         [] { void* out = nullptr; return Out(KXGetViewerControler(IID_IGWViewerController, &out), out); },
-         "S_OK set", {denied}},
+         [] {
+             void* out = nullptr;
+             return Out(KXGetViewerControler(IID_IGWViewerController, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         {"KXGetGenericManager",
-         [] { void* out = nullptr; return Out(KXGetGenericManager(ut::test::kColor, IID_IUnknown, &out), out); },
-         "S_OK set", {denied}},
+         [] {
+             void* out = nullptr;
+             return Out(KXGetGenericManager(ut::test::kColor, IID_IUnknown, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         // Scene-wide actions, each put back afterwards.
         {"KXStoreCommand and KXPostCommand",
          [&] {
@@ -118,9 +158,15 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)KXPostCommand(); // forgets a command that was stored but not posted
              return Result(stored) + " " + Result(posted);
          },
-         "S_OK S_OK", {"DENIED S_FALSE", "DENIED S_FALSE", "S_OK DENIED", "S_OK DENIED"}},
-        {"F3DGet3DObjectFromName", [&] { I3DObject* out = nullptr; return Out(F3DGet3DObjectFromName(arm, &out), out); },
-         "S_OK set", {denied}},
+         "S_OK S_OK",
+         {"DENIED S_FALSE", "DENIED S_FALSE", "S_OK DENIED", "S_OK DENIED"}},
+        {"F3DGet3DObjectFromName",
+         [&] {
+             I3DObject* out = nullptr;
+             return Out(F3DGet3DObjectFromName(arm, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         {"F3DSceneNotificationQuietOn",
          [&] {
              HRESULT hr = F3DSceneNotificationQuietOn();
@@ -129,14 +175,26 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DSceneNotificationQuietOff();
              return Result(hr) + " " + mode;
          },
-         "S_OK 1", {"DENIED 3"}},
-        {"F3DSceneNotificationQuietOff", [] { return Result(F3DSceneNotificationQuietOff()); }, "S_OK", {"DENIED"}},
+         "S_OK 1",
+         {"DENIED 3"}},
+        {"F3DSceneNotificationQuietOff",
+         [] { return Result(F3DSceneNotificationQuietOff()); },
+         "S_OK",
+         {"DENIED"}},
         {"F3DCreate3DObjectFromPrimitive",
-         [&] { I3DObject* out = nullptr; return Out(F3DCreate3DObjectFromPrimitive(&primitive_, cube, &out), out); },
-         "S_OK set", {denied}},
+         [&] {
+             I3DObject* out = nullptr;
+             return Out(F3DCreate3DObjectFromPrimitive(&primitive_, cube, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         {"KXCreate3DModelObject",
-         [] { void* out = nullptr; return Out(KXCreate3DModelObject(L"Model", IID_I3DModel, &out), out); },
-         "S_OK set", {denied}},
+         [] {
+             void* out = nullptr;
+             return Out(KXCreate3DModelObject(L"Model", IID_I3DModel, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         {"F3DAdd3DObjectToScene",
          [&] {
              HRESULT hr = F3DAdd3DObjectToScene(rig_.Get(), arm_.Get(), 1);
@@ -144,7 +202,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DRemove3DObjectFromScene(rig_.Get()); // S_FALSE when it was not added
              return Result(hr);
          },
-         "S_OK", {"DENIED"}},
+         "S_OK",
+         {"DENIED"}},
         {"F3DRemove3DObjectFromScene",
          [&] {
              HRESULT hr = F3DRemove3DObjectFromScene(light_.Get());
@@ -152,8 +211,11 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DAdd3DObjectToScene(light_.Get(), nullptr, 0); // E_INVALIDARG when it stayed
              return Result(hr);
          },
-         "S_OK", {"DENIED"}},
-        {"F3DSetAs3DGroup", [&] { return Result(F3DSetAs3DGroup(&group_, element_.Get(), nullptr)); }, "S_OK",
+         "S_OK",
+         {"DENIED"}},
+        {"F3DSetAs3DGroup",
+         [&] { return Result(F3DSetAs3DGroup(&group_, element_.Get(), nullptr)); },
+         "S_OK",
          {"DENIED"}},
         // The delete-all bracket is optional, and what it answers is not reported.
         {"KXDeleteAll",
@@ -165,46 +227,109 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
                  (void)F3DAdd3DObjectToScene(top, nullptr, 0); // E_INVALIDARG for those still there
              return Result(hr) + " " + left;
          },
-         "S_OK 0", {"S_OK 0", "S_OK 0", "E_FAIL 3", "DENIED 3", "S_OK 0"}},
+         "S_OK 0",
+         {"S_OK 0", "S_OK 0", "E_FAIL 3", "DENIED 3", "S_OK 0"}},
         // Containers.
-        {"F3DGetLayerContainer", [] { IKXLayerContainer* out = nullptr; return Out(F3DGetLayerContainer(&out), out); },
-         "S_OK set", {denied}},
-        {"F3DGetPassContainer", [] { IKXLayerContainer* out = nullptr; return Out(F3DGetPassContainer(&out), out); },
-         "S_OK set", {denied}},
+        {"F3DGetLayerContainer",
+         [] {
+             IKXLayerContainer* out = nullptr;
+             return Out(F3DGetLayerContainer(&out), out);
+         },
+         "S_OK set",
+         {denied}},
+        {"F3DGetPassContainer",
+         [] {
+             IKXLayerContainer* out = nullptr;
+             return Out(F3DGetPassContainer(&out), out);
+         },
+         "S_OK set",
+         {denied}},
         {"F3DGetParTypeContainer",
-         [] { void* out = nullptr; return Out(F3DGetParTypeContainer(IID_IUnknown, &out), out); }, "S_OK set",
+         [] {
+             void* out = nullptr;
+             return Out(F3DGetParTypeContainer(IID_IUnknown, &out), out);
+         },
+         "S_OK set",
          {denied}},
         {"F3DGetEnvironmentContainer",
-         [] { void* out = nullptr; return Out(F3DGetEnvironmentContainer(IID_IUnknown, &out), out); }, "S_OK set",
+         [] {
+             void* out = nullptr;
+             return Out(F3DGetEnvironmentContainer(IID_IUnknown, &out), out);
+         },
+         "S_OK set",
          {denied}},
-        {"F3DGetRefPlaneFolder", [] { I3DRefPlaneFolder* out = nullptr; return Out(F3DGetRefPlaneFolder(&out), out); },
-         "S_OK set", {"S_OK set", denied}},
-        {"F3DGetDeviceManager", [] { void* out = nullptr; return Out(F3DGetDeviceManager(IID_IUnknown, &out), out); },
-         "S_OK set", {"S_OK set", denied}},
+        {"F3DGetRefPlaneFolder",
+         [] {
+             I3DRefPlaneFolder* out = nullptr;
+             return Out(F3DGetRefPlaneFolder(&out), out);
+         },
+         "S_OK set",
+         {"S_OK set", denied}},
+        {"F3DGetDeviceManager",
+         [] {
+             void* out = nullptr;
+             return Out(F3DGetDeviceManager(IID_IUnknown, &out), out);
+         },
+         "S_OK set",
+         {"S_OK set", denied}},
         {"F3DGetTransientObjectContainer",
-         [] { void* out = nullptr; return Out(F3DGetTransientObjectContainer(IID_IUnknown, &out), out); },
-         "S_OK set", {"S_OK set", denied}},
+         [] {
+             void* out = nullptr;
+             return Out(F3DGetTransientObjectContainer(IID_IUnknown, &out), out);
+         },
+         "S_OK set",
+         {"S_OK set", denied}},
         // Scene defaults: the stream and the new instance turn every failure into S_FALSE.
         {"KXGetSceneDefaultsObject",
-         [] { IUnknown* out = nullptr; return Out(KXGetSceneDefaultsObject(ut::test::kColor, &out), out); },
-         "S_OK set", {"S_OK set", denied, denied}},
+         [] {
+             IUnknown* out = nullptr;
+             return Out(KXGetSceneDefaultsObject(ut::test::kColor, &out), out);
+         },
+         "S_OK set",
+         {"S_OK set", denied, denied}},
         {"KXGetStreamFromSceneDefaults",
-         [] { IStream* out = nullptr; return Out(KXGetStreamFromSceneDefaults(ut::test::kColor, &out), out); },
-         "S_OK set", {"S_OK set", "S_FALSE null", "S_FALSE null"}},
+         [] {
+             IStream* out = nullptr;
+             return Out(KXGetStreamFromSceneDefaults(ut::test::kColor, &out), out);
+         },
+         "S_OK set",
+         {"S_OK set", "S_FALSE null", "S_FALSE null"}},
         {"KXCreateDefaultInstance",
-         [] { void* out = nullptr; return Out(KXCreateDefaultInstance(CLSID_3DList, IID_I3DList, &out, nullptr), out); },
-         "S_OK set", {"S_OK set", "S_FALSE null", "S_FALSE null", "S_FALSE null"}},
+         [] {
+             void* out = nullptr;
+             return Out(KXCreateDefaultInstance(CLSID_3DList, IID_I3DList, &out, nullptr), out);
+         },
+         "S_OK set",
+         {"S_OK set", "S_FALSE null", "S_FALSE null", "S_FALSE null"}},
         // Scene properties and the model.
         {"KXGetSceneProperty",
-         [] { void* out = nullptr; return Out(KXGetSceneProperty(GUID_GWTimeMappingProperty, IID_IUnknown, &out), out); },
-         "S_OK set", {denied}},
-        {"KXGetListOfSceneCameras", [] { I3DList* out = nullptr; return Out(KXGetListOfSceneCameras(&out), out); },
-         "S_OK set", {denied}},
-        {"KXGetCurrentSceneModel", [] { void* out = nullptr; return Out(KXGetCurrentSceneModel(IID_I3DModel, &out), out); },
-         "S_OK set", {denied}},
+         [] {
+             void* out = nullptr;
+             return Out(KXGetSceneProperty(GUID_GWTimeMappingProperty, IID_IUnknown, &out), out);
+         },
+         "S_OK set",
+         {denied}},
+        {"KXGetListOfSceneCameras",
+         [] {
+             I3DList* out = nullptr;
+             return Out(KXGetListOfSceneCameras(&out), out);
+         },
+         "S_OK set",
+         {denied}},
+        {"KXGetCurrentSceneModel",
+         [] {
+             void* out = nullptr;
+             return Out(KXGetCurrentSceneModel(IID_I3DModel, &out), out);
+         },
+         "S_OK set",
+         {denied}},
         // A failing read of the time-mapping property means the scene has none.
         {"KXGetCurrentSceneTimeMapping",
-         [] { IGWProperties* out = nullptr; return Out(KXGetCurrentSceneTimeMapping(&out), out); }, "S_OK set",
+         [] {
+             IGWProperties* out = nullptr;
+             return Out(KXGetCurrentSceneTimeMapping(&out), out);
+         },
+         "S_OK set",
          {denied, denied, "S_FALSE null"}},
         // A failing read makes the property again, which replaces the scene's (the failures of making
         // it are the contract test's).
@@ -214,14 +339,23 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              HRESULT hr = KXGetCurrentSceneProperty(GUID_GWTimeMappingProperty, value, 1);
              return Result(hr) + " " + std::to_string(value.vt);
          },
-         "S_OK 13", {"DENIED 0", "DENIED 0", "S_OK 13"}},
+         "S_OK 13",
+         {"DENIED 0", "DENIED 0", "S_OK 13"}},
         {"KXGetSceneRootProperty",
-         [&] { void* out = nullptr; return Out(KXGetSceneRootProperty(kNew, IID_IGWProperties, &out), out); },
-         "S_OK set", {denied, denied, denied, denied}},
+         [&] {
+             void* out = nullptr;
+             return Out(KXGetSceneRootProperty(kNew, IID_IGWProperties, &out), out);
+         },
+         "S_OK set",
+         {denied, denied, denied, denied}},
         // Any failure on the way to the list is E_FAIL.
         {"F3DGetPropsList",
-         [&] { I3DList* out = nullptr; return Out(F3DGetPropsList(arm_.Get(), ut::test::kColor, &out), out); },
-         "S_OK set", {"E_FAIL null"}},
+         [&] {
+             I3DList* out = nullptr;
+             return Out(F3DGetPropsList(arm_.Get(), ut::test::kColor, &out), out);
+         },
+         "S_OK set",
+         {"E_FAIL null"}},
         // The transient object container, each put back afterwards.
         {"F3DAddObjectToTransientObjectContainer",
          [&] {
@@ -230,7 +364,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DRemoveObjectFromTransientObjectContainer(static_cast<IUnknown*>(light_.Get()));
              return Result(hr);
          },
-         "S_OK", {"S_OK", "DENIED", "DENIED"}},
+         "S_OK",
+         {"S_OK", "DENIED", "DENIED"}},
         {"F3DRemoveObjectFromTransientObjectContainer",
          [&] {
              HRESULT hr = F3DRemoveObjectFromTransientObjectContainer(static_cast<IUnknown*>(arm_.Get()));
@@ -238,9 +373,11 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DAddObjectToTransientObjectContainer(armHierarchy_.Get(), 1);
              return Result(hr);
          },
-         "S_OK", {"S_FALSE", "DENIED", "DENIED"}},
+         "S_OK",
+         {"S_FALSE", "DENIED", "DENIED"}},
         {"F3DIsObjectInTransientObjectContainer",
-         [&] { return Result(F3DIsObjectInTransientObjectContainer(static_cast<IUnknown*>(arm_.Get()))); }, "S_OK",
+         [&] { return Result(F3DIsObjectInTransientObjectContainer(static_cast<IUnknown*>(arm_.Get()))); },
+         "S_OK",
          {"S_FALSE", "DENIED", "DENIED"}},
         {"F3DTransientObjectContainerReset",
          [&] {
@@ -249,7 +386,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DAddObjectToTransientObjectContainer(armHierarchy_.Get(), 1);
              return Result(hr);
          },
-         "S_OK", {"S_OK", "DENIED", "DENIED"}},
+         "S_OK",
+         {"S_OK", "DENIED", "DENIED"}},
         // The play control, the set-value command and the selection.
         {"KXTimeControlReset", [] { return Result(KXTimeControlReset(1)); }, "S_OK", {"DENIED"}},
         // Reaching the parameter and the proxy fails the command; the current time and the set do not.
@@ -258,9 +396,12 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              CGWVariant value(2.0);
              return Result(F3DSetComponentValueCmd(arm_.Get(), ut::test::kX, &value));
          },
-         "S_OK", {"DENIED", "DENIED", "S_OK", "S_OK", "S_OK"}},
-        {"KXIsActiveDataSelected", [&] { return std::string(KXIsActiveDataSelected(arm_.Get()) ? "yes" : "no"); },
-         "yes", {"no"}},
+         "S_OK",
+         {"DENIED", "DENIED", "S_OK", "S_OK", "S_OK"}},
+        {"KXIsActiveDataSelected",
+         [&] { return std::string(KXIsActiveDataSelected(arm_.Get()) ? "yes" : "no"); },
+         "yes",
+         {"no"}},
         // The undo bracket: a step is recorded only when it opened and closed.
         {"C3DComplexUndo",
          [&] {
@@ -275,10 +416,16 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
                  (void)undo->CloseComplexUndo(); // the step whose closing failed
              return recorded;
          },
-         "1", {"0", "0", "0", "0"}},
+         "1",
+         {"0", "0", "0", "0"}},
         {"F3DGetMaterialCatID and F3DTranslateMaterialCATID",
-         [] { return std::string(IsEqualGUID(F3DTranslateMaterialCATID(F3DGetMaterialCatID()), CATID_3DMaterial) ? "same" : "other"); },
-         "same", {}},
+         [] {
+             return std::string(
+                 IsEqualGUID(F3DTranslateMaterialCATID(F3DGetMaterialCatID()), CATID_3DMaterial) ? "same"
+                                                                                                 : "other");
+         },
+         "same",
+         {}},
     };
     int walked = 0;
     for (const Walk& walk : walks) {
@@ -307,7 +454,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
                                                   ut::test::RefTracker::References(registry_.Get())}))
             << walk.name << " left references behind";
         if (walk.failures.size() > 1) {
-            EXPECT_EQ(seen.size(), walk.failures.size()) << walk.name << " makes another number of host calls";
+            EXPECT_EQ(seen.size(), walk.failures.size())
+                << walk.name << " makes another number of host calls";
         }
     }
     std::cout << "[ walked   ] " << walked << " failure paths of " << std::size(walks) << " exports\n";

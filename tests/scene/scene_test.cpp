@@ -124,8 +124,9 @@ TEST_F(ReferenceScene, TheTimeControlResetIsReadBackFromThePlayControl) {
     play->GetSettings(&after);
     EXPECT_EQ(std::vector<double>({after.span.start.time, after.span.end.time, after.position, after.speed}),
               std::vector<double>({1.0, 100.0, 1.0, 1.0}));
-    EXPECT_EQ(std::vector<LONG>({after.loop, after.preroll, after.mode, after.format, after.step, after.realTime}),
-              std::vector<LONG>({0, 15, 2, 10, 5, before.realTime}));
+    EXPECT_EQ(
+        std::vector<LONG>({after.loop, after.preroll, after.mode, after.format, after.step, after.realTime}),
+        std::vector<LONG>({0, 15, 2, 10, 5, before.realTime}));
     tagGWTIMESPAN span{};
     ASSERT_EQ(KXTimeControlReset(0), S_OK);
     EXPECT_EQ(play->GetTimeSpan(&span), S_OK);
@@ -190,14 +191,17 @@ TEST_F(ReferenceScene, ScenePropertiesAreFoundMadeOnDemandAndReadAsTheTimeMappin
     value.Clear();
     EXPECT_EQ(KXGetCurrentSceneTimeMapping(&mapping), S_OK);
     EXPECT_EQ(Held(mapping), "set");
-    EXPECT_EQ(KXGetSceneProperty(GUID_GWTimeMappingProperty, IID_IGWProperties, reinterpret_cast<void**>(&mapping)),
-              S_OK);
+    EXPECT_EQ(
+        KXGetSceneProperty(GUID_GWTimeMappingProperty, IID_IGWProperties, reinterpret_cast<void**>(&mapping)),
+        S_OK);
     EXPECT_EQ(Held(mapping), "set");
     // The model's root property: made the first time, the same one afterwards.
     IUnknown* first = nullptr;
     IUnknown* second = nullptr;
-    EXPECT_EQ(KXGetSceneRootProperty(ut::test::kMaterial, IID_IUnknown, reinterpret_cast<void**>(&first)), S_OK);
-    EXPECT_EQ(KXGetSceneRootProperty(ut::test::kMaterial, IID_IUnknown, reinterpret_cast<void**>(&second)), S_OK);
+    EXPECT_EQ(KXGetSceneRootProperty(ut::test::kMaterial, IID_IUnknown, reinterpret_cast<void**>(&first)),
+              S_OK);
+    EXPECT_EQ(KXGetSceneRootProperty(ut::test::kMaterial, IID_IUnknown, reinterpret_cast<void**>(&second)),
+              S_OK);
     EXPECT_EQ(first, second);
     Held(first), Held(second);
     EXPECT_EQ(other.DescribeScene().properties.size(), 1u);

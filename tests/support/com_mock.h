@@ -26,10 +26,10 @@ namespace ut::test {
 template <class Interface>
 class ComMock : public Interface {
 public:
-    explicit ComMock(const IID& iid, std::vector<IID> more = {}) : iids_(std::move(more)) { iids_.push_back(iid); }
-    ComMock()
-        requires HasInterfaceId<Interface>
-        : ComMock(InterfaceId<Interface>::Get()) {}
+    explicit ComMock(const IID& iid, std::vector<IID> more = {}) : iids_(std::move(more)) {
+        iids_.push_back(iid);
+    }
+    ComMock() requires HasInterfaceId<Interface> : ComMock(InterfaceId<Interface>::Get()) {}
     virtual ~ComMock() = default;
 
     // Answers `iid` with `other`, another mock of the same test object.

@@ -34,7 +34,8 @@ auto GiveOut(Object* object, HRESULT hr = S_OK) {
     };
 }
 
-#define UT_MOCK(result, name, arguments) MOCK_METHOD(result, name, arguments, (override, Calltype(STDMETHODCALLTYPE)))
+#define UT_MOCK(result, name, arguments)                                                                     \
+    MOCK_METHOD(result, name, arguments, (override, Calltype(STDMETHODCALLTYPE)))
 
 struct MockSceneManager : ComMock<I3DSceneManager> {
     UT_MOCK(HRESULT, GetCurrentScene, (IUnknown**));

@@ -1,34 +1,17 @@
 #include <string>
 #include <vector>
 
-#include <CLI/CLI.hpp>
 #include <gtest/gtest.h>
 
 #include "commands.h"
+#include "run_tool.h"
 
 namespace {
 
-struct Outcome {
-    int exit;
-    std::string out;
-};
+using ut::test::Outcome;
 
-// Parses as the tool's main does: a usage error exits with 2 after one line on standard error.
 Outcome RunTool(std::vector<std::string> args) {
-    CLI::App app("ut");
-    ut::tool::AddTimeCommand(app);
-    std::vector<const char*> argv = {"ut"};
-    for (const std::string& arg : args)
-        argv.push_back(arg.c_str());
-    testing::internal::CaptureStdout();
-    int exit = 0;
-    try {
-        app.parse(static_cast<int>(argv.size()), argv.data());
-    } catch (const CLI::ParseError& error) {
-        exit = error.get_exit_code() == 0 ? 0 : 2;
-        EXPECT_EQ(std::string(error.what()).find('\n'), std::string::npos) << error.what();
-    }
-    return {exit, testing::internal::GetCapturedStdout()};
+    return ut::test::RunTool(&ut::tool::AddTimeCommand, args);
 }
 
 TEST(TimeCommand, ConvertsUnderTheScenesFormatOrTheOneAskedFor) {

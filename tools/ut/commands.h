@@ -17,5 +17,7 @@ int Demo(const Arguments& args);
 
 // ut time frames-to-seconds | seconds-to-frame (tools/ut/time.cpp, written for CLI11).
 void AddTimeCommand(CLI::App& app);
+// ut scene show [FILE.json] [--json] (tools/ut/scene.cpp, written for CLI11).
+void AddSceneCommand(CLI::App& app);
 
 } // namespace ut::tool

@@ -73,7 +73,7 @@ struct SceneDescription {
     std::vector<PropertySetDescription> properties = {};
     // The objects below the root model.
     std::vector<ObjectDescription> objects = {};
-    ContainersDescription containers;
+    ContainersDescription containers = {};
 };
 
 // Reads a description. A text that is not one answers E_INVALIDARG with `error` set to one line

@@ -39,18 +39,18 @@ enum GWPLAYMODE : LONG {
 struct tagGWPLAYCONTROLSETTINGS {
     ULONG size;
     ULONG mask;
-    tagGWTIMESPAN span;      // the range played
-    double position;         // the play position, in seconds
-    LONG loop;               // non-zero plays the range over and over
-    LONG preroll;            // frames played before the range
-    GWPLAYMODE mode;         // how playback steps
-    tagGWTIMEFORMAT format;  // the format times are shown in
-    double speed;            // 1.0 plays in real time
-    LONG realTime;           // non-zero follows the clock rather than the frames
-    LONG step;               // frames one step moves
-    LONG scrub;              // non-zero plays sound while the position is dragged
-    LONG audioOffset;        // frames the sound is moved by
-    BYTE reserved[344];      // the host's; zero
+    tagGWTIMESPAN span;     // the range played
+    double position;        // the play position, in seconds
+    LONG loop;              // non-zero plays the range over and over
+    LONG preroll;           // frames played before the range
+    GWPLAYMODE mode;        // how playback steps
+    tagGWTIMEFORMAT format; // the format times are shown in
+    double speed;           // 1.0 plays in real time
+    LONG realTime;          // non-zero follows the clock rather than the frames
+    LONG step;              // frames one step moves
+    LONG scrub;             // non-zero plays sound while the position is dragged
+    LONG audioOffset;       // frames the sound is moved by
+    BYTE reserved[344];     // the host's; zero
 };
 static_assert(sizeof(tagGWPLAYCONTROLSETTINGS) == 448);
 

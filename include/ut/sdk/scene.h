@@ -18,14 +18,18 @@ inline constexpr IID IID_I3DSceneManager = {
 inline constexpr IID IID_IGWManagerRegistry = {
     0x99ADE845, 0x59E3, 0x11D1, {0x8E, 0x88, 0x00, 0xA0, 0x24, 0x8F, 0x94, 0x7C}};
 // {34CF77C1-4256-11D0-B148-00A02485CECB}
-inline constexpr IID IID_I3DScene = {0x34CF77C1, 0x4256, 0x11D0, {0xB1, 0x48, 0x00, 0xA0, 0x24, 0x85, 0xCE, 0xCB}};
+inline constexpr IID IID_I3DScene = {
+    0x34CF77C1, 0x4256, 0x11D0, {0xB1, 0x48, 0x00, 0xA0, 0x24, 0x85, 0xCE, 0xCB}};
 // {6B579D20-3DC5-11D0-9449-00AA006D3165}
-inline constexpr IID IID_I3DModel = {0x6B579D20, 0x3DC5, 0x11D0, {0x94, 0x49, 0x00, 0xAA, 0x00, 0x6D, 0x31, 0x65}};
+inline constexpr IID IID_I3DModel = {
+    0x6B579D20, 0x3DC5, 0x11D0, {0x94, 0x49, 0x00, 0xAA, 0x00, 0x6D, 0x31, 0x65}};
 // The next four are not fixed by the application; these are the ones this SDK declares.
 // {98079B53-8E47-4A94-A2DE-F23E4E0F1D46}
-inline constexpr IID IID_I3DObject = {0x98079B53, 0x8E47, 0x4A94, {0xA2, 0xDE, 0xF2, 0x3E, 0x4E, 0x0F, 0x1D, 0x46}};
+inline constexpr IID IID_I3DObject = {
+    0x98079B53, 0x8E47, 0x4A94, {0xA2, 0xDE, 0xF2, 0x3E, 0x4E, 0x0F, 0x1D, 0x46}};
 // {EFE82E85-6B92-47DE-9F0C-3C226A1DBFF6}
-inline constexpr IID IID_I3DGroup = {0xEFE82E85, 0x6B92, 0x47DE, {0x9F, 0x0C, 0x3C, 0x22, 0x6A, 0x1D, 0xBF, 0xF6}};
+inline constexpr IID IID_I3DGroup = {
+    0xEFE82E85, 0x6B92, 0x47DE, {0x9F, 0x0C, 0x3C, 0x22, 0x6A, 0x1D, 0xBF, 0xF6}};
 // {B096D918-33C8-4739-8C3B-D3F723D1A642}
 inline constexpr IID IID_I3DPrimitive = {
     0xB096D918, 0x33C8, 0x4739, {0x8C, 0x3B, 0xD3, 0xF7, 0x23, 0xD1, 0xA6, 0x42}};
@@ -134,7 +138,8 @@ struct I3DScene : IUnknown {
     virtual HRESULT STDMETHODCALLTYPE GetSceneProperty(REFGUID clsid, REFIID iid, void** property) = 0;
     // Adds `set` as the scene's property set of class `clsid`; `kind` and `flags` are how the
     // application files and saves it (the library passes 4 and 0x8000).
-    virtual HRESULT STDMETHODCALLTYPE AddProperty(REFGUID clsid, IGWProperties* set, LONG kind, ULONG flags) = 0;
+    virtual HRESULT STDMETHODCALLTYPE AddProperty(REFGUID clsid, IGWProperties* set, LONG kind,
+                                                  ULONG flags) = 0;
     // A new list of the objects of `family`, as GW3DLIST_* says; S_FALSE when there are none.
     virtual HRESULT STDMETHODCALLTYPE ListObjects(REFGUID family, LONG how, I3DList** objects) = 0;
     // The scene's root model; S_FALSE and null for a scene without one.
@@ -166,7 +171,8 @@ struct I3DSceneManager : IUnknown {
     // `reserved` is 0.
     virtual HRESULT STDMETHODCALLTYPE SetNotificationMode(LONG mode, LONG reserved) = 0;
     // Keeps a command (its id and the id of what it applies to) to run in `context` on PostCommand.
-    virtual HRESULT STDMETHODCALLTYPE StoreCommand(REFGUID command, REFGUID target, IGWExecContext* context) = 0;
+    virtual HRESULT STDMETHODCALLTYPE StoreCommand(REFGUID command, REFGUID target,
+                                                   IGWExecContext* context) = 0;
     // Runs the command kept last and forgets it; S_FALSE when none is kept.
     virtual HRESULT STDMETHODCALLTYPE PostCommand() = 0;
 
