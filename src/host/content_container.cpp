@@ -157,26 +157,13 @@ HRESULT ContentContainer::FindObject(REFGUID key, REFIID iid, void** object) {
     return DISP_E_MEMBERNOTFOUND;
 }
 
-std::span<const CGWCOMObject::InterfaceEntry> ContentContainerFactory::GetInterfaceMap() const {
-    static const InterfaceEntry map[] = {
-        ut::sdk::Entry<ContentContainerFactory, IClassFactory>(IID_IClassFactory)};
-    return map;
-}
-
-HRESULT ContentContainerFactory::CreateInstance(IUnknown* outer, REFIID iid, void** object) {
-    if (!object)
-        return E_POINTER;
-    *object = nullptr;
-    if (HRESULT hr = ut::sdk::CheckHostFault("IClassFactory::CreateInstance"); FAILED(hr))
-        return hr;
-    if (outer)
-        return CLASS_E_NOAGGREGATION;
-    ut::ComPtr<ContentContainer> created = Make<ContentContainer>();
-    if (!created)
+HRESULT MakeContentContainer(const Settings& settings, IUnknown** made) {
+    ut::ComPtr<ContentContainer> container = Make<ContentContainer>();
+    if (!container)
         return E_OUTOFMEMORY;
-    if (HRESULT hr = created->Build(settings_); FAILED(hr))
+    if (HRESULT hr = container->Build(settings); FAILED(hr))
         return hr;
-    return created->QueryInterface(iid, object);
+    return container->QueryInterface(IID_IUnknown, reinterpret_cast<void**>(made));
 }
 
 } // namespace ut::host

@@ -1,7 +1,6 @@
 // The reference host's content container: a scene root that keeps, under their keys, the key
 // time (a property set whose value parameter is a frame count), the transient object container,
-// the scene defaults, and the reference-plane, device and cache folders. Containers are made by a
-// class factory that starts them from the settings.
+// the scene defaults, and the reference-plane, device and cache folders.
 #pragma once
 
 #include <map>
@@ -60,18 +59,7 @@ private:
     std::vector<std::pair<GUID, ut::ComPtr<IUnknown>>> members_;
 };
 
-// Keeps a copy of the settings, which the containers it makes are started from.
-class ContentContainerFactory final : public ut::sdk::ComObject<IClassFactory> {
-public:
-    explicit ContentContainerFactory(const Settings& settings) : settings_(settings) {}
-
-    std::span<const InterfaceEntry> GetInterfaceMap() const override;
-
-    HRESULT STDMETHODCALLTYPE CreateInstance(IUnknown* outer, REFIID iid, void** object) override;
-    HRESULT STDMETHODCALLTYPE LockServer(BOOL) override { return S_OK; }
-
-private:
-    Settings settings_;
-};
+// A content container started from `settings`, for the class factory of content containers.
+HRESULT MakeContentContainer(const Settings& settings, IUnknown** made);
 
 } // namespace ut::host

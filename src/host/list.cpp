@@ -1,8 +1,6 @@
 // The reference host's lists and element references.
 #include "list.h"
 
-#include <algorithm>
-
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/testing.h>
 
@@ -11,56 +9,14 @@
 namespace ut::host {
 namespace {
 
-class ElemRefEnumerator final : public ut::sdk::ComObject<IEnum3DElemRef> {
-public:
-    ElemRefEnumerator(std::vector<ut::ComPtr<I3DElemRef>> elements, size_t next)
-        : elements_(std::move(elements)), next_(next) {}
-
-    std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {
-            ut::sdk::Entry<ElemRefEnumerator, IEnum3DElemRef>(IID_IEnum3DElemRef)};
-        return map;
-    }
-
-    HRESULT STDMETHODCALLTYPE Next(ULONG count, I3DElemRef** elements, ULONG* fetched) override {
-        if (fetched)
-            *fetched = 0;
-        if (HRESULT hr = ut::sdk::CheckHostFault("IEnum3DElemRef::Next"); FAILED(hr))
-            return hr;
-        if (!elements || (count > 1 && !fetched))
-            return E_POINTER;
-        ULONG done = 0;
-        for (; done < count && next_ < elements_.size(); ++done, ++next_)
-            elements_[next_].CopyTo(&elements[done]);
-        if (fetched)
-            *fetched = done;
-        return done == count ? S_OK : S_FALSE;
-    }
-
-    HRESULT STDMETHODCALLTYPE Skip(ULONG count) override {
-        size_t left = elements_.size() - next_;
-        next_ += std::min<size_t>(count, left);
-        return count <= left ? S_OK : S_FALSE;
-    }
-
-    HRESULT STDMETHODCALLTYPE Reset() override {
-        next_ = 0;
-        return S_OK;
-    }
-
-    HRESULT STDMETHODCALLTYPE Clone(IEnum3DElemRef** copy) override {
-        if (!copy)
-            return E_POINTER;
-        *copy = nullptr;
-        return ut::ExportBoundary([&] {
-            *copy = Make<ElemRefEnumerator>(elements_, next_).Detach();
-            return *copy ? S_OK : E_OUTOFMEMORY;
-        });
-    }
-
-private:
-    std::vector<ut::ComPtr<I3DElemRef>> elements_;
-    size_t next_;
+// The elements of a list, handed out with a reference each.
+struct Elements {
+    using Interface = IEnum3DElemRef;
+    using Kept = ut::ComPtr<I3DElemRef>;
+    using Out = I3DElemRef*;
+    static constexpr char kNext[] = "IEnum3DElemRef::Next";
+    static HRESULT HandOut(const Kept& element, Out& out) { return element.CopyTo(&out); }
+    static void Clear(Out& out) { std::exchange(out, nullptr)->Release(); }
 };
 
 } // namespace
@@ -158,7 +114,7 @@ HRESULT List::EnumElements(IEnum3DElemRef** elements) {
     if (HRESULT hr = ut::sdk::CheckHostFault("I3DList::EnumElements"); FAILED(hr))
         return hr;
     return ut::ExportBoundary([&] {
-        *elements = Make<ElemRefEnumerator>(elements_, 0).Detach();
+        *elements = Make<Enumerator<Elements>>(elements_).Detach();
         return *elements ? S_OK : E_OUTOFMEMORY;
     });
 }

