@@ -1,6 +1,9 @@
 // Everything the library exports.
 #pragma once
 
+#include <ut/compare.h>
 #include <ut/export.h>
+#include <ut/frames.h>
 #include <ut/memory.h>
+#include <ut/mifile.h>
 #include <ut/persist.h>

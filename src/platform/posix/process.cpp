@@ -1,3 +1,4 @@
+// POSIX home: the process's environment, modules, error output and arguments.
 #include <cstdlib>
 #include <dlfcn.h>
 
@@ -28,6 +29,12 @@ std::wstring ModuleFileName(HINSTANCE module) {
 
 void ReportError(const std::wstring& line) {
     WriteErrorLine(line);
+}
+
+std::vector<std::string> Utf8Arguments(int argc, char** argv) {
+    if (argc < 1 || !argv)
+        return {};
+    return std::vector<std::string>(argv + 1, argv + argc);
 }
 
 } // namespace ut::platform
