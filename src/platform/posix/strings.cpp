@@ -1,11 +1,13 @@
 // POSIX home: the C runtime's case-insensitive comparisons, multibyte helpers and 32-bit number
 // conversions, written over the C library's locale-aware character functions.
 #include <algorithm>
+#include <cctype>
 #include <climits>
 #include <cstdint>
 #include <cstdlib>
 #include <cwchar>
 #include <cwctype>
+#include <langinfo.h>
 #include <strings.h>
 
 #include <ut/platform/strings.h>
@@ -21,20 +23,18 @@ LONG SaturateToLong(long long value) {
     return static_cast<LONG>(value);
 }
 
-std::uint32_t FoldWide(wchar_t c) {
-    return static_cast<std::uint32_t>(std::towlower(static_cast<std::wint_t>(c)));
-}
-
-// One character of multibyte text as it compares: its lower-case value and its length in bytes.
+// One character of multibyte text: its wide value (or the byte's own, for a byte that starts no
+// valid character) and its length in bytes.
 struct Unit {
-    std::uint32_t value;
+    wchar_t value;
+    bool decoded;
     std::size_t bytes;
 };
 
 // The character at `text` (not the terminator), decoded from at most `limit` bytes.
 Unit ReadUnit(const unsigned char* text, std::size_t limit) {
     if (text[0] < 0x80)
-        return {FoldWide(static_cast<wchar_t>(text[0])), 1};
+        return {static_cast<wchar_t>(text[0]), true, 1};
     // Never let the decoder look past the terminator or the limit.
     std::size_t most = std::min<std::size_t>(limit, MB_CUR_MAX);
     std::size_t available = 1;
@@ -45,8 +45,8 @@ Unit ReadUnit(const unsigned char* text, std::size_t limit) {
     std::size_t used = std::mbrtowc(&wide, reinterpret_cast<const char*>(text), available, &state);
     // 0 cannot happen (no terminator here); -1 and -2 are invalid and cut-short characters.
     if (used == 0 || used > available)
-        return {text[0], 1};
-    return {FoldWide(wide), used};
+        return {static_cast<wchar_t>(text[0]), false, 1};
+    return {wide, true, used};
 }
 
 bool AtEnd(const unsigned char* text, std::size_t offset, std::size_t limit) {
@@ -55,18 +55,41 @@ bool AtEnd(const unsigned char* text, std::size_t offset, std::size_t limit) {
 
 } // namespace
 
+FoldTable WideFoldTable() {
+#ifdef __GLIBC__
+    // towlower follows the LC_CTYPE of the thread, or the global one, which any thread may change;
+    // its codeset name lies in that locale's data, which glibc keeps loaded, so the name's address
+    // tells whether the folds still hold.
+    struct Cache {
+        const char* codeset = nullptr;
+        std::int32_t folds[128];
+    };
+    thread_local Cache cache;
+    const char* codeset = ::nl_langinfo(CODESET);
+    if (cache.codeset != codeset) {
+        for (std::uint32_t c = 0; c < 128; ++c)
+            cache.folds[c] = static_cast<std::int32_t>(std::towlower(static_cast<std::wint_t>(c)));
+        cache.codeset = codeset;
+    }
+    return {cache.folds, 128};
+#else
+    return {};
+#endif
+}
+
 int CompareWideNoCase(const wchar_t* lhs, const wchar_t* rhs) {
     return CompareWideNoCase(lhs, rhs, SIZE_MAX);
 }
 
 int CompareWideNoCase(const wchar_t* lhs, const wchar_t* rhs, std::size_t count) {
+    CaseFolder fold;
     for (; count; --count, ++lhs, ++rhs) {
         wchar_t a = *lhs;
         wchar_t b = *rhs;
         // Equal characters fold alike whatever the locale: only differing ones are folded.
         if (a != b) {
-            std::uint32_t foldedA = FoldWide(a);
-            std::uint32_t foldedB = FoldWide(b);
+            std::uint32_t foldedA = fold(a);
+            std::uint32_t foldedB = fold(b);
             if (foldedA != foldedB)
                 return foldedA < foldedB ? -1 : 1;
         }
@@ -90,6 +113,10 @@ int CompareMultibyteNoCase(const unsigned char* lhs, const unsigned char* rhs) {
 }
 
 int CompareMultibyteNoCase(const unsigned char* lhs, const unsigned char* rhs, std::size_t bytes) {
+    CaseFolder fold;
+    auto folded = [&fold](const Unit& unit) {
+        return unit.decoded ? fold(unit.value) : static_cast<std::uint32_t>(unit.value);
+    };
     std::size_t left = 0;
     std::size_t right = 0;
     for (;;) {
@@ -99,8 +126,10 @@ int CompareMultibyteNoCase(const unsigned char* lhs, const unsigned char* rhs, s
             return leftEnds == rightEnds ? 0 : (leftEnds ? -1 : 1);
         Unit a = ReadUnit(lhs + left, bytes - left);
         Unit b = ReadUnit(rhs + right, bytes - right);
-        if (a.value != b.value)
-            return a.value < b.value ? -1 : 1;
+        std::uint32_t foldedA = folded(a);
+        std::uint32_t foldedB = folded(b);
+        if (foldedA != foldedB)
+            return foldedA < foldedB ? -1 : 1;
         left += a.bytes;
         right += b.bytes;
     }

@@ -10,6 +10,11 @@
 
 namespace ut::platform {
 
+// The CRT gives no cheap sign that the locale changed, so every letter is folded as it comes.
+FoldTable WideFoldTable() {
+    return {};
+}
+
 int CompareWideNoCase(const wchar_t* lhs, const wchar_t* rhs) {
     return _wcsicmp(lhs, rhs);
 }
