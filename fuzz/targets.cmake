@@ -2,3 +2,5 @@
 # fuzz/CMakeLists.txt turns each into a libFuzzer binary; tests/CMakeLists.txt into a replay of
 # fuzz/corpus/<name>/ under CTest.
 ut_fuzz_target(stream stream_fuzz.cpp)
+ut_fuzz_target(mifile mifile_fuzz.cpp)
+ut_fuzz_target(compare compare_fuzz.cpp)

@@ -2,6 +2,8 @@
 #include <cstdio>
 #include <string>
 
+#include <CLI/CLI.hpp>
+
 #include <ut/detail/names.h>
 #include <ut/host/reference_host.h>
 #include <ut/platform/process.h>
@@ -181,17 +183,24 @@ int ShowPersistence() {
     return found == kSceneObjects ? 0 : 1;
 }
 
-} // namespace
-
-int Demo(const Arguments&) {
+void RunDemo() {
     ut::host::ReferenceHost host;
-    if (FAILED(host.Status())) {
-        std::fprintf(stderr, "ut: the reference host did not start\n");
-        return 1;
-    }
+    if (FAILED(host.Status()))
+        Fail(kExitNo, "the reference host did not start");
     int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowPersistence() +
                    ShowVersions() + ShowMemoryPool();
-    return failures ? 1 : 0;
+    if (failures)
+        Fail(kExitNo, "the tour found " + std::to_string(failures) + " part(s) not working");
+}
+
+} // namespace
+
+void AddDemoCommand(CLI::App& app) {
+    CLI::App* demo = app.add_subcommand(
+        "demo", "Load the library on the reference host and show what it does (module, GUIDs, streams, "
+                "persistence, versions, memory pool).");
+    demo->footer("Example:\n  ut demo");
+    demo->callback(RunDemo);
 }
 
 } // namespace ut::tool

@@ -1,0 +1,166 @@
+// Sorting a million generated file names with each comparison, side by side in one run:
+//   sort/F3Dwcsicmpnum, sort/F3Dstricmpnum, sort/F3Dmbsicmpnum   the library's comparisons
+//   sort/wcscmp                                                   plain wide comparison (no numbers, no case)
+//   sort/strverscmp                                               glibc's version order on the narrow form
+// Each repetition sorts a fresh copy of the same shuffled names. After the runs a table gives the
+// median rate in names per second, the spread of the repetitions, and each rate against strverscmp.
+#include <algorithm>
+#include <cstring>
+#include <cwchar>
+#include <iomanip>
+#include <map>
+#include <random>
+#include <string>
+#include <vector>
+
+#include <benchmark/benchmark.h>
+
+#include <ut/compare.h>
+
+namespace {
+
+constexpr std::size_t kNames = 1'000'000;
+
+// Names of renders and plates: mostly a trailing number (a version or a padded frame), some an
+// extension after it, in mixed case. Each form is held in one block, terminated name after name,
+// as a tool holds text it converted once; every comparison sorts the same pointers into it.
+struct Names {
+    std::string narrow;
+    std::wstring wide;
+    std::vector<std::size_t> starts;
+};
+
+const Names& Generated() {
+    static const Names names = [] {
+        const char* words[] = {"shot", "Shot", "SHOT",   "plate",  "Plate", "clip",
+                               "Clip", "comp", "render", "Render", "bg",    "FG"};
+        std::mt19937 random(12);
+        std::uniform_int_distribution<int> word(0, 11), shot(1, 400), version(1, 30), frame(1, 2400),
+            kind(0, 19);
+        Names made;
+        for (std::size_t i = 0; i < kNames; ++i) {
+            std::string name = std::string(words[word(random)]) + "_" + std::to_string(shot(random)) + "_v" +
+                               std::to_string(version(random));
+            int shape = kind(random);
+            if (shape < 5) {
+                char padded[16];
+                std::snprintf(padded, sizeof padded, ".%04d", frame(random));
+                name += padded;
+            } else if (shape < 8) {
+                name += ".exr";
+            }
+            made.starts.push_back(made.narrow.size());
+            made.narrow.append(name).push_back('\0');
+        }
+        made.wide.assign(made.narrow.begin(), made.narrow.end());
+        return made;
+    }();
+    return names;
+}
+
+template <class Char>
+const std::vector<const Char*>& Pointers() {
+    static const std::vector<const Char*> pointers = [] {
+        const Names& names = Generated();
+        std::vector<const Char*> made;
+        for (std::size_t start : names.starts) {
+            if constexpr (sizeof(Char) == sizeof(char))
+                made.push_back(reinterpret_cast<const Char*>(names.narrow.data() + start));
+            else
+                made.push_back(names.wide.data() + start);
+        }
+        return made;
+    }();
+    return pointers;
+}
+
+template <class Char, int (*Compare)(const Char*, const Char*)>
+void Sort(benchmark::State& state) {
+    const std::vector<const Char*>& names = Pointers<Char>();
+    std::vector<const Char*> order;
+    for (auto _ : state) {
+        state.PauseTiming();
+        order = names;
+        state.ResumeTiming();
+        std::sort(order.begin(), order.end(), [](const Char* a, const Char* b) { return Compare(a, b) < 0; });
+        benchmark::DoNotOptimize(order.data());
+    }
+    state.SetItemsProcessed(static_cast<std::int64_t>(state.iterations() * names.size()));
+}
+
+int Wcscmp(const wchar_t* a, const wchar_t* b) {
+    return std::wcscmp(a, b);
+}
+int Strverscmp(const char* a, const char* b) {
+    return ::strverscmp(a, b);
+}
+
+void Register(const char* name, void (*run)(benchmark::State&)) {
+    benchmark::RegisterBenchmark((std::string("sort/") + name).c_str(), run)
+        ->Unit(benchmark::kMillisecond)
+        ->Iterations(1)
+        ->Repetitions(5);
+}
+
+// The console output, followed by the median rate of each comparison, the spread of its
+// repetitions and its rate against strverscmp.
+class RatioReporter : public benchmark::ConsoleReporter {
+public:
+    RatioReporter() : ConsoleReporter(OO_Tabular) {}
+
+    void ReportRuns(const std::vector<Run>& runs) override {
+        ConsoleReporter::ReportRuns(runs);
+        for (const Run& run : runs) {
+            auto rate = run.counters.find("items_per_second");
+            if (run.run_type == Run::RT_Iteration && !run.error_occurred && rate != run.counters.end())
+                rates_[run.run_name.function_name].push_back(rate->second.value);
+        }
+    }
+
+    void Finalize() override {
+        ConsoleReporter::Finalize();
+        std::ostream& out = GetOutputStream();
+        double reference = Median(rates_["sort/strverscmp"]);
+        out << "\nmillions of names sorted per second (median of the repetitions, min-max), against "
+               "strverscmp\n";
+        out << std::fixed;
+        for (auto& [name, rates] : rates_) {
+            std::sort(rates.begin(), rates.end());
+            out << std::left << std::setw(22) << name << std::right << std::setprecision(2) << std::setw(8)
+                << Median(rates) / 1e6 << "  (" << rates.front() / 1e6 << "-" << rates.back() / 1e6 << ")"
+                << std::setw(9) << (reference > 0 ? Median(rates) / reference : 0) << "x\n";
+        }
+    }
+
+private:
+    static double Median(std::vector<double> rates) {
+        if (rates.empty())
+            return 0;
+        std::sort(rates.begin(), rates.end());
+        return rates[rates.size() / 2];
+    }
+
+    std::map<std::string, std::vector<double>> rates_;
+};
+
+} // namespace
+
+int main(int argc, char** argv) {
+    Generated(); // outside the timings
+    Pointers<char>();
+    Pointers<unsigned char>();
+    Pointers<wchar_t>();
+    // Alternating library and reference runs, so that a busy machine slows them alike.
+    Register("strverscmp", Sort<char, Strverscmp>);
+    Register("F3Dstricmpnum", Sort<char, F3Dstricmpnum>);
+    Register("wcscmp", Sort<wchar_t, Wcscmp>);
+    Register("F3Dwcsicmpnum", Sort<wchar_t, F3Dwcsicmpnum>);
+    Register("F3Dmbsicmpnum", Sort<unsigned char, F3Dmbsicmpnum>);
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv))
+        return 1;
+    RatioReporter reporter;
+    benchmark::RunSpecifiedBenchmarks(&reporter);
+    benchmark::Shutdown();
+    return 0;
+}
