@@ -354,7 +354,8 @@ WriteScope::WriteScope(Store& store) : store_(store) {
         status_ = ERROR_ACCESS_DENIED;
         return;
     }
-    status_ = store_.Execute(store_.InTransaction() ? "SAVEPOINT call" : "BEGIN IMMEDIATE");
+    status_ =
+        store_.InTransaction() ? store_.Query("SAVEPOINT call").Run() : store_.Query("BEGIN IMMEDIATE").Run();
     open_ = status_ == ERROR_SUCCESS;
 }
 
@@ -363,12 +364,15 @@ WriteScope::~WriteScope() {
         Undo();
 }
 
+// The caller reports the failure that led here, not one of undoing it.
 void WriteScope::Undo() {
     open_ = false;
-    if (store_.InTransaction())
-        (void)store_.Execute("ROLLBACK TO call; RELEASE call"); // the caller reports the first failure
-    else if (!sqlite3_get_autocommit(store_.db_))
-        (void)store_.Execute("ROLLBACK"); // likewise
+    if (store_.InTransaction()) {
+        (void)store_.Query("ROLLBACK TO call").Run(); // see above
+        (void)store_.Query("RELEASE call").Run();     // see above
+    } else if (!sqlite3_get_autocommit(store_.db_)) {
+        (void)store_.Query("ROLLBACK").Run(); // see above
+    }
 }
 
 LONG WriteScope::Finish(LONG result) {
@@ -379,7 +383,8 @@ LONG WriteScope::Finish(LONG result) {
         return result;
     }
     open_ = false;
-    LONG committed = store_.Execute(store_.InTransaction() ? "RELEASE call" : "COMMIT");
+    LONG committed =
+        store_.InTransaction() ? store_.Query("RELEASE call").Run() : store_.Query("COMMIT").Run();
     if (committed != ERROR_SUCCESS) {
         open_ = true;
         Undo();
