@@ -363,6 +363,32 @@ TEST(RegistryStore, AnIndexWalkCostsTheSameAtEveryStep) {
     EXPECT_LE(largeSteps, smallSteps * 1.2);
 }
 
+TEST(RegistryStore, ReadsComeFromMemoryUntilAnotherProcessCommits) {
+    ScratchKey scratch;
+    Fill(scratch.Get(), L"list", 100);
+    UniqueHKey list = OpenKey(scratch.Get(), L"list");
+    ASSERT_EQ(SubKeyNames(list.get()).size(), 100u);
+    auto name = [&](const wchar_t* key) { return QueryValue(OpenKey(list.get(), key).get(), L"Name"); };
+    ASSERT_EQ(name(L"key100005").data, TextBytes(L"name 5"));
+    std::uint64_t before = ut::platform::GetRegistryStoreCounters().statements;
+    EXPECT_EQ(name(L"key100005").data, TextBytes(L"name 5"));
+    EXPECT_EQ(name(L"key100042").data, TextBytes(L"name 42")); // read with its run of keys
+    EXPECT_EQ(ut::platform::GetRegistryStoreCounters().statements, before);
+
+    TemporaryFolder folder;
+    std::string path = Narrow(scratch.FullPath()) + "\\list";
+    WriteFile(folder.Path() / "change.reg", "Windows Registry Editor Version 5.00\n\n[" + path +
+                                                "\\key100005]\n\"Name\"=\"changed\"\n[-" + path +
+                                                "\\key100006]\n[" + path + "\\key100000a]\n");
+    Child other({"import", (folder.Path() / "change.reg").string()});
+    ASSERT_EQ(other.Wait(), 0);
+    EXPECT_EQ(name(L"key100005").data, TextBytes(L"changed"));
+    EXPECT_EQ(name(L"key100006").result, ERROR_INVALID_HANDLE); // no key to read from
+    std::vector<std::wstring> names = SubKeyNames(list.get());
+    ASSERT_EQ(names.size(), 100u);
+    EXPECT_EQ(names[1], L"key100000a");
+}
+
 TEST(RegistryStore, NamesFoldByOneRuleWhateverTheLocale) {
     ScratchKey scratch;
     // Upper-case order: 'Z' < '_' < 'Ä' < 'É' < 'ß'.

@@ -24,7 +24,7 @@ std::string& StorePath() {
 }
 
 void RemoveStoreFiles() {
-    for (const char* suffix : {"", "-wal", "-shm"})
+    for (const char* suffix : {"", "-wal", "-shm", "-changes"})
         std::remove((StorePath() + suffix).c_str());
 }
 

@@ -2,9 +2,14 @@
 // before anything is written to it, the schema, statements, write scopes and error codes.
 #include "registry_store.h"
 
+#include <atomic>
 #include <cstdlib>
+#include <fcntl.h>
 #include <filesystem>
+#include <sys/mman.h>
+#include <sys/stat.h>
 #include <system_error>
+#include <unistd.h>
 
 #include <ut/platform/process.h>
 #include <ut/platform/text.h>
@@ -88,6 +93,78 @@ LONG ErrorCode(int result) {
     default:
         return ERROR_REGISTRY_IO_FAILED;
     }
+}
+
+void ChangeCounter::Map(const std::string& path) {
+    Release();
+    int file = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644);
+    writable_ = file >= 0;
+    if (file < 0)
+        file = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (file < 0)
+        return;
+    struct stat status {};
+    bool sized = fstat(file, &status) == 0 && (status.st_size >= static_cast<off_t>(sizeof(std::uint64_t)) ||
+                                               (writable_ && ftruncate(file, sizeof(std::uint64_t)) == 0));
+    void* mapped = sized ? mmap(nullptr, sizeof(std::uint64_t), PROT_READ | (writable_ ? PROT_WRITE : 0),
+                                MAP_SHARED, file, 0)
+                         : MAP_FAILED;
+    close(file);
+    if (mapped != MAP_FAILED)
+        shared_ = static_cast<std::uint64_t*>(mapped);
+}
+
+void ChangeCounter::UseLocal() {
+    Release();
+    local_ = true;
+}
+
+void ChangeCounter::Release() {
+    if (shared_)
+        munmap(shared_, sizeof(std::uint64_t));
+    shared_ = nullptr;
+    writable_ = local_ = false;
+}
+
+std::optional<std::uint64_t> ChangeCounter::Stable() const {
+    static_assert(std::atomic_ref<std::uint64_t>::is_always_lock_free,
+                  "the counter is shared between processes");
+    std::uint64_t value = localValue_;
+    if (shared_)
+        value = std::atomic_ref<std::uint64_t>(*shared_).load(std::memory_order_acquire);
+    else if (!local_)
+        return std::nullopt;
+    if (value % 2 != 0)
+        return std::nullopt;
+    return value;
+}
+
+void ChangeCounter::BeforeCommit() {
+    if (local_) {
+        mine_ = ++localValue_ | 1;
+        localValue_ = mine_;
+        return;
+    }
+    if (!shared_ || !writable_)
+        return;
+    std::atomic_ref<std::uint64_t> counter(*shared_);
+    std::uint64_t value = counter.load(std::memory_order_acquire);
+    do
+        mine_ = value % 2 == 0 ? value + 1 : value + 2;
+    while (!counter.compare_exchange_weak(value, mine_, std::memory_order_acq_rel));
+}
+
+void ChangeCounter::AfterCommit() {
+    if (local_) {
+        localValue_ = mine_ + 1;
+        return;
+    }
+    if (!shared_ || !writable_)
+        return;
+    // Another writer that has moved it on since keeps it odd until its own commit is done.
+    std::uint64_t expected = mine_;
+    (void)std::atomic_ref<std::uint64_t>(*shared_).compare_exchange_strong(expected, mine_ + 1,
+                                                                           std::memory_order_acq_rel);
 }
 
 Statement::~Statement() {
@@ -176,6 +253,7 @@ void Store::Close() {
     refused_ = ERROR_SUCCESS;
     transactionOpen_ = false;
     counters_ = {};
+    counter_.Release();
 }
 
 Statement Store::Query(const char* sql) {
@@ -223,6 +301,13 @@ bool Store::ReadOnly() const {
     return sqlite3_db_readonly(db_, "main") == 1;
 }
 
+LONG Store::Commit() {
+    counter_.BeforeCommit();
+    LONG committed = Query("COMMIT").Run();
+    counter_.AfterCommit();
+    return committed;
+}
+
 LONG Store::Open() {
     path_ = RegistryStorePath();
     if (path_.empty())
@@ -249,6 +334,10 @@ LONG Store::Open() {
     LONG checked = CheckSchema();
     if (checked != ERROR_SUCCESS)
         return checked;
+    if (path_ == kInMemory)
+        counter_.UseLocal();
+    else
+        counter_.Map(path_ + "-changes");
     // Each commit reaches the disk before the call that made it returns.
     return Execute("PRAGMA synchronous = FULL");
 }
@@ -336,7 +425,7 @@ LONG Store::CommitTransaction() {
     if (!transactionOpen_)
         return ERROR_INVALID_FUNCTION;
     transactionOpen_ = false;
-    LONG committed = Execute("COMMIT");
+    LONG committed = Commit();
     if (committed != ERROR_SUCCESS && !sqlite3_get_autocommit(db_))
         (void)Execute("ROLLBACK"); // a commit that failed ends the transaction all the same
     return committed;
@@ -383,8 +472,7 @@ LONG WriteScope::Finish(LONG result) {
         return result;
     }
     open_ = false;
-    LONG committed =
-        store_.InTransaction() ? store_.Query("RELEASE call").Run() : store_.Query("COMMIT").Run();
+    LONG committed = store_.InTransaction() ? store_.Query("RELEASE call").Run() : store_.Commit();
     if (committed != ERROR_SUCCESS) {
         open_ = true;
         Undo();

@@ -4,6 +4,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <unordered_map>
@@ -55,6 +56,37 @@ private:
     bool stepped_ = false;
 };
 
+// A counter shared by every process that uses the store, in a small file mapped beside it, so that
+// a process can tell without a query whether anything was committed since it last read. Writers
+// make it odd just before a commit and even again after it; a process caches what it reads only
+// while the counter is even, and drops its cache when the counter moves. A writer that dies
+// between the two steps leaves it odd, and caching stays off until the next commit.
+class ChangeCounter {
+public:
+    ChangeCounter() = default;
+    ~ChangeCounter() { Release(); }
+    ChangeCounter(const ChangeCounter&) = delete;
+    ChangeCounter& operator=(const ChangeCounter&) = delete;
+
+    // Maps the file `path`, creating it when it can; without it nothing is cached.
+    void Map(const std::string& path);
+    // A counter of the process's own, for a store no other process sees.
+    void UseLocal();
+    void Release();
+
+    // The counter while no commit is on its way; nothing when reads must not be cached.
+    std::optional<std::uint64_t> Stable() const;
+    void BeforeCommit();
+    void AfterCommit();
+
+private:
+    std::uint64_t* shared_ = nullptr;
+    bool writable_ = false;
+    bool local_ = false;
+    std::uint64_t localValue_ = 0;
+    std::uint64_t mine_ = 0;
+};
+
 class Store {
 public:
     Store() = default;
@@ -80,6 +112,11 @@ public:
     std::uint64_t DataVersion();
 
     bool InTransaction() const { return transactionOpen_; }
+    // The change counter while what is read may be cached: no transaction of this process is
+    // open and no commit of any process is on its way.
+    std::optional<std::uint64_t> CacheableGeneration() const {
+        return transactionOpen_ ? std::nullopt : counter_.Stable();
+    }
     LONG BeginTransaction();
     LONG CommitTransaction();
     LONG RollbackTransaction();
@@ -98,6 +135,8 @@ private:
     LONG Refuse(LONG code, const std::string& reason);
     LONG Execute(const char* sql);
     bool ReadOnly() const;
+    // Runs COMMIT with the change counter stepped around it.
+    LONG Commit();
 
     sqlite3* db_ = nullptr;
     std::string path_;
@@ -105,6 +144,7 @@ private:
     bool transactionOpen_ = false;
     std::unordered_map<const char*, sqlite3_stmt*> statements_;
     RegistryStoreCounters counters_;
+    ChangeCounter counter_;
 };
 
 // The writes of one registry call: its own transaction, or a savepoint inside the store
