@@ -17,15 +17,18 @@ struct RegFileProblem {
     std::wstring message;
 };
 
-// Writes the key `keyPath` (a root, HKEY_LOCAL_MACHINE, HKEY_CLASSES_ROOT or HKEY_CURRENT_USER, or
-// their short forms HKLM, HKCR and HKCU, then the sub-key path after a backslash) with its values
-// and every key below it, as the bytes of a ".reg" file: UTF-16LE with a byte-order mark, the
+// Opens the key `keyPath`: a root, HKEY_LOCAL_MACHINE, HKEY_CLASSES_ROOT or HKEY_CURRENT_USER, or
+// their short forms HKLM, HKCR and HKCU, then the sub-key path after a backslash. An unknown root
+// answers ERROR_BAD_PATHNAME; other answers are RegOpenKeyExW's.
+UT_PLATFORM_API LONG OpenKeyPath(const wchar_t* keyPath, REGSAM access, HKEY* key);
+
+// Writes the key `keyPath` (named as for OpenKeyPath) with its values and every key below it, as
+// the bytes of a ".reg" file: UTF-16LE with a byte-order mark, the
 // header "Windows Registry Editor Version 5.00", lines ending in CR LF, each key followed by its
 // values in enumeration order and then its sub-keys. Text values that are one terminated string
 // without control characters are written quoted; REG_DWORD values of 4 bytes as dword:; every other
 // value as hex: (REG_BINARY) or hex(type):, wrapped at 80 columns, so that it reads back byte for
-// byte. An unknown root answers ERROR_BAD_PATHNAME, a missing key ERROR_FILE_NOT_FOUND; other
-// failures are the registry's.
+// byte. A missing key answers ERROR_FILE_NOT_FOUND; other failures are the registry's.
 UT_PLATFORM_API LONG ExportRegFile(const wchar_t* keyPath, std::string& bytes);
 
 // Applies the bytes of a ".reg" file: UTF-8 (with or without a byte-order mark) or UTF-16 (with

@@ -582,13 +582,25 @@ LONG ExportKey(HKEY key, const std::wstring& path, std::wstring& out) {
 
 } // namespace
 
-LONG ExportRegFile(const wchar_t* keyPath, std::string& bytes) {
+LONG OpenKeyPath(const wchar_t* keyPath, REGSAM access, HKEY* key) {
     try {
+        if (!key)
+            return ERROR_INVALID_PARAMETER;
+        *key = nullptr;
         std::optional<KeyPath> path = SplitKeyPath(keyPath ? keyPath : L"");
         if (!path)
             return ERROR_BAD_PATHNAME;
+        return RegOpenKeyExW(path->root->key, path->subKey.c_str(), 0, access, key);
+    } catch (const std::bad_alloc&) {
+        return ERROR_OUTOFMEMORY;
+    }
+}
+
+LONG ExportRegFile(const wchar_t* keyPath, std::string& bytes) {
+    try {
+        std::optional<KeyPath> path = SplitKeyPath(keyPath ? keyPath : L"");
         HKEY key = nullptr;
-        LONG result = RegOpenKeyExW(path->root->key, path->subKey.c_str(), 0, KEY_READ, &key);
+        LONG result = OpenKeyPath(keyPath, KEY_READ, &key);
         if (result != ERROR_SUCCESS)
             return result;
         UniqueHKey owned(key);
