@@ -84,17 +84,11 @@ IUnknown* FindFactory(REFCLSID clsid) {
 
 extern "C" {
 
-void* CoTaskMemAlloc(SIZE_T size) {
-    return std::malloc(size ? size : 1);
-}
+void* CoTaskMemAlloc(SIZE_T size) { return std::malloc(size ? size : 1); }
 
-void* CoTaskMemRealloc(void* block, SIZE_T size) {
-    return std::realloc(block, size ? size : 1);
-}
+void* CoTaskMemRealloc(void* block, SIZE_T size) { return std::realloc(block, size ? size : 1); }
 
-void CoTaskMemFree(void* block) {
-    std::free(block);
-}
+void CoTaskMemFree(void* block) { std::free(block); }
 
 int StringFromGUID2(REFGUID guid, LPOLESTR text, int capacity) {
     if (!text || capacity < kGuidTextLength + 1)
@@ -136,13 +130,9 @@ HRESULT CLSIDFromString(LPCOLESTR text, CLSID* clsid) {
     return S_OK;
 }
 
-HRESULT IIDFromString(LPCOLESTR text, IID* iid) {
-    return CLSIDFromString(text, iid);
-}
+HRESULT IIDFromString(LPCOLESTR text, IID* iid) { return CLSIDFromString(text, iid); }
 
-HRESULT CoInitializeEx(void*, DWORD) {
-    return S_OK;
-}
+HRESULT CoInitializeEx(void*, DWORD) { return S_OK; }
 
 void CoUninitialize() {}
 

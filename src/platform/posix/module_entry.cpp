@@ -7,9 +7,7 @@
 
 namespace {
 
-HINSTANCE ThisModule() {
-    return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisModule));
-}
+HINSTANCE ThisModule() { return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisModule)); }
 
 __attribute__((constructor)) void AttachModule() {
     HINSTANCE self = ThisModule();
@@ -23,8 +21,6 @@ __attribute__((constructor)) void AttachModule() {
                               L"); every call will answer E_UNEXPECTED");
 }
 
-__attribute__((destructor)) void DetachModule() {
-    ut::platform::OnModuleDetach();
-}
+__attribute__((destructor)) void DetachModule() { ut::platform::OnModuleDetach(); }
 
 } // namespace
