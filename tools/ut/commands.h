@@ -8,6 +8,10 @@ namespace CLI {
 class App;
 }
 
+namespace CLI {
+class App;
+}
+
 namespace ut::tool {
 
 // Exit statuses of every command.
@@ -31,5 +35,8 @@ void AddFramesCommand(CLI::App& app);
 void AddSortCommand(CLI::App& app);
 void AddHeaderCommand(CLI::App& app);
 void AddTimeCommand(CLI::App& app);
+
+// ut registry get | export | import.
+void AddRegistryCommand(CLI::App& app);
 
 } // namespace ut::tool

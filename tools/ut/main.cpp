@@ -26,7 +26,7 @@ void ReportLine(const std::string& message) {
 
 int main(int argc, char** argv) {
     CLI::App app("Try the ut utility library from a shell: frame patterns, name sorting, scene file "
-                 "headers, time conversion, and a tour of the library on its reference host.",
+                 "headers, time conversion, the registry, and a tour of the library on its reference host.",
                  "ut");
     app.set_version_flag("--version", "ut " UT_VERSION);
     app.require_subcommand(1);
@@ -35,6 +35,7 @@ int main(int argc, char** argv) {
                "  ls renders | ut sort                 render9.exr before render10.exr\n"
                "  ut header scene.mi --json            frame range, step, fields and names as JSON\n"
                "  ut time seconds-to-frame 2.5         the frame at 2.5 s in the scene's format\n"
+               "  ut registry export HKEY_CURRENT_USER\\Software\\ut out.reg   a branch as a .reg file\n"
                "  ut demo                              a tour of the library\n"
                "Run 'ut COMMAND --help' for the arguments of a command and an example.\n"
                "Exit status: 0 success, 1 the answer is no, 2 bad usage or unreadable input.");
@@ -43,6 +44,7 @@ int main(int argc, char** argv) {
     ut::tool::AddSortCommand(app);
     ut::tool::AddHeaderCommand(app);
     ut::tool::AddTimeCommand(app);
+    ut::tool::AddRegistryCommand(app);
 
     try {
         std::vector<std::string> arguments = ut::platform::Utf8Arguments(argc, argv);
