@@ -17,6 +17,8 @@
 
 #include <ut/compare.h>
 
+#include "support/rate_reporter.h"
+
 namespace {
 
 constexpr std::size_t kNames = 1'000'000;
@@ -104,19 +106,8 @@ void Register(const char* name, void (*run)(benchmark::State&)) {
 
 // The console output, followed by the median rate of each comparison, the spread of its
 // repetitions and its rate against strverscmp.
-class RatioReporter : public benchmark::ConsoleReporter {
+class RatioReporter : public ut::bench::RateReporter {
 public:
-    RatioReporter() : ConsoleReporter(OO_Tabular) {}
-
-    void ReportRuns(const std::vector<Run>& runs) override {
-        ConsoleReporter::ReportRuns(runs);
-        for (const Run& run : runs) {
-            auto rate = run.counters.find("items_per_second");
-            if (run.run_type == Run::RT_Iteration && !run.error_occurred && rate != run.counters.end())
-                rates_[run.run_name.function_name].push_back(rate->second.value);
-        }
-    }
-
     void Finalize() override {
         ConsoleReporter::Finalize();
         std::ostream& out = GetOutputStream();
@@ -133,6 +124,8 @@ public:
     }
 
 private:
+    void Record(const Run& run, double rate) override { rates_[run.run_name.function_name].push_back(rate); }
+
     static double Median(std::vector<double> rates) {
         if (rates.empty())
             return 0;

@@ -30,6 +30,8 @@ int main(int argc, char** argv) {
                  "ut");
     app.set_version_flag("--version", "ut " UT_VERSION);
     app.require_subcommand(1);
+    // Windows builds would otherwise take a path such as /tmp/scene.mi for an option.
+    app.allow_windows_style_options(false);
     app.footer("Examples:\n"
                "  ut frames expand shot.###.pic 7     prints shot.007.pic\n"
                "  ls renders | ut sort                 render9.exr before render10.exr\n"

@@ -106,8 +106,9 @@ UT_PLATFORM_API std::size_t MultibyteLength(const unsigned char* text);
 // decimal digit of the current multibyte encoding.
 UT_PLATFORM_API bool IsMultibyteDigit(unsigned int character);
 
-// _wtol and atol as Windows has them, where long is 32-bit: leading white space and a sign are
-// taken, parsing stops at the first non-digit, and values out of range saturate.
+// _wtol and atol with the 32-bit long of Windows: leading white space and a sign are taken,
+// parsing stops at the first non-digit, and values out of range saturate, as strtol does (some
+// Windows runtimes' atol wraps instead; these never do).
 UT_PLATFORM_API LONG WideToLong(const wchar_t* text);
 UT_PLATFORM_API LONG BytesToLong(const char* text);
 

@@ -3,10 +3,10 @@
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
-#include <mbctype.h>
-#include <mbstring.h>
 
 #include <ut/platform/strings.h>
+
+#include <mbstring.h> // last: the C runtime's multibyte headers define short macros
 
 namespace ut::platform {
 
@@ -47,12 +47,14 @@ bool IsMultibyteDigit(unsigned int character) {
     return _ismbcdigit(character) != 0;
 }
 
+// The older runtimes' atol wraps where _wtol saturates; strtol and wcstol saturate by the
+// standard, so both forms answer alike, here and on POSIX.
 LONG WideToLong(const wchar_t* text) {
-    return _wtol(text);
+    return std::wcstol(text, nullptr, 10);
 }
 
 LONG BytesToLong(const char* text) {
-    return std::atol(text);
+    return std::strtol(text, nullptr, 10);
 }
 
 } // namespace ut::platform
