@@ -1,4 +1,4 @@
-// Sorting a million generated file names with each comparison, side by side in one run:
+// Sorting generated file names with each comparison, side by side in one run:
 //   sort/F3Dwcsicmpnum, sort/F3Dstricmpnum, sort/F3Dmbsicmpnum   the library's comparisons
 //   sort/wcscmp                                                   plain wide comparison (no numbers, no case)
 //   sort/strverscmp                                               glibc's version order on the narrow form
@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <cstring>
 #include <cwchar>
+#include <functional>
 #include <iomanip>
 #include <map>
 #include <random>
@@ -76,9 +77,11 @@ const std::vector<const Char*>& Pointers() {
     return pointers;
 }
 
+// Sorts the first state.range(0) names.
 template <class Char, int (*Compare)(const Char*, const Char*)>
 void Sort(benchmark::State& state) {
-    const std::vector<const Char*>& names = Pointers<Char>();
+    const std::vector<const Char*>& all = Pointers<Char>();
+    const std::vector<const Char*> names(all.begin(), all.begin() + state.range(0));
     std::vector<const Char*> order;
     for (auto _ : state) {
         state.PauseTiming();
@@ -97,10 +100,13 @@ int Strverscmp(const char* a, const char* b) {
     return ::strverscmp(a, b);
 }
 
+// A million names, whose strings mostly miss the caches, and 50 000, whose strings mostly stay in
+// them, so that the table shows the cost of the memory apart from the cost of the comparison.
 void Register(const char* name, void (*run)(benchmark::State&)) {
     benchmark::RegisterBenchmark((std::string("sort/") + name).c_str(), run)
         ->Unit(benchmark::kMillisecond)
-        ->Iterations(1)
+        ->Arg(static_cast<std::int64_t>(kNames))
+        ->Arg(50'000)
         ->Repetitions(5);
 }
 
@@ -111,20 +117,27 @@ public:
     void Finalize() override {
         ConsoleReporter::Finalize();
         std::ostream& out = GetOutputStream();
-        double reference = Median(rates_["sort/strverscmp"]);
         out << "\nmillions of names sorted per second (median of the repetitions, min-max), against "
                "strverscmp\n";
         out << std::fixed;
-        for (auto& [name, rates] : rates_) {
-            std::sort(rates.begin(), rates.end());
-            out << std::left << std::setw(22) << name << std::right << std::setprecision(2) << std::setw(8)
-                << Median(rates) / 1e6 << "  (" << rates.front() / 1e6 << "-" << rates.back() / 1e6 << ")"
-                << std::setw(9) << (reference > 0 ? Median(rates) / reference : 0) << "x\n";
+        for (auto& [names, byComparison] : rates_) {
+            double reference = Median(byComparison["strverscmp"]);
+            for (auto& [comparison, rates] : byComparison) {
+                std::sort(rates.begin(), rates.end());
+                out << std::setw(8) << names << " names  " << std::left << std::setw(15) << comparison
+                    << std::right << std::setprecision(2) << std::setw(7) << Median(rates) / 1e6 << "  ("
+                    << rates.front() / 1e6 << "-" << rates.back() / 1e6 << ")" << std::setw(7)
+                    << (reference > 0 ? Median(rates) / reference : 0) << "x\n";
+            }
         }
     }
 
 private:
-    void Record(const Run& run, double rate) override { rates_[run.run_name.function_name].push_back(rate); }
+    // "sort/strverscmp" with argument "50000" is comparison "strverscmp" over 50000 names.
+    void Record(const Run& run, double rate) override {
+        std::string comparison = run.run_name.function_name.substr(run.run_name.function_name.find('/') + 1);
+        rates_[std::stol(run.run_name.args)][comparison].push_back(rate);
+    }
 
     static double Median(std::vector<double> rates) {
         if (rates.empty())
@@ -133,7 +146,7 @@ private:
         return rates[rates.size() / 2];
     }
 
-    std::map<std::string, std::vector<double>> rates_;
+    std::map<long, std::map<std::string, std::vector<double>>, std::greater<>> rates_;
 };
 
 } // namespace
@@ -143,12 +156,17 @@ int main(int argc, char** argv) {
     Pointers<char>();
     Pointers<unsigned char>();
     Pointers<wchar_t>();
-    // Alternating library and reference runs, so that a busy machine slows them alike.
     Register("strverscmp", Sort<char, Strverscmp>);
     Register("F3Dstricmpnum", Sort<char, F3Dstricmpnum>);
     Register("wcscmp", Sort<wchar_t, Wcscmp>);
     Register("F3Dwcsicmpnum", Sort<wchar_t, F3Dwcsicmpnum>);
     Register("F3Dmbsicmpnum", Sort<unsigned char, F3Dmbsicmpnum>);
+    // Repetitions of all comparisons in random order, so that a busy machine slows them alike.
+    std::vector<char*> arguments(argv, argv + argc);
+    char interleave[] = "--benchmark_enable_random_interleaving=true";
+    arguments.insert(arguments.begin() + 1, interleave);
+    argc = static_cast<int>(arguments.size());
+    argv = arguments.data();
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv))
         return 1;

@@ -92,12 +92,21 @@ struct FoldedDifference {
 };
 
 // The first position where the two strings fold apart and the sign of the folded difference
-// there; nothing when they end together, equal once folded. The walk folds through the locale's
-// table, so that names that differ in case only ("Shot" and "shot") cost no more than equal ones.
+// there; nothing when they end together, equal once folded. Equal characters are passed first;
+// where the strings differ in characters that fold to themselves, they are decided without the
+// locale. Otherwise the walk goes on folding through the locale's table, so that names that
+// differ in case only ("Shot" and "shot") cost little more than equal ones.
 template <class Char>
 std::optional<FoldedDifference> FoldApart(const Char* lhs, const Char* rhs, platform::CaseFolder& fold) {
+    std::size_t i = 0;
+    while (lhs[i] == rhs[i] && lhs[i] != 0)
+        ++i;
+    if (lhs[i] == rhs[i])
+        return std::nullopt;
+    if (platform::CaseFolder::FoldsToItself(Code(lhs[i])) && platform::CaseFolder::FoldsToItself(Code(rhs[i])))
+        return FoldedDifference{i, Code(lhs[i]) < Code(rhs[i]) ? -1 : 1};
     const platform::FoldTable table = fold.Table(Char());
-    for (std::size_t i = 0;; ++i) {
+    for (;; ++i) {
         const std::uint32_t left = Code(lhs[i]);
         const std::uint32_t right = Code(rhs[i]);
         std::uint32_t foldedLeft;

@@ -32,10 +32,9 @@ inline FoldTable ByteFoldTable() {
 }
 
 // The case folding of the comparisons below, for the span of one comparison: the lower-case form
-// that the current locale gives (towlower; tolower of the byte taken unsigned). No locale folds an
-// ASCII digit, punctuation mark, space or control character (only letters have cases), so those
-// are answered at once; other characters come from the fold table, asked once and only when a
-// letter needs folding, and what it does not hold from the C library.
+// that the current locale gives (towlower; tolower of the byte taken unsigned). ASCII other than
+// the upper-case letters is answered at once; other characters come from the fold table, asked
+// once and only when a character needs it, and what the table does not hold from the C library.
 class CaseFolder {
 public:
     std::uint32_t operator()(wchar_t c) {
@@ -72,10 +71,11 @@ public:
         return table_;
     }
 
+    // Only upper-case letters fold, and no locale takes an ASCII character other than A to Z
+    // for one (a to z are always lower case), so the rest of ASCII folds to itself.
+    static bool FoldsToItself(std::uint32_t code) { return code < 0x80 && !(code >= 'A' && code <= 'Z'); }
+
 private:
-    static bool FoldsToItself(std::uint32_t code) {
-        return code < 0x80 && !((code | 0x20) >= 'a' && (code | 0x20) <= 'z');
-    }
 
     // One folder folds one kind of text, so one table serves it.
     FoldTable table_;
