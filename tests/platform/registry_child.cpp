@@ -1,13 +1,12 @@
-// A second process for the POSIX registry tests and the interoperation check with the system's
-// registry editor: it writes, probes, exports and imports the store that UT_REGISTRY names.
-//
-//   registry_child write KEY COUNT       creates HKCU\KEY\key<i> with a default value, printing i
-//                                        once each key is in
-//   registry_child probe KEY             as an unprivileged user: tries a read and three writes
-//                                        below HKCU\KEY and prints their codes
-//   registry_child populate KEY          writes values of every type below HKCU\KEY
-//   registry_child export KEY FILE       exports HKCU\KEY to FILE
-//   registry_child import FILE           imports FILE
+// A second process for the POSIX registry tests and for the check against the system's registry
+// editor, on the store that UT_REGISTRY names:
+//   write KEY COUNT     prints its process id, then creates HKCU\KEY\key<i> with a default value
+//                       and prints i once each key is in
+//   probe KEY           as an unprivileged user: a read and three writes below HKCU\KEY, and
+//                       their codes
+//   populate KEY        every kind of value that any registry editor carries, below HKCU\KEY
+//   export KEY FILE     HKCU\KEY to FILE
+//   import FILE         FILE
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
@@ -23,70 +22,44 @@ namespace {
 
 using namespace ut::test;
 
-std::wstring Wide(const char* text) {
-    return ut::platform::WideFromUtf8(text);
-}
-
 int Write(const std::wstring& parent, long count) {
+    std::printf("%ld\n", static_cast<long>(getpid()));
     for (long i = 0; i < count; ++i) {
-        std::wstring path = parent + L"\\key" + std::to_wstring(i);
-        // The key and its value land together.
-        ut::platform::RegistryTransaction transaction;
-        ut::UniqueHKey key = CreateKey(HKEY_CURRENT_USER, path);
+        ut::platform::RegistryTransaction transaction; // the key and its value land together
+        ut::UniqueHKey key = CreateKey(HKEY_CURRENT_USER, parent + L"\\key" + std::to_wstring(i));
         LONG result =
             key ? SetText(key.get(), nullptr, L"value " + std::to_wstring(i)) : ERROR_FILE_NOT_FOUND;
-        if (result == ERROR_SUCCESS)
-            result = transaction.Commit();
-        if (result != ERROR_SUCCESS) {
-            std::printf("error %ld at %ld\n", static_cast<long>(result), i);
-            return 1;
-        }
+        if (result != ERROR_SUCCESS || (result = transaction.Commit()) != ERROR_SUCCESS)
+            return std::printf("error %ld\n", static_cast<long>(result)), 1;
         std::printf("%ld\n", i);
         std::fflush(stdout);
     }
     return 0;
 }
 
-// Drops root's rights first, so that file permissions apply as they do to a user.
 int Probe(const std::wstring& path) {
+    // Root is let through whatever a file's permissions say: drop to nobody first.
     constexpr uid_t kNobody = 65534;
-    if (geteuid() == 0 && (setgid(kNobody) != 0 || setuid(kNobody) != 0)) {
-        std::printf("cannot drop privileges\n");
-        return 1;
-    }
+    if (geteuid() == 0 && (setgid(kNobody) != 0 || setuid(kNobody) != 0))
+        return std::printf("cannot drop privileges\n"), 1;
     ut::UniqueHKey key = OpenKey(HKEY_CURRENT_USER, path, KEY_ALL_ACCESS);
     HKEY created = nullptr;
-    std::printf("read=%ld create=%ld set=%ld delete=%ld\n",
-                static_cast<long>(QueryValue(key.get(), L"v").result),
-                static_cast<long>(RegCreateKeyExW(key.get(), L"new", 0, nullptr, 0, KEY_ALL_ACCESS, nullptr,
-                                                  &created, nullptr)),
-                static_cast<long>(SetText(key.get(), L"v", L"changed")),
-                static_cast<long>(RegDeleteValueW(key.get(), L"v")));
+    LONG results[] = {
+        QueryValue(key.get(), L"v").result,
+        RegCreateKeyExW(key.get(), L"new", 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &created, nullptr),
+        SetText(key.get(), L"v", L"changed"), RegDeleteValueW(key.get(), L"v")};
+    std::printf("read=%ld create=%ld set=%ld delete=%ld\n", static_cast<long>(results[0]),
+                static_cast<long>(results[1]), static_cast<long>(results[2]), static_cast<long>(results[3]));
     return 0;
 }
 
 int Populate(const std::wstring& path) {
     ut::UniqueHKey key = CreateKey(HKEY_CURRENT_USER, path);
-    ut::UniqueHKey sub = CreateKey(HKEY_CURRENT_USER, path + L"\\sub key \"q\" \u00c4\\deeper");
-    if (!key || !sub)
-        return 1;
-    Bytes binary(200);
-    for (std::size_t i = 0; i < binary.size(); ++i)
-        binary[i] = static_cast<BYTE>(i * 13);
-    LONG results[] = {
-        SetText(key.get(), nullptr, L"the default"),
-        SetText(key.get(), L"with space", L"a \"quoted\" \\ back\\slash"),
-        SetText(key.get(), L"\u00c4pfel \u00e9t\u00e9", L"\u00df \u4e2d \U0001F3AC"),
-        SetValue(key.get(), L"expand", REG_EXPAND_SZ, TextBytes(L"%PATH%;\u00e9")),
-        SetValue(key.get(), L"multi", REG_MULTI_SZ, MultiBytes({L"one", L"two", L"\u00c4"})),
-        SetValue(key.get(), L"dword", REG_DWORD, LittleEndian(0xDEADBEEF, 4)),
-        SetValue(key.get(), L"qword", REG_QWORD, LittleEndian(0x0102030405060708, 8)),
-        SetValue(key.get(), L"binary", REG_BINARY, binary),
-        SetValue(key.get(), L"none", REG_NONE, Bytes{}),
-        SetValue(sub.get(), L"quote \" and back\\slash", REG_BINARY, Bytes{1, 2, 3}),
-    };
-    for (LONG result : results)
-        if (result != ERROR_SUCCESS)
+    ut::UniqueHKey deeper = CreateKey(HKEY_CURRENT_USER, path + L"\\sub key \"q\" \u00c4\\deeper");
+    for (const Sample& sample : EveryKindOfValue())
+        if (sample.anyEditor &&
+            (SetValue(key.get(), sample.name, sample.type, sample.data) != ERROR_SUCCESS ||
+             SetValue(deeper.get(), sample.name, sample.type, sample.data) != ERROR_SUCCESS))
             return 1;
     return 0;
 }
@@ -94,10 +67,8 @@ int Populate(const std::wstring& path) {
 int Export(const std::wstring& path, const char* file) {
     std::string bytes;
     LONG result = ut::platform::ExportRegFile((L"HKEY_CURRENT_USER\\" + path).c_str(), bytes);
-    if (result != ERROR_SUCCESS) {
-        std::fprintf(stderr, "export failed: %ld\n", static_cast<long>(result));
-        return 1;
-    }
+    if (result != ERROR_SUCCESS)
+        return std::fprintf(stderr, "export failed: %ld\n", static_cast<long>(result)), 1;
     std::ofstream(file, std::ios::binary) << bytes;
     return 0;
 }
@@ -107,11 +78,10 @@ int Import(const char* file) {
     std::string bytes((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
     ut::platform::RegFileProblem problem;
     LONG result = ut::platform::ImportRegFile(bytes.data(), bytes.size(), &problem);
-    if (result != ERROR_SUCCESS) {
-        std::fprintf(stderr, "import failed: %ld at line %u: %s\n", static_cast<long>(result), problem.line,
-                     Narrow(problem.message).c_str());
-        return 1;
-    }
+    if (result != ERROR_SUCCESS)
+        return std::fprintf(stderr, "import failed: %ld at line %u: %s\n", static_cast<long>(result),
+                            problem.line, Narrow(problem.message).c_str()),
+               1;
     return 0;
 }
 
@@ -119,14 +89,15 @@ int Import(const char* file) {
 
 int main(int argc, char** argv) {
     std::string command = argc > 1 ? argv[1] : "";
+    std::wstring key = argc > 2 ? ut::platform::WideFromUtf8(argv[2]) : std::wstring();
     if (command == "write" && argc == 4)
-        return Write(Wide(argv[2]), std::strtol(argv[3], nullptr, 10));
+        return Write(key, std::strtol(argv[3], nullptr, 10));
     if (command == "probe" && argc == 3)
-        return Probe(Wide(argv[2]));
+        return Probe(key);
     if (command == "populate" && argc == 3)
-        return Populate(Wide(argv[2]));
+        return Populate(key);
     if (command == "export" && argc == 4)
-        return Export(Wide(argv[2]), argv[3]);
+        return Export(key, argv[3]);
     if (command == "import" && argc == 3)
         return Import(argv[2]);
     std::fprintf(stderr, "usage: registry_child write|probe|populate|export|import ...\n");

@@ -66,12 +66,28 @@ public:
         return found == handles_.end() ? nullptr : &found->second;
     }
 
-    // The open key behind `key`, with the store ready to use.
-    LONG Target(HKEY key, OpenKey*& open) {
+    // The open key behind `key`, with the store ready to use and the handle's access including
+    // `needed`.
+    LONG Target(HKEY key, REGSAM needed, OpenKey*& open) {
         open = Find(key);
         if (!open)
             return ERROR_INVALID_HANDLE;
-        return store.Ready();
+        LONG ready = store.Ready();
+        if (ready != ERROR_SUCCESS)
+            return ready;
+        return (open->access & needed) == needed ? ERROR_SUCCESS : ERROR_ACCESS_DENIED;
+    }
+
+    // The key behind `key` and the names of the path below it.
+    LONG Resolve(HKEY key, const wchar_t* path, std::int64_t& id, std::vector<std::wstring_view>& names) {
+        LONG split = SplitPath(path, names);
+        if (split != ERROR_SUCCESS)
+            return split;
+        OpenKey* open = nullptr;
+        LONG found = Target(key, 0, open);
+        if (found == ERROR_SUCCESS)
+            id = open->id;
+        return found;
     }
 
     HKEY Add(std::int64_t id, REGSAM access) {
@@ -133,6 +149,50 @@ LONG Call(Body body) noexcept {
     }
 }
 
+// Runs `write(id)` in a write scope on the key `path` names below `key`.
+template <class Write>
+LONG WriteBelow(Registry& registry, HKEY key, const wchar_t* path, Write write) {
+    std::vector<std::wstring_view> names;
+    std::int64_t id = 0;
+    if (LONG resolved = registry.Resolve(key, path, id, names); resolved != ERROR_SUCCESS)
+        return resolved;
+    WriteScope scope(registry.store);
+    if (scope.Status() != ERROR_SUCCESS)
+        return scope.Status();
+    LONG found = Walk(registry.store, nullptr, id, names);
+    return scope.Finish(found == ERROR_SUCCESS ? write(id) : found);
+}
+
+// Runs `write(id)` in a write scope on the key behind `key`, which must allow setting values.
+template <class Write>
+LONG WriteValues(Registry& registry, HKEY key, Write write) {
+    OpenKey* open = nullptr;
+    if (LONG ready = registry.Target(key, KEY_SET_VALUE, open); ready != ERROR_SUCCESS)
+        return ready;
+    WriteScope scope(registry.store);
+    if (scope.Status() != ERROR_SUCCESS)
+        return scope.Status();
+    LONG touched = Touch(registry.store, open->id);
+    return scope.Finish(touched == ERROR_SUCCESS ? write(open->id) : touched);
+}
+
+// Hands value data out as the system does: the type and size always, the data when it and the
+// name fit, ERROR_MORE_DATA when either does not.
+LONG GiveData(DWORD valueType, const std::string& bytes, bool nameFits, LPDWORD type, LPBYTE data,
+              LPDWORD byteCount) {
+    auto size = static_cast<DWORD>(bytes.size());
+    LONG answer = ERROR_SUCCESS;
+    if (!nameFits || (data && *byteCount < size))
+        answer = ERROR_MORE_DATA;
+    else if (data)
+        CopyData(valueType, bytes, data, *byteCount);
+    if (type)
+        *type = valueType;
+    if (byteCount)
+        *byteCount = size;
+    return answer;
+}
+
 } // namespace
 } // namespace ut::platform::registry
 
@@ -154,12 +214,10 @@ LONG RegCreateKeyExW(HKEY key, LPCWSTR subKey, DWORD reserved, LPWSTR keyClass, 
         if (reserved)
             return ERROR_INVALID_PARAMETER;
         std::vector<std::wstring_view> names;
-        OpenKey* parent = nullptr;
-        if (LONG split = reg::SplitPath(subKey, names); split != ERROR_SUCCESS)
-            return split;
-        if (LONG ready = registry.Target(key, parent); ready != ERROR_SUCCESS)
-            return ready;
-        std::int64_t id = parent->id;
+        std::int64_t start = 0;
+        if (LONG resolved = registry.Resolve(key, subKey, start, names); resolved != ERROR_SUCCESS)
+            return resolved;
+        std::int64_t id = start;
         bool created = false;
         // Most calls open a key that exists: they need no write.
         LONG found = reg::Walk(registry.store, registry.Cached(), id, names);
@@ -167,7 +225,7 @@ LONG RegCreateKeyExW(HKEY key, LPCWSTR subKey, DWORD reserved, LPWSTR keyClass, 
             WriteScope scope(registry.store);
             if (scope.Status() != ERROR_SUCCESS)
                 return scope.Status();
-            id = parent->id;
+            id = start;
             found = scope.Finish(reg::CreatePath(registry.store, id, names, keyClass, created));
         }
         if (found != ERROR_SUCCESS)
@@ -190,12 +248,9 @@ LONG RegOpenKeyExW(HKEY key, LPCWSTR subKey, DWORD /*options*/, REGSAM access, P
             return ERROR_INVALID_PARAMETER;
         *result = nullptr;
         std::vector<std::wstring_view> names;
-        OpenKey* parent = nullptr;
-        if (LONG split = reg::SplitPath(subKey, names); split != ERROR_SUCCESS)
-            return split;
-        if (LONG ready = registry.Target(key, parent); ready != ERROR_SUCCESS)
-            return ready;
-        std::int64_t id = parent->id;
+        std::int64_t id = 0;
+        if (LONG resolved = registry.Resolve(key, subKey, id, names); resolved != ERROR_SUCCESS)
+            return resolved;
         if (LONG found = reg::Walk(registry.store, registry.Cached(), id, names); found != ERROR_SUCCESS)
             return found;
         *result = registry.Add(id, access);
@@ -220,52 +275,30 @@ LONG RegDeleteKeyW(HKEY key, LPCWSTR subKey) {
     return Call([&](Registry& registry) -> LONG {
         if (!subKey)
             return ERROR_INVALID_PARAMETER;
-        std::vector<std::wstring_view> names;
-        OpenKey* parent = nullptr;
-        if (LONG split = reg::SplitPath(subKey, names); split != ERROR_SUCCESS)
-            return split;
-        if (LONG ready = registry.Target(key, parent); ready != ERROR_SUCCESS)
-            return ready;
         reg::Store& store = registry.store;
-        WriteScope scope(store);
-        if (scope.Status() != ERROR_SUCCESS)
-            return scope.Status();
-        std::int64_t id = parent->id;
-        if (LONG found = reg::Walk(store, nullptr, id, names); found != ERROR_SUCCESS)
-            return scope.Finish(found);
-        if (id <= reg::kLocalMachineId)
-            return scope.Finish(ERROR_ACCESS_DENIED);
-        reg::Statement child = store.Query("SELECT 1 FROM keys WHERE parent = ?1 LIMIT 1");
-        int hasChild = child.Bind(1, id).Step();
-        if (hasChild != SQLITE_DONE)
-            return scope.Finish(hasChild == SQLITE_ROW ? ERROR_ACCESS_DENIED : reg::ErrorCode(hasChild));
-        LONG deleted = store.Query("DELETE FROM vals WHERE key = ?1").Bind(1, id).Run();
-        if (deleted == ERROR_SUCCESS)
-            deleted = store.Query("DELETE FROM keys WHERE id = ?1").Bind(1, id).Run();
-        return scope.Finish(deleted);
+        return reg::WriteBelow(registry, key, subKey, [&](std::int64_t id) -> LONG {
+            if (id <= reg::kLocalMachineId)
+                return ERROR_ACCESS_DENIED;
+            reg::Statement child = store.Query("SELECT 1 FROM keys WHERE parent = ?1 LIMIT 1");
+            int hasChild = child.Bind(1, id).Step();
+            if (hasChild != SQLITE_DONE)
+                return hasChild == SQLITE_ROW ? ERROR_ACCESS_DENIED : reg::ErrorCode(hasChild);
+            LONG deleted = store.Query("DELETE FROM vals WHERE key = ?1").Bind(1, id).Run();
+            return deleted == ERROR_SUCCESS ? store.Query("DELETE FROM keys WHERE id = ?1").Bind(1, id).Run()
+                                            : deleted;
+        });
     });
 }
 
 LONG RegDeleteTreeW(HKEY key, LPCWSTR subKey) {
-    return Call([&](Registry& registry) -> LONG {
-        std::vector<std::wstring_view> names;
-        OpenKey* parent = nullptr;
-        if (LONG split = reg::SplitPath(subKey, names); split != ERROR_SUCCESS)
-            return split;
-        if (LONG ready = registry.Target(key, parent); ready != ERROR_SUCCESS)
-            return ready;
-        reg::Store& store = registry.store;
-        WriteScope scope(store);
-        if (scope.Status() != ERROR_SUCCESS)
-            return scope.Status();
-        std::int64_t id = parent->id;
-        if (LONG found = reg::Walk(store, nullptr, id, names); found != ERROR_SUCCESS)
-            return scope.Finish(found);
+    return Call([&](Registry& registry) {
         // With a sub-key the key goes too; without one only what it holds.
         bool withKey = subKey != nullptr;
-        if (withKey && id <= reg::kLocalMachineId)
-            return scope.Finish(ERROR_ACCESS_DENIED);
-        return scope.Finish(reg::DeleteSubtree(store, id, withKey));
+        return reg::WriteBelow(registry, key, subKey, [&](std::int64_t id) {
+            if (withKey && id <= reg::kLocalMachineId)
+                return ERROR_ACCESS_DENIED;
+            return reg::DeleteSubtree(registry.store, id, withKey);
+        });
     });
 }
 
@@ -275,27 +308,13 @@ LONG RegQueryValueExW(HKEY key, LPCWSTR name, LPDWORD reserved, LPDWORD type, LP
         if ((data && !byteCount) || reserved)
             return ERROR_INVALID_PARAMETER;
         OpenKey* open = nullptr;
-        if (LONG ready = registry.Target(key, open); ready != ERROR_SUCCESS)
+        if (LONG ready = registry.Target(key, KEY_QUERY_VALUE, open); ready != ERROR_SUCCESS)
             return ready;
-        if (!(open->access & KEY_QUERY_VALUE))
-            return ERROR_ACCESS_DENIED;
         DWORD valueType = REG_NONE;
         std::string bytes;
         LONG found = reg::ReadValue(registry.store, registry.Cached(), open->id, reg::Fold(reg::NameOf(name)),
                                     valueType, bytes);
-        if (found != ERROR_SUCCESS)
-            return found;
-        auto size = static_cast<DWORD>(bytes.size());
-        LONG answer = ERROR_SUCCESS;
-        if (data && *byteCount < size)
-            answer = ERROR_MORE_DATA;
-        else if (data)
-            reg::CopyData(valueType, bytes, data, *byteCount);
-        if (type)
-            *type = valueType;
-        if (byteCount)
-            *byteCount = size;
-        return answer;
+        return found == ERROR_SUCCESS ? reg::GiveData(valueType, bytes, true, type, data, byteCount) : found;
     });
 }
 
@@ -307,52 +326,30 @@ LONG RegSetValueExW(HKEY key, LPCWSTR name, DWORD /*reserved*/, DWORD type, cons
         std::wstring_view valueName = reg::NameOf(name);
         if (valueName.size() > reg::kLongestValueName)
             return ERROR_INVALID_PARAMETER;
-        OpenKey* open = nullptr;
-        if (LONG ready = registry.Target(key, open); ready != ERROR_SUCCESS)
-            return ready;
-        if (!(open->access & KEY_SET_VALUE))
-            return ERROR_ACCESS_DENIED;
         std::string stored = reg::StoredForm(type, data, reg::KeptSize(type, data, byteCount));
-        reg::Store& store = registry.store;
-        WriteScope scope(store);
-        if (scope.Status() != ERROR_SUCCESS)
-            return scope.Status();
-        LONG written = reg::Touch(store, open->id);
-        if (written == ERROR_SUCCESS)
-            written =
-                store
-                    .Query("INSERT INTO vals(key, name, fold, type, data) VALUES(?1, ?2, ?3, ?4, ?5) "
-                           "ON CONFLICT(key, fold) DO UPDATE SET type = excluded.type, data = excluded.data")
-                    .Bind(1, open->id)
-                    .BindText(2, ut::platform::Utf8FromWide(valueName))
-                    .BindText(3, reg::Fold(valueName))
-                    .Bind(4, type)
-                    .BindBlob(5, stored)
-                    .Run();
-        return scope.Finish(written);
+        return reg::WriteValues(registry, key, [&](std::int64_t id) {
+            return registry.store
+                .Query("INSERT INTO vals(key, name, fold, type, data) VALUES(?1, ?2, ?3, ?4, ?5) "
+                       "ON CONFLICT(key, fold) DO UPDATE SET type = excluded.type, data = excluded.data")
+                .Bind(1, id)
+                .BindText(2, ut::platform::Utf8FromWide(valueName))
+                .BindText(3, reg::Fold(valueName))
+                .Bind(4, type)
+                .BindBlob(5, stored)
+                .Run();
+        });
     });
 }
 
 LONG RegDeleteValueW(HKEY key, LPCWSTR name) {
-    return Call([&](Registry& registry) -> LONG {
-        OpenKey* open = nullptr;
-        if (LONG ready = registry.Target(key, open); ready != ERROR_SUCCESS)
-            return ready;
-        if (!(open->access & KEY_SET_VALUE))
-            return ERROR_ACCESS_DENIED;
-        reg::Store& store = registry.store;
-        WriteScope scope(store);
-        if (scope.Status() != ERROR_SUCCESS)
-            return scope.Status();
-        LONG deleted = reg::Touch(store, open->id);
-        if (deleted == ERROR_SUCCESS)
-            deleted = store.Query("DELETE FROM vals WHERE key = ?1 AND fold = ?2")
-                          .Bind(1, open->id)
-                          .BindText(2, reg::Fold(reg::NameOf(name)))
-                          .Run();
-        if (deleted == ERROR_SUCCESS && store.Changes() == 0)
-            deleted = ERROR_FILE_NOT_FOUND;
-        return scope.Finish(deleted);
+    return Call([&](Registry& registry) {
+        return reg::WriteValues(registry, key, [&](std::int64_t id) {
+            LONG deleted = registry.store.Query("DELETE FROM vals WHERE key = ?1 AND fold = ?2")
+                               .Bind(1, id)
+                               .BindText(2, reg::Fold(reg::NameOf(name)))
+                               .Run();
+            return deleted == ERROR_SUCCESS && registry.store.Changes() == 0 ? ERROR_FILE_NOT_FOUND : deleted;
+        });
     });
 }
 
@@ -362,10 +359,8 @@ LONG RegEnumKeyExW(HKEY key, DWORD index, LPWSTR name, LPDWORD nameLength, LPDWO
         if (reserved || !name || !nameLength)
             return ERROR_INVALID_PARAMETER;
         OpenKey* open = nullptr;
-        if (LONG ready = registry.Target(key, open); ready != ERROR_SUCCESS)
+        if (LONG ready = registry.Target(key, KEY_ENUMERATE_SUB_KEYS, open); ready != ERROR_SUCCESS)
             return ready;
-        if (!(open->access & KEY_ENUMERATE_SUB_KEYS))
-            return ERROR_ACCESS_DENIED;
         reg::Entry entry;
         LONG found = reg::SubKeyAt(registry.store, registry.Cached(), open->id, open->subKeys, index, entry);
         if (found != ERROR_SUCCESS)
@@ -389,28 +384,16 @@ LONG RegEnumValueW(HKEY key, DWORD index, LPWSTR name, LPDWORD nameLength, LPDWO
         if (reserved || !name || !nameLength || (data && !byteCount))
             return ERROR_INVALID_PARAMETER;
         OpenKey* open = nullptr;
-        if (LONG ready = registry.Target(key, open); ready != ERROR_SUCCESS)
+        if (LONG ready = registry.Target(key, KEY_QUERY_VALUE, open); ready != ERROR_SUCCESS)
             return ready;
-        if (!(open->access & KEY_QUERY_VALUE))
-            return ERROR_ACCESS_DENIED;
         reg::Entry entry;
         LONG found = reg::ValueAt(registry.store, registry.Cached(), open->id, open->values, index, entry);
         if (found != ERROR_SUCCESS)
             return found;
         auto valueType = static_cast<DWORD>(entry.number);
-        std::string bytes = reg::HomeForm(valueType, entry.text);
-        auto size = static_cast<DWORD>(bytes.size());
-        // As the system does, the type and size are given even when the name or data do not fit.
-        LONG answer = ERROR_SUCCESS;
-        if (!reg::CopyName(entry.name, name, nameLength) || (data && *byteCount < size))
-            answer = ERROR_MORE_DATA;
-        else if (data)
-            reg::CopyData(valueType, bytes, data, *byteCount);
-        if (type)
-            *type = valueType;
-        if (byteCount)
-            *byteCount = size;
-        return answer;
+        bool nameFits = reg::CopyName(entry.name, name, nameLength);
+        return reg::GiveData(valueType, reg::HomeForm(valueType, entry.text), nameFits, type, data,
+                             byteCount);
     });
 }
 
@@ -422,10 +405,8 @@ LONG RegQueryInfoKeyW(HKEY key, LPWSTR keyClass, LPDWORD classLength, LPDWORD re
         if (reserved || (keyClass && !classLength))
             return ERROR_INVALID_PARAMETER;
         OpenKey* open = nullptr;
-        if (LONG ready = registry.Target(key, open); ready != ERROR_SUCCESS)
+        if (LONG ready = registry.Target(key, KEY_QUERY_VALUE, open); ready != ERROR_SUCCESS)
             return ready;
-        if (!(open->access & KEY_QUERY_VALUE))
-            return ERROR_ACCESS_DENIED;
         reg::Store& store = registry.store;
         reg::Statement self = store.Query("SELECT class, written FROM keys WHERE id = ?1");
         int result = self.Bind(1, open->id).Step();
@@ -479,7 +460,7 @@ LONG RegFlushKey(HKEY key) {
     // Every write already reached the disk when its call returned.
     return Call([&](Registry& registry) {
         OpenKey* open = nullptr;
-        return registry.Target(key, open);
+        return registry.Target(key, 0, open);
     });
 }
 
