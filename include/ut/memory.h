@@ -35,9 +35,13 @@ public:
     // Frees every block, kept or in use, and withdraws from the notification service.
     ~CMemoryPool();
     // A copy shares the blocks and the service of its original: it takes the list heads, the
-    // statistics and the service as they are. Only one of the two may then be destroyed.
-    CMemoryPool(const CMemoryPool&) = default;
-    CMemoryPool& operator=(const CMemoryPool&) = default;
+    // statistics and the service pointer as they are, without a reference of its own. Only one of
+    // the two may then be destroyed (the other is dropped without its destructor): the one that
+    // is destroyed frees the shared blocks and gives back the one reference to the service, so
+    // the service's count ends where it started. Assignment would orphan the target's own
+    // blocks and reference, so a pool cannot be assigned.
+    CMemoryPool(const CMemoryPool& other);
+    CMemoryPool& operator=(const CMemoryPool&) = delete;
 
     // A block of at least `size` bytes; a zero size is served as 16. Null for a negative size or
     // when the C runtime has no memory.
@@ -73,8 +77,8 @@ private:
     // Allocate when the pool is not registered or the class has no kept block.
     void* AllocateSlowPath(LONG size);
 
-    Descriptor* FreeLists[kSizeClasses] = {};
-    Descriptor* InUse = nullptr;
+    Descriptor* freeLists_[kSizeClasses] = {};
+    Descriptor* inUse_ = nullptr;
 
 public:
     // Statistics, valid right after Diagnostics: the number and summed capacity of the kept
@@ -88,5 +92,5 @@ public:
 
 private:
     // The service the pool is advised with, or null.
-    ut::ComPtr<IGWNotificationService> Notifier;
+    ut::ComPtr<IGWNotificationService> notifier_;
 };

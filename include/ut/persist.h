@@ -108,7 +108,8 @@ private:
     CUserDataBlock& operator=(const CUserDataBlock&) = delete;
 };
 
-UT_INTERFACE_ID(CUserDataBlock, IID_CUserDataBlock);
+template <>
+struct ut::InterfaceId<CUserDataBlock> : ut::Iid<IID_CUserDataBlock> {};
 
 // The user data blocks of one owner, created on first request and released with the collection.
 class UT_API CUserDataBlocks {
@@ -177,7 +178,8 @@ struct I3DStreamCompressor : IUnknown {
     virtual ~I3DStreamCompressor() = default;
 };
 
-UT_INTERFACE_ID(I3DStreamCompressor, IID_I3DStreamCompressor);
+template <>
+struct ut::InterfaceId<I3DStreamCompressor> : ut::Iid<IID_I3DStreamCompressor> {};
 
 // The compact encoding. The object that embeds it supplies QueryInterface, AddRef and Release,
 // and calls Init for each stream, PreRead before reading a stream whose header table travels
@@ -229,6 +231,8 @@ private:
 
     HRESULT PutChunkHeader(ULONG id, ULONG version);
     HRESULT GetChunkHeader(ULONG& id, ULONG& version, bool record);
+    // Drops the rows recorded after `lastKept` (by an open that then failed).
+    void ForgetRowsAfter(int lastKept);
 
     bool Packing(int kind) const { return active_ && kind; }
     HRESULT PushReadEnd(ULONGLONG end);
@@ -292,8 +296,9 @@ public:
     virtual HRESULT ChunkSafeWriteOpen(ULONG id, ULONG version);
 
 private:
-    HRESULT _ChunkWriteClose();
-    HRESULT _ChunkReadClose();
+    // The closes themselves, without the counting of open chunks.
+    HRESULT RawChunkWriteClose();
+    HRESULT RawChunkReadClose();
     HRESULT CountWriteOpen(HRESULT hr);
     HRESULT CountReadOpen(HRESULT hr);
     HRESULT CountClose(HRESULT hr);

@@ -1,3 +1,4 @@
+// The reference host's active database: the mode it reports.
 #include "active_database.h"
 
 #include <ut/sdk/objects.h>
@@ -7,7 +8,7 @@ namespace ut::host {
 
 std::span<const CGWCOMObject::InterfaceEntry> ActiveDatabase::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        UT_INTERFACE_ENTRY(ActiveDatabase, IGWActiveDatabase, IID_IGWActiveDatabase)};
+        ut::sdk::Entry<ActiveDatabase, IGWActiveDatabase>(IID_IGWActiveDatabase)};
     return map;
 }
 

@@ -7,11 +7,10 @@
 
 namespace ut::host {
 
-class ActiveDatabase final : public CGWCOMObject, public IGWActiveDatabase {
+class ActiveDatabase final : public ut::sdk::ComObject<IGWActiveDatabase> {
 public:
     explicit ActiveDatabase(const Settings& settings) : mode_(settings.activeDatabaseMode) {}
 
-    UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
 
     HRESULT STDMETHODCALLTYPE GetCurrentMode(ULONG* mode) override;

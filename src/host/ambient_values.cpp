@@ -1,7 +1,9 @@
+// The reference host's ambient values, read and written by name.
 #include "ambient_values.h"
 
 #include <new>
 
+#include <ut/platform/detail/boundary.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/testing.h>
 
@@ -13,7 +15,7 @@ AmbientValues::AmbientValues(const Settings& settings)
 
 std::span<const CGWCOMObject::InterfaceEntry> AmbientValues::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        UT_INTERFACE_ENTRY(AmbientValues, IGWAmbientValues, IID_IGWAmbientValues)};
+        ut::sdk::Entry<AmbientValues, IGWAmbientValues>(IID_IGWAmbientValues)};
     return map;
 }
 
@@ -57,13 +59,11 @@ HRESULT AmbientValues::Write(std::string_view operation, const wchar_t* name, LO
         return E_POINTER;
     if (HRESULT hr = ut::sdk::CheckHostFault(operation); FAILED(hr))
         return hr;
-    try {
+    return ut::ExportBoundary([&] {
         std::lock_guard lock(mutex_);
         values_.insert_or_assign(std::wstring(name), value);
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
-    return S_OK;
+        return S_OK;
+    });
 }
 
 } // namespace ut::host

@@ -15,11 +15,10 @@
 
 namespace ut::host {
 
-class AmbientValues final : public CGWCOMObject, public IGWAmbientValues {
+class AmbientValues final : public ut::sdk::ComObject<IGWAmbientValues> {
 public:
     explicit AmbientValues(const Settings& settings);
 
-    UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
 
     HRESULT STDMETHODCALLTYPE GetBool(const wchar_t* name, BOOL* value) override;

@@ -1,3 +1,4 @@
+// The reference host's notification service: sinks advised by name, re-entrant broadcasts.
 #include "notification_service.h"
 
 #include <algorithm>
@@ -15,7 +16,7 @@ auto FindSink(Sinks& sinks, IGwNotifySink* sink) {
 
 std::span<const CGWCOMObject::InterfaceEntry> NotificationService::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        UT_INTERFACE_ENTRY(NotificationService, IGWNotificationService, IID_IGWNotificationService)};
+        ut::sdk::Entry<NotificationService, IGWNotificationService>(IID_IGWNotificationService)};
     return map;
 }
 

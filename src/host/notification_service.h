@@ -13,12 +13,11 @@
 
 namespace ut::host {
 
-class NotificationService final : public CGWCOMObject, public IGWNotificationService {
+class NotificationService final : public ut::sdk::ComObject<IGWNotificationService> {
 public:
     // Nothing in the settings concerns notifications.
     explicit NotificationService(const Settings&) {}
 
-    UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
 
     HRESULT STDMETHODCALLTYPE Advise(const wchar_t* name, IGwNotifySink* sink) override;

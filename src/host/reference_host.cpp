@@ -1,3 +1,4 @@
+// Installs the reference host's services and revokes them again.
 #include <ut/host/reference_host.h>
 
 #include <new>

@@ -1,3 +1,4 @@
+// The reference host's version-information object.
 #include "version_info.h"
 
 #include <cwchar>
@@ -11,7 +12,7 @@ VersionInfo::VersionInfo(const Settings& settings)
     : strings_{settings.productName, settings.build, settings.major} {}
 
 std::span<const CGWCOMObject::InterfaceEntry> VersionInfo::GetInterfaceMap() const {
-    static const InterfaceEntry map[] = {UT_INTERFACE_ENTRY(VersionInfo, IGWVersionInfo, IID_IGWVersionInfo)};
+    static const InterfaceEntry map[] = {ut::sdk::Entry<VersionInfo, IGWVersionInfo>(IID_IGWVersionInfo)};
     return map;
 }
 

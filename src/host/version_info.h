@@ -11,11 +11,10 @@
 
 namespace ut::host {
 
-class VersionInfo final : public CGWCOMObject, public IGWVersionInfo {
+class VersionInfo final : public ut::sdk::ComObject<IGWVersionInfo> {
 public:
     explicit VersionInfo(const Settings& settings);
 
-    UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
 
     HRESULT STDMETHODCALLTYPE GetVersionString(ULONG index, wchar_t** text) override;

@@ -1,5 +1,8 @@
+// CMemoryPool: size-classed free lists over the C runtime, emptied on state changes.
+#include <algorithm>
 #include <cstdlib>
 #include <cwchar>
+#include <iterator>
 #include <memory>
 
 #include <ut/memory.h>
@@ -136,9 +139,18 @@ using namespace ut::memory;
 
 CMemoryPool::CMemoryPool() = default;
 
+CMemoryPool::CMemoryPool(const CMemoryPool& other)
+    : IGwNotifySink(other), inUse_(other.inUse_), InUseBytes(other.InUseBytes), InUseCount(other.InUseCount),
+      TotalFreeBytes(other.TotalFreeBytes), TotalFreeCount(other.TotalFreeCount),
+      notifier_(ut::ComPtr<IGWNotificationService>::Adopt(other.notifier_.Get())) {
+    std::copy(std::begin(other.freeLists_), std::end(other.freeLists_), freeLists_);
+    std::copy(std::begin(other.FreeBytes), std::end(other.FreeBytes), FreeBytes);
+    std::copy(std::begin(other.FreeCounts), std::end(other.FreeCounts), FreeCounts);
+}
+
 CMemoryPool::~CMemoryPool() {
     Purge();
-    FreeList(InUse);
+    FreeList(inUse_);
     Unregister();
 }
 
@@ -146,9 +158,9 @@ void* CMemoryPool::Allocate(LONG size) {
     // The pooled path (registered, and a block of the class is kept) makes no call at all.
     ULONG request = Request(size);
     ULONG sizeClass = SizeClass(request);
-    if (sizeClass >= kSizeClasses || !Notifier || !FreeLists[sizeClass]) [[unlikely]]
+    if (sizeClass >= kSizeClasses || !notifier_ || !freeLists_[sizeClass]) [[unlikely]]
         return AllocateSlowPath(size);
-    return HandOut(InUse, TakeFirst(FreeLists[sizeClass], request));
+    return HandOut(inUse_, TakeFirst(freeLists_[sizeClass], request));
 }
 
 void* CMemoryPool::AllocateSlowPath(LONG size) {
@@ -157,10 +169,10 @@ void* CMemoryPool::AllocateSlowPath(LONG size) {
     Register();
     ULONG request = Request(size);
     ULONG sizeClass = SizeClass(request);
-    if (sizeClass < kSizeClasses && FreeLists[sizeClass])
-        return HandOut(InUse, TakeFirst(FreeLists[sizeClass], request));
+    if (sizeClass < kSizeClasses && freeLists_[sizeClass])
+        return HandOut(inUse_, TakeFirst(freeLists_[sizeClass], request));
     Descriptor* descriptor = NewBlock(request);
-    return descriptor ? HandOut(InUse, descriptor) : nullptr;
+    return descriptor ? HandOut(inUse_, descriptor) : nullptr;
 }
 
 void* CMemoryPool::Reallocate(void* p, LONG size) {
@@ -190,26 +202,26 @@ void CMemoryPool::Deallocate(void* p) {
     if (!p)
         return;
     Descriptor* descriptor = DescriptorOf(p);
-    Unlink(InUse, descriptor);
+    Unlink(inUse_, descriptor);
     if (descriptor->Capacity > static_cast<ULONG>(kLargestPooled)) {
         FreeBlock(descriptor);
         return;
     }
     // The class of the last size asked for, not of the capacity: a block grown in place to a
     // small size waits on that size's list.
-    PushFront(FreeLists[SizeClass(descriptor->Size)], descriptor);
+    PushFront(freeLists_[SizeClass(descriptor->Size)], descriptor);
     descriptor->Size = 0;
 }
 
 void CMemoryPool::Purge() {
-    for (Descriptor*& head : FreeLists)
+    for (Descriptor*& head : freeLists_)
         FreeList(head);
 }
 
 void CMemoryPool::Diagnostics() {
     InUseBytes = 0;
     InUseCount = 0;
-    for (const Descriptor* descriptor = InUse; descriptor; descriptor = descriptor->Next) {
+    for (const Descriptor* descriptor = inUse_; descriptor; descriptor = descriptor->Next) {
         InUseBytes += descriptor->Capacity;
         ++InUseCount;
     }
@@ -218,7 +230,8 @@ void CMemoryPool::Diagnostics() {
     for (int sizeClass = 0; sizeClass < kSizeClasses; ++sizeClass) {
         FreeBytes[sizeClass] = 0;
         FreeCounts[sizeClass] = 0;
-        for (const Descriptor* descriptor = FreeLists[sizeClass]; descriptor; descriptor = descriptor->Next) {
+        for (const Descriptor* descriptor = freeLists_[sizeClass]; descriptor;
+             descriptor = descriptor->Next) {
             FreeBytes[sizeClass] += descriptor->Capacity;
             ++FreeCounts[sizeClass];
         }
@@ -228,7 +241,7 @@ void CMemoryPool::Diagnostics() {
 }
 
 void CMemoryPool::Register() {
-    if (Notifier)
+    if (notifier_)
         return;
     ut::ComPtr<IGWNotificationService> service;
     if (FAILED(
@@ -236,14 +249,15 @@ void CMemoryPool::Register() {
         return;
     if (FAILED(service->Advise(ut::sdk::kAppStateChange, this)))
         return;
-    Notifier = std::move(service);
+    notifier_ = std::move(service);
 }
 
 void CMemoryPool::Unregister() {
     // Cleared before the call, so that a notification arriving meanwhile finds the pool withdrawn.
-    ut::ComPtr<IGWNotificationService> service = std::move(Notifier);
+    ut::ComPtr<IGWNotificationService> service = std::move(notifier_);
     if (service)
-        service->Unadvise(ut::sdk::kAppStateChange, this);
+        (void)service->Unadvise(ut::sdk::kAppStateChange,
+                                this); // withdrawn either way: the service is let go
 }
 
 ULONG CMemoryPool::AddRef() {

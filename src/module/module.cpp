@@ -1,9 +1,8 @@
 // The library's load and unload steps.
+#include <ut/detail/names.h>
 #include <ut/platform/module_entry.h>
 #include <ut/platform/process.h>
 #include <ut/sdk/resources.h>
-
-#include <ut/detail/names.h>
 
 #include "module/state.h"
 
@@ -17,34 +16,30 @@ State& MutableState() {
     return *state;
 }
 
-constexpr int kRegistryKeyCapacity = ut::kPathCapacity;
-
 } // namespace
 
-const State& Current() { return MutableState(); }
+const State& Current() {
+    return MutableState();
+}
 
-} // namespace ut::module
-
-namespace ut::platform {
-
-HRESULT OnModuleAttach(HINSTANCE self) {
-    ut::module::State& state = ut::module::MutableState();
+HRESULT OnAttach(HINSTANCE self) {
+    State& state = MutableState();
     state = {};
     state.instance = self;
-    if (HRESULT hr = KXDictRegisterInstance(self, ut::kDictionaryName); FAILED(hr))
+    if (HRESULT hr = KXDictRegisterInstance(self, kDictionaryName); FAILED(hr))
         return hr;
-    wchar_t key[ut::module::kRegistryKeyCapacity];
-    if (LONG error = GWResourceConstructRegKey(self, L"", key, ut::module::kRegistryKeyCapacity); error != ERROR_SUCCESS)
+    wchar_t key[kPathCapacity];
+    if (LONG error = GWResourceConstructRegKey(self, L"", key, kPathCapacity); error != ERROR_SUCCESS)
         return HRESULT_FROM_WIN32(static_cast<DWORD>(error));
     state.baseKey = key;
-    state.streamCompressionDisabled = HasEnvironmentVariable("KX_DISABLE_STREAM_COMPRESSION");
+    state.streamCompressionDisabled = ut::platform::HasEnvironmentVariable("KX_DISABLE_STREAM_COMPRESSION");
     state.loaded = true;
     return S_OK;
 }
 
-void OnModuleDetach() {
-    KXDictUnregisterInstance(ut::kDictionaryName);
-    ut::module::MutableState().loaded = false;
+void OnDetach() {
+    (void)KXDictUnregisterInstance(kDictionaryName); // S_FALSE when it was never registered: nothing to undo
+    MutableState().loaded = false;
 }
 
-} // namespace ut::platform
+} // namespace ut::module

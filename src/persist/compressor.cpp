@@ -1,7 +1,9 @@
+// C3DStreamCompressor: packed integers and doubles, and chunk headers as table indexes.
 #include <cwchar>
 #include <new>
 
 #include <ut/persist.h>
+#include <ut/platform/detail/boundary.h>
 #include <ut/sdk/ambient.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/version.h>
@@ -71,11 +73,12 @@ HRESULT C3DStreamCompressor::Init(IStream* stream, int tableMode, int) {
     helper_.reset();
     buffer_ = nullptr;
     tableMode_ = tableMode;
-    try {
-        helper_ = std::make_shared<CGWStreamHelper>(stream);
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
+    if (HRESULT hr = ut::ExportBoundary([&] {
+            helper_ = std::make_shared<CGWStreamHelper>(stream);
+            return S_OK;
+        });
+        FAILED(hr))
+        return hr;
     buffer_ = &helper_->Buffer();
     if (!stream)
         return S_OK;
@@ -91,16 +94,21 @@ HRESULT C3DStreamCompressor::Init(IStream* stream, int tableMode, int) {
     streamName_ = name.get();
 
     if (stat.cbSize.QuadPart == 0) {
-        if (ut::module::Current().streamCompressionDisabled)
+        // Switched off for new streams: a compressor rebound from a compact stream must not keep
+        // writing compact values onto a stream that carries no marker.
+        if (ut::module::Current().streamCompressionDisabled) {
+            active_ = 0;
             return S_OK;
-        helper_->ChunkWriteOpen(kMarkerId, kMarkerVersion);
-        helper_->ChunkWriteClose();
+        }
+        // Into the window: a stream that refuses the bytes says so when the window is written back.
+        (void)helper_->ChunkWriteOpen(kMarkerId, kMarkerVersion);
+        (void)helper_->ChunkWriteClose();
         active_ = 1;
         return S_OK;
     }
     ULONG version = 0;
     if (helper_->ChunkReadOpen(kMarkerId, &version) == S_OK) {
-        helper_->ChunkReadClose();
+        (void)helper_->ChunkReadClose(); // an empty chunk: nothing to step over
         active_ = 1;
     } else {
         active_ = 0;
@@ -194,7 +202,7 @@ HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, ULONG& 
         return S_OK;
     }
     BYTE bytes[kDecodeWindow] = {};
-    buffer.ReadValue(bytes[0]); // unchecked: a missing tag stays 0, which no form has
+    (void)buffer.ReadValue(bytes[0]); // a missing tag stays 0, which no form has
     if (bytes[0] < lowestTag)
         return E_FAIL;
     if (HRESULT hr = buffer.Read(bytes + 1, ut::persist::PayloadBytes(bytes[0])); FAILED(hr))
@@ -210,7 +218,7 @@ HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
         return length ? S_OK : E_FAIL;
     }
     BYTE bytes[kDecodeWindow] = {};
-    buffer.ReadValue(bytes[0]); // unchecked, as above
+    (void)buffer.ReadValue(bytes[0]); // as above
     double probe = 0;
     ULONG length = ut::persist::UnpackDouble(bytes, probe);
     if (!length)
@@ -394,44 +402,48 @@ HRESULT C3DStreamCompressor::GetChunkHeader(ULONG& id, ULONG& version, bool reco
 // Chunks.
 
 HRESULT C3DStreamCompressor::PushReadEnd(ULONGLONG end) {
-    try {
+    return ut::ExportBoundary([&] {
         readEnds_.push_back(end);
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
-    return S_OK;
+        return S_OK;
+    });
 }
 
 HRESULT C3DStreamCompressor::PushWriteStart() {
-    try {
+    return ut::ExportBoundary([&] {
         writeStarts_.push_back(buffer_->Position());
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
-    return S_OK;
+        return S_OK;
+    });
 }
 
 HRESULT C3DStreamCompressor::ChunkWriteOpen(ULONG id, ULONG version) {
     if (!active_)
         return STG_E_OLDFORMAT;
     ut::sdk::Rewind rewind(*buffer_);
+    const int rowsBefore = lastIndex_;
     HRESULT hr = PutChunkHeader(id, version);
     if (SUCCEEDED(hr))
         hr = buffer_->WriteValue(ULONG{0});
     if (SUCCEEDED(hr))
         hr = PushWriteStart();
+    if (FAILED(hr))
+        ForgetRowsAfter(rowsBefore); // their definitions are rewound with the rest
     return rewind(hr);
 }
 
+void C3DStreamCompressor::ForgetRowsAfter(int lastKept) {
+    for (int row = lastKept + 1; row <= lastIndex_; ++row)
+        headerTable_[row] = {};
+    lastIndex_ = lastKept;
+}
+
+// Only running out of memory is reported: a failed header write shows at the chunk's close and
+// at the stream's flush, as it does for every other value written.
 HRESULT C3DStreamCompressor::ChunkSafeWriteOpen(ULONG id, ULONG version) {
     if (!active_)
         return STG_E_OLDFORMAT;
-    ut::sdk::Rewind rewind(*buffer_);
     ULONG header[3] = {id, version, 0};
-    HRESULT hr = buffer_->WriteValue(header);
-    if (SUCCEEDED(hr))
-        hr = PushWriteStart();
-    return rewind(hr);
+    (void)buffer_->WriteValue(header); // see above
+    return PushWriteStart();
 }
 
 HRESULT C3DStreamCompressor::ChunkWriteClose() {
@@ -444,9 +456,10 @@ HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
     if (!active_)
         return STG_E_OLDFORMAT;
     ut::sdk::Rewind rewind(*buffer_);
+    // A header that cannot be read reports an id of its own, so that a reader probing for an
+    // optional last chunk is told "another chunk" at the end of the stream too.
     ULONG foundId = 0, foundVersion = 0;
-    if (HRESULT hr = GetChunkHeader(foundId, foundVersion, true); FAILED(hr))
-        return rewind(hr);
+    (void)GetChunkHeader(foundId, foundVersion, true);
     if (foundId != id)
         return rewind(STG_E_INVALIDHEADER);
     ULONG size = 0;
@@ -459,17 +472,18 @@ HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
     return S_OK;
 }
 
-// Reads of the plain header go unchecked: a header cut short reads as zeros.
+// Reads of the plain header go unchecked: a header cut short reads as zeros, which the id
+// comparison and the later reads of the body then refuse.
 HRESULT C3DStreamCompressor::ChunkSafeReadOpen(ULONG id, ULONG* version) {
     if (!active_)
         return STG_E_OLDFORMAT;
     ut::sdk::Rewind rewind(*buffer_);
     ULONG foundId = 0, foundVersion = 0, size = 0;
-    buffer_->ReadValue(foundId);
+    (void)buffer_->ReadValue(foundId);
     if (foundId != id)
         return rewind(STG_E_INVALIDHEADER);
-    buffer_->ReadValue(foundVersion);
-    buffer_->ReadValue(size);
+    (void)buffer_->ReadValue(foundVersion);
+    (void)buffer_->ReadValue(size);
     if (HRESULT hr = PushReadEnd(buffer_->Position() + size); FAILED(hr))
         return rewind(hr);
     if (version)

@@ -39,7 +39,7 @@ HRESULT LoadFeaturesVersion(Reader& reader) {
         if (feature < eFeaturesVersionCount)
             g_uiFeaturesVersion[feature][eFeatureLoaded] = loaded;
     }
-    reader.ChunkReadClose();
+    (void)reader.ChunkReadClose(); // the table is read; whatever follows is the caller's
     return S_OK;
 }
 

@@ -1,3 +1,4 @@
+// The feature-version table and its chunk.
 #include <ut/persist.h>
 
 #include "module/state.h"

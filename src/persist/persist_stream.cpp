@@ -7,7 +7,7 @@
 
 #include <ut/persist.h>
 #include <ut/sdk/comobject.h>
-#include <ut/sdk/stream_buffer.h>
+#include <ut/sdk/detail/stream_buffer.h>
 
 #include "module/state.h"
 
@@ -18,7 +18,7 @@ namespace {
 constexpr IID IID_PersistStream = {
     0x0D7B3C52, 0x41E6, 0x4C0A, {0x9F, 0x1B, 0x6A, 0x2E, 0x8D, 0x5C, 0x7B, 0x13}};
 
-class PersistStream final : public CGWCOMObject, public IStream, public IGWStreamBufferSource {
+class PersistStream final : public ut::sdk::ComObject<IStream, IGWStreamBufferSource> {
 public:
     // The compressor, embedded: its identity and lifetime are the stream object's.
     class EmbeddedCompressor final : public C3DStreamCompressor {
@@ -37,19 +37,17 @@ public:
     PersistStream(ComPtr<IStream> buffered, ComPtr<IStream> table, bool saving)
         : buffered_(std::move(buffered)), table_(std::move(table)), saving_(saving), compressor_(*this) {
         ComPtr<IGWStreamBufferSource> source;
-        buffered_->QueryInterface(IID_IGWStreamBufferSource, source.PutVoid());
+        (void)buffered_->QueryInterface(IID_IGWStreamBufferSource, source.PutVoid()); // ours: always answers
         buffer_ = source->GetStreamBuffer();
     }
 
-    UT_COM_OBJECT_IUNKNOWN()
-
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
         static const InterfaceEntry map[] = {
-            UT_INTERFACE_ENTRY(PersistStream, IStream, IID_IStream),
-            UT_INTERFACE_ENTRY(PersistStream, IStream, IID_ISequentialStream),
-            UT_INTERFACE_ENTRY(PersistStream, IGWStreamBufferSource, IID_IGWStreamBufferSource),
-            UT_INTERFACE_ENTRY(PersistStream, IStream, IID_IGWChunkCountingStream),
-            UT_INTERFACE_ENTRY(PersistStream, PersistStream, IID_PersistStream),
+            ut::sdk::Entry<PersistStream, IStream>(IID_IStream),
+            ut::sdk::Entry<PersistStream, IStream>(IID_ISequentialStream),
+            ut::sdk::Entry<PersistStream, IGWStreamBufferSource>(IID_IGWStreamBufferSource),
+            ut::sdk::Entry<PersistStream, IStream>(IID_IGWChunkCountingStream),
+            ut::sdk::Entry<PersistStream, PersistStream>(IID_PersistStream),
             {&IID_I3DStreamCompressor, &CompressorOf},
         };
         return map;

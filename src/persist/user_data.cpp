@@ -1,6 +1,8 @@
+// User data blocks: CUserDataBlock and the CUserDataBlocks collection.
 #include <new>
 
 #include <ut/persist.h>
+#include <ut/platform/detail/boundary.h>
 #include <ut/sdk/objects.h>
 
 HRESULT CUserDataBlock::QueryInterface(REFIID iid, void** object) {
@@ -81,11 +83,12 @@ HRESULT CUserDataBlocks::GetBlock(const eUserDataBlockType& type, CUserDataBlock
     ut::ComPtr<CUserDataBlock> created;
     if (HRESULT hr = KXCreateInstance(clsid, IID_CUserDataBlock, created.PutVoid()); FAILED(hr))
         return hr;
-    try {
-        blocks_.emplace(type, created);
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
+    if (HRESULT hr = ut::ExportBoundary([&] {
+            blocks_.emplace(type, created);
+            return S_OK;
+        });
+        FAILED(hr))
+        return hr;
     *block = created.Get();
     return S_FALSE;
 }

@@ -1,3 +1,4 @@
+// Access to the host's ambient values manager.
 #include <ut/sdk/ambient.h>
 #include <ut/sdk/objects.h>
 

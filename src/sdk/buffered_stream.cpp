@@ -3,22 +3,20 @@
 #include <new>
 
 #include <ut/sdk/comobject.h>
-#include <ut/sdk/stream_buffer.h>
+#include <ut/sdk/detail/stream_buffer.h>
 
 namespace ut::sdk {
 namespace {
 
-class BufferedStream final : public CGWCOMObject, public IStream, public IGWStreamBufferSource {
+class BufferedStream final : public ut::sdk::ComObject<IStream, IGWStreamBufferSource> {
 public:
     explicit BufferedStream(IStream* inner) : buffer_(inner) {}
 
-    UT_COM_OBJECT_IUNKNOWN()
-
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
         static const InterfaceEntry map[] = {
-            UT_INTERFACE_ENTRY(BufferedStream, IStream, IID_IStream),
-            UT_INTERFACE_ENTRY(BufferedStream, IStream, IID_ISequentialStream),
-            UT_INTERFACE_ENTRY(BufferedStream, IGWStreamBufferSource, IID_IGWStreamBufferSource),
+            ut::sdk::Entry<BufferedStream, IStream>(IID_IStream),
+            ut::sdk::Entry<BufferedStream, IStream>(IID_ISequentialStream),
+            ut::sdk::Entry<BufferedStream, IGWStreamBufferSource>(IID_IGWStreamBufferSource),
         };
         return map;
     }

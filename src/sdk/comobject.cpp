@@ -1,3 +1,4 @@
+// CGWCOMObject: reference counting and interface maps, and the live-object count.
 #include <ut/sdk/comobject.h>
 #include <ut/sdk/testing.h>
 

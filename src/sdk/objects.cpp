@@ -3,6 +3,7 @@
 #include <map>
 #include <mutex>
 
+#include <ut/platform/detail/boundary.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/testing.h>
 
@@ -68,15 +69,12 @@ FaultState& Faults() {
     return *state;
 }
 
-class ObjectFactory final : public CGWCOMObject, public IClassFactory {
+class ObjectFactory final : public ut::sdk::ComObject<IClassFactory> {
 public:
     explicit ObjectFactory(CGWCOMObject* (*create)()) : create_(create) {}
 
-    UT_COM_OBJECT_IUNKNOWN()
-
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {
-            UT_INTERFACE_ENTRY(ObjectFactory, IClassFactory, IID_IClassFactory)};
+        static const InterfaceEntry map[] = {ut::sdk::Entry<ObjectFactory, IClassFactory>(IID_IClassFactory)};
         return map;
     }
 
@@ -133,7 +131,7 @@ HRESULT KXCreateInstance(REFCLSID clsid, REFIID iid, void** object) {
 }
 
 HRESULT GWRegisterGenericObject(REFCLSID clsid, IUnknown* object) {
-    return GenericObjects().Install(clsid, object);
+    return ut::ExportBoundary([&] { return GenericObjects().Install(clsid, object); });
 }
 
 HRESULT GWRevokeGenericObject(REFCLSID clsid) {
@@ -141,7 +139,7 @@ HRESULT GWRevokeGenericObject(REFCLSID clsid) {
 }
 
 HRESULT GWRegisterClassFactory(REFCLSID clsid, IClassFactory* factory) {
-    return ClassFactories().Install(clsid, factory);
+    return ut::ExportBoundary([&] { return ClassFactories().Install(clsid, factory); });
 }
 
 HRESULT GWRevokeClassFactory(REFCLSID clsid) {
@@ -153,19 +151,21 @@ namespace ut::sdk {
 void SetHostFaultHook(HostFaultHook hook) {
     FaultState& state = Faults();
     std::lock_guard lock(state.mutex);
-    state.hook = std::move(hook);
+    state.hook = std::move(hook); // a move: nothing to allocate
 }
 
 HRESULT CheckHostFault(std::string_view operation) {
-    HostFaultHook hook;
-    {
-        FaultState& state = Faults();
-        std::lock_guard lock(state.mutex);
-        if (!state.hook)
-            return S_OK;
-        hook = state.hook;
-    }
-    return hook(operation);
+    return ut::ExportBoundary([&] {
+        HostFaultHook hook;
+        {
+            FaultState& state = Faults();
+            std::lock_guard lock(state.mutex);
+            if (!state.hook)
+                return S_OK;
+            hook = state.hook; // a copy: the hook may replace itself while it runs
+        }
+        return hook(operation);
+    });
 }
 
 HRESULT CreateClassFactory(CGWCOMObject* (*create)(), IClassFactory** factory) {

@@ -1,8 +1,10 @@
+// Module registry keys and the string-dictionary registry.
 #include <map>
 #include <mutex>
 #include <string>
 
 #include <ut/platform/process.h>
+#include <ut/platform/detail/boundary.h>
 #include <ut/sdk/resources.h>
 
 namespace {
@@ -30,12 +32,7 @@ Dictionaries& AllDictionaries() {
     return *dictionaries;
 }
 
-} // namespace
-
-LONG GWResourceConstructRegKey(HINSTANCE module, const wchar_t* subKey, wchar_t* buffer, int capacity) {
-    if (!buffer || capacity <= 0)
-        return ERROR_INVALID_PARAMETER;
-    buffer[0] = L'\0';
+LONG ConstructRegKey(HINSTANCE module, const wchar_t* subKey, wchar_t* buffer, int capacity) {
     std::wstring stem = ModuleStem(ut::platform::ModuleFileName(module));
     if (stem.empty())
         return ERROR_INVALID_PARAMETER;
@@ -52,28 +49,46 @@ LONG GWResourceConstructRegKey(HINSTANCE module, const wchar_t* subKey, wchar_t*
     return ERROR_SUCCESS;
 }
 
+} // namespace
+
+LONG GWResourceConstructRegKey(HINSTANCE module, const wchar_t* subKey, wchar_t* buffer, int capacity) {
+    if (!buffer || capacity <= 0)
+        return ERROR_INVALID_PARAMETER;
+    buffer[0] = L'\0';
+    return ut::ExportBoundary([&] { return ConstructRegKey(module, subKey, buffer, capacity); },
+                              LONG{ERROR_OUTOFMEMORY});
+}
+
 HRESULT KXDictRegisterInstance(HINSTANCE module, const wchar_t* name) {
     if (!module || !name || !*name)
         return E_INVALIDARG;
-    Dictionaries& all = AllDictionaries();
-    std::lock_guard lock(all.mutex);
-    all.byName[name] = module;
-    return S_OK;
+    return ut::ExportBoundary([&] {
+        Dictionaries& all = AllDictionaries();
+        std::lock_guard lock(all.mutex);
+        all.byName[name] = module;
+        return S_OK;
+    });
 }
 
 HRESULT KXDictUnregisterInstance(const wchar_t* name) {
     if (!name)
         return E_INVALIDARG;
-    Dictionaries& all = AllDictionaries();
-    std::lock_guard lock(all.mutex);
-    return all.byName.erase(name) ? S_OK : S_FALSE;
+    return ut::ExportBoundary([&] {
+        Dictionaries& all = AllDictionaries();
+        std::lock_guard lock(all.mutex);
+        return all.byName.erase(name) ? S_OK : S_FALSE;
+    });
 }
 
 HINSTANCE KXDictFindInstance(const wchar_t* name) {
     if (!name)
         return nullptr;
-    Dictionaries& all = AllDictionaries();
-    std::lock_guard lock(all.mutex);
-    auto it = all.byName.find(name);
-    return it == all.byName.end() ? nullptr : it->second;
+    return ut::ExportBoundary(
+        [&] {
+            Dictionaries& all = AllDictionaries();
+            std::lock_guard lock(all.mutex);
+            auto it = all.byName.find(name);
+            return it == all.byName.end() ? HINSTANCE{} : it->second;
+        },
+        HINSTANCE{});
 }

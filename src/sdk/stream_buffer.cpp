@@ -1,7 +1,8 @@
+// StreamBuffer: the shared 64 KiB window between stream helpers and their stream.
 #include <algorithm>
 #include <new>
 
-#include <ut/sdk/stream_buffer.h>
+#include <ut/sdk/detail/stream_buffer.h>
 
 namespace ut::sdk {
 namespace {

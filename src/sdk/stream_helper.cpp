@@ -1,6 +1,8 @@
+// CGWStreamHelper: the fixed-width, string, array and chunk encodings of the base helper.
 #include <cstring>
 #include <string>
 
+#include <ut/platform/detail/boundary.h>
 #include <ut/platform/process.h>
 #include <ut/platform/text.h>
 #include <ut/sdk/stream_helper.h>
@@ -492,11 +494,12 @@ HRESULT CGWStreamHelper::ChunkWriteOpen(const GUID& id, ULONG version) {
 }
 
 HRESULT CGWStreamHelper::ChunkWriteOpen(ULONG id, ULONG version) {
-    try {
-        writeStarts_.reserve(writeStarts_.size() + 1);
-    } catch (const std::bad_alloc&) {
-        return E_OUTOFMEMORY;
-    }
+    if (HRESULT hr = ut::ExportBoundary([&] {
+            writeStarts_.reserve(writeStarts_.size() + 1);
+            return S_OK;
+        });
+        FAILED(hr))
+        return hr;
     if (HRESULT hr = buffer_->WriteValue(ChunkHeader{id, version, 0}); FAILED(hr))
         return hr;
     writeStarts_.push_back(buffer_->Position());
@@ -522,11 +525,12 @@ HRESULT CGWStreamHelper::ChunkReadOpen(ULONG id, ULONG* version) {
         return hr;
     if (storedId != id)
         return rewind(STG_E_INVALIDHEADER);
-    try {
-        readEnds_.push_back(buffer_->Position() + size);
-    } catch (const std::bad_alloc&) {
-        return rewind(E_OUTOFMEMORY);
-    }
+    if (HRESULT hr = ut::ExportBoundary([&] {
+            readEnds_.push_back(buffer_->Position() + size);
+            return S_OK;
+        });
+        FAILED(hr))
+        return rewind(hr);
     if (version)
         *version = storedVersion;
     return S_OK;

@@ -1,3 +1,4 @@
+// CKXString: the SDK's wide string.
 #include <algorithm>
 #include <cstdlib>
 #include <cwctype>

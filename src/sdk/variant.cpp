@@ -1,3 +1,4 @@
+// VARIANT helpers of the SDK.
 #include <ut/sdk/variant.h>
 
 HRESULT GWVariantClear(VARIANT* value) {

@@ -1,3 +1,4 @@
+// The reference host installs and revokes its services and answers as its settings say.
 #include <memory>
 #include <string>
 

@@ -1,4 +1,6 @@
+// CMemoryPool's reuse, growth, purge and registration rules.
 #include <limits>
+#include <new>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -127,6 +129,20 @@ TEST_F(PoolWithMockService, RegistersAtTheFirstAllocationOnceItIsAccepted) {
         pool_.Deallocate(pool_.Allocate(i));
     EXPECT_EQ(hostCalls.Calls(), 1) << "once registered, allocations do not ask the host";
     ExpectUnadvise(); // at destruction
+}
+
+// The copy takes the service pointer without a reference: once the original is destroyed and the
+// copy dropped, the service's count is where it started.
+TEST_F(PoolWithMockService, ACopySharesTheServiceWithoutAReferenceOfItsOwn) {
+    refs_.Track(&service_, 1, "service");
+    ExpectAdvise();
+    void* block = pool_.Allocate(40);
+    alignas(CMemoryPool) unsigned char storage[sizeof(CMemoryPool)];
+    const ULONG before = ut::test::RefTracker::References(&service_);
+    new (storage) CMemoryPool(pool_); // dropped without its destructor: the blocks are pool_'s
+    EXPECT_EQ(ut::test::RefTracker::References(&service_), before);
+    pool_.Deallocate(block);
+    ExpectUnadvise();
 }
 
 struct StateChangeCase {

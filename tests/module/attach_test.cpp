@@ -2,6 +2,7 @@
 // marked unloaded (so that every export answers E_UNEXPECTED) and must not half-register.
 #include <gtest/gtest.h>
 
+#include <ut/detail/names.h>
 #include <ut/platform/module_entry.h>
 #include <ut/platform/process.h>
 #include <ut/sdk/resources.h>
@@ -17,27 +18,27 @@ HINSTANCE ThisExecutable() {
 class AttachTest : public ::testing::Test {
 protected:
     // The library linked into this test registered "QVXUT" when it loaded; put it back after.
-    void SetUp() override { library_ = KXDictFindInstance(L"QVXUT"); }
+    void SetUp() override { library_ = KXDictFindInstance(ut::kDictionaryName); }
     void TearDown() override {
-        ut::platform::OnModuleDetach();
+        ut::module::OnDetach();
         if (library_)
-            KXDictRegisterInstance(library_, L"QVXUT");
+            KXDictRegisterInstance(library_, ut::kDictionaryName);
     }
     HINSTANCE library_ = nullptr;
 };
 
 TEST_F(AttachTest, AnUnknownModuleIsRefused) {
-    EXPECT_TRUE(FAILED(ut::platform::OnModuleAttach(nullptr)));
+    EXPECT_TRUE(FAILED(ut::module::OnAttach(nullptr)));
     EXPECT_FALSE(ut::module::Loaded());
     EXPECT_TRUE(ut::module::Current().baseKey.IsEmpty());
 }
 
 TEST_F(AttachTest, AKnownModuleLoadsWithItsKey) {
-    ASSERT_EQ(ut::platform::OnModuleAttach(ThisExecutable()), S_OK);
+    ASSERT_EQ(ut::module::OnAttach(ThisExecutable()), S_OK);
     EXPECT_TRUE(ut::module::Loaded());
     EXPECT_EQ(ut::module::Current().baseKey, L"Software\\ut\\Modules\\ut_module_tests\\");
-    EXPECT_EQ(KXDictFindInstance(L"QVXUT"), ThisExecutable());
-    ut::platform::OnModuleDetach();
+    EXPECT_EQ(KXDictFindInstance(ut::kDictionaryName), ThisExecutable());
+    ut::module::OnDetach();
     EXPECT_FALSE(ut::module::Loaded());
 }
 

@@ -2,6 +2,7 @@
 // under the library's own module and built its registry base key from it.
 #include <gtest/gtest.h>
 
+#include <ut/detail/names.h>
 #include <ut/persist.h>
 #include <ut/platform/process.h>
 #include <ut/platform/text.h>
@@ -12,7 +13,7 @@ namespace {
 TEST(ModuleLoad, RegistersTheDictionaryUnderTheLibrary) {
     // Reading the exported table keeps the library linked on every home.
     ASSERT_EQ(g_uiFeaturesVersion[eFeaturesVersionScene][eFeatureNumber], 0u);
-    HINSTANCE library = KXDictFindInstance(L"QVXUT");
+    HINSTANCE library = KXDictFindInstance(ut::kDictionaryName);
     ASSERT_NE(library, nullptr);
     std::wstring file = ut::platform::ModuleFileName(library);
     std::wstring name = file.substr(file.find_last_of(L"/\\") + 1);
@@ -20,8 +21,9 @@ TEST(ModuleLoad, RegistersTheDictionaryUnderTheLibrary) {
 }
 
 TEST(ModuleLoad, BaseKeyNamesTheLibrary) {
-    wchar_t key[260];
-    ASSERT_EQ(GWResourceConstructRegKey(KXDictFindInstance(L"QVXUT"), L"", key, 260), ERROR_SUCCESS);
+    wchar_t key[ut::kPathCapacity];
+    ASSERT_EQ(GWResourceConstructRegKey(KXDictFindInstance(ut::kDictionaryName), L"", key, ut::kPathCapacity),
+              ERROR_SUCCESS);
     EXPECT_STREQ(key, L"Software\\ut\\Modules\\ut\\");
 }
 

@@ -8,7 +8,7 @@
 
 #include <ut/host/reference_host.h>
 
-#include "persist/streams.h"
+#include "persist/save_load.h"
 
 namespace {
 
@@ -281,6 +281,23 @@ TEST_F(CompressorInterface, RejectsUnknownTagsAndShortInput) {
         EXPECT_TRUE(FAILED(load(kind, bytes))) << kind;
 }
 
+TEST_F(CompressorInterface, FixedAnswersAndAWrongSafeChunkId) {
+    ut::ComPtr<I3DStreamCompressor> c = Open(ut::test::Concat(kMarker, {4, 3, 2, 1, 5, 0, 0, 0, 0, 0, 0, 0}));
+    GUID guid = GUID_NULL;
+    const LONG value = 1;
+    EXPECT_EQ(c->SaveGUID(guid), E_NOTIMPL);
+    EXPECT_EQ(c->LoadGUID(guid), E_NOTIMPL);
+    EXPECT_EQ(c->SavePackedVarLenInt32ForPatchBack(value), E_NOTIMPL);
+    EXPECT_EQ(c->ChunkSafeReadOpen(0x01020305, nullptr), STG_E_INVALIDHEADER);
+    EXPECT_EQ(ut::test::PositionOf(stream_.Get()), kMarker.size()) << "the stream is where it was";
+    ULONG version = 0;
+    EXPECT_EQ(c->ChunkSafeReadOpen(0x01020304, &version), S_OK);
+    EXPECT_EQ(version, 5u);
+    // At the end of the stream the header cannot be read: still "another chunk", not a read fault.
+    EXPECT_EQ(c->ChunkReadClose(), S_OK);
+    EXPECT_EQ(c->ChunkReadOpen(0x01020304, nullptr), STG_E_INVALIDHEADER);
+}
+
 TEST_F(CompressorInterface, PlainStreamsDeclineChunkCallsAndKeepValuesPlain) {
     ut::ComPtr<I3DStreamCompressor> compressor =
         Open({0x01, 0x00, 0x00, 0x00, 0x02, 0x00, 0x00, 0x00, 0, 0, 0, 0, 0, 0});
@@ -384,6 +401,123 @@ TEST_F(Compact, ImportingADeltaLeavesTheReaderInsideTheChunk) {
         EXPECT_EQ(h.ChunkReadClose(), S_OK);
         EXPECT_EQ(h.GetUInt32(value), S_OK);
         EXPECT_EQ(value, 2u);
+    });
+}
+
+// A compressor on its own, outside a stream object, for the rules of binding it to streams.
+class LooseCompressor final : public C3DStreamCompressor {
+public:
+    HRESULT STDMETHODCALLTYPE QueryInterface(REFIID, void**) override { return E_NOINTERFACE; }
+    ULONG STDMETHODCALLTYPE AddRef() override { return 1; }
+    ULONG STDMETHODCALLTYPE Release() override { return 1; }
+
+    bool Active() { return ChunkPeekHeader(nullptr, nullptr) != STG_E_OLDFORMAT; }
+};
+
+ut::ComPtr<IStream> StreamAt(const Bytes& content, LONGLONG position) {
+    ut::ComPtr<IStream> stream = ut::test::StreamOf(content);
+    LARGE_INTEGER offset{};
+    offset.QuadPart = position;
+    stream->Seek(offset, STREAM_SEEK_SET, nullptr);
+    return stream;
+}
+
+TEST(CompressorInit, OnlyAStreamAtItsStartDecidesTheForm) {
+    const bool on = !ut::test::CompressionDisabled();
+    const Bytes plain = {1, 0, 0, 0, 1, 0, 0, 0, 0, 0, 0, 0};
+    struct Binding {
+        const char* what;
+        Bytes first;
+        LONGLONG firstAt;
+        Bytes second; // bound after the first; `none` skips the rebind
+        LONGLONG secondAt;
+        bool active;
+    };
+    const Bytes none = {0xEE};
+    const Binding cases[] = {
+        {"a marker at the start", kMarker, 0, none, 0, true},
+        {"a marker, but not at the start", kMarker, 1, none, 0, false},
+        {"plain content", plain, 0, none, 0, false},
+        {"a new stream", {}, 0, none, 0, on},
+        {"compact, then a stream not at its start", kMarker, 0, plain, 4, true},
+        {"compact, then plain content", kMarker, 0, plain, 0, false},
+        {"compact, then a new stream", kMarker, 0, {}, 0, on},
+    };
+    for (const Binding& c : cases) {
+        SCOPED_TRACE(c.what);
+        LooseCompressor compressor;
+        ut::ComPtr<IStream> first = StreamAt(c.first, c.firstAt);
+        EXPECT_EQ(compressor.Init(first.Get(), 0, 0), S_OK);
+        if (c.second != none) {
+            ut::ComPtr<IStream> second = StreamAt(c.second, c.secondAt);
+            EXPECT_EQ(compressor.Init(second.Get(), 0, 0), S_OK);
+        }
+        EXPECT_EQ(compressor.Active(), c.active);
+    }
+}
+
+TEST_F(Compact, PreReadFindsTheTableOrFallsBackToInlineDefinitions) {
+    auto tableChunk = [](ULONG version) {
+        ut::ComPtr<IStream> table = ut::test::StreamOf();
+        CGWStreamHelper writer(table.Get());
+        writer.ChunkWriteOpen(0x43484E4B, version);
+        writer.PutUInt32(0);
+        writer.ChunkWriteClose();
+        writer.Flush();
+        return ut::test::BytesOf(table.Get());
+    };
+    struct Table {
+        const char* what;
+        Bytes content;
+        HRESULT result;
+        std::size_t newChunkBytes; // what opening a chunk with a new pair then writes
+    };
+    const Table cases[] = {
+        {"no table chunk", {}, S_FALSE, 13},
+        {"a table older than the row format", tableChunk(0x30303939), S_FALSE, 5},
+        {"an empty table", tableChunk(0x30313030), S_OK, 5},
+    };
+    for (const Table& c : cases) {
+        SCOPED_TRACE(c.what);
+        LooseCompressor compressor;
+        ut::ComPtr<IStream> data = ut::test::StreamOf();
+        ASSERT_EQ(compressor.Init(data.Get(), 1, 0), S_OK);
+        ut::ComPtr<IStream> table = ut::test::StreamOf(c.content);
+        EXPECT_EQ(compressor.PreRead(table.Get()), c.result);
+        ASSERT_EQ(compressor.ChunkWriteOpen(3, 3), S_OK);
+        ASSERT_EQ(compressor.Init(nullptr, 0, 0), S_OK); // lets go of the stream, writing it back
+        EXPECT_EQ(ut::test::BytesOf(data.Get()).size(), kMarker.size() + c.newChunkBytes);
+    }
+}
+
+// Opens fail when the window must go to a stream that refuses the write: a definition that
+// was rewound is not left in the table, and a safe open reports only a failed push.
+TEST_F(Compact, AFailedOpenLeavesNoRowBehind) {
+    constexpr ULONG kWindow = ut::sdk::StreamBuffer::kCapacity;
+    ut::test::RefusingStream target;
+    ut::ComPtr<IStream> stream;
+    ASSERT_EQ(KXOpenPersistStreamForSave(&target, nullptr, stream.Put()), S_OK);
+    {
+        C3DStreamHelper h(stream.Get());
+        ULONG position = 0;
+        for (h.GetPos(&position); position < kWindow - 9; h.GetPos(&position))
+            h.PutUInt8(0xAB);
+        target.refusals = 1; // the size placeholder no longer fits the window
+        EXPECT_EQ(h.ChunkWriteOpen(0x51, 1), STG_E_MEDIUMFULL);
+        ASSERT_EQ(h.ChunkWriteOpen(0x51, 1), S_OK) << "defined again, not referenced";
+        EXPECT_EQ(h.ChunkWriteClose(), S_OK);
+        target.refusals = 1;
+        for (h.GetPos(&position); position < 2 * kWindow - 4; h.GetPos(&position))
+            h.PutUInt8(0xCD);
+        EXPECT_EQ(h.ChunkSafeWriteOpen(0x52, 1), S_OK) << "the write's failure is not the open's";
+    }
+    stream.Reset();
+    Load({target.Content(), {}}, [&](C3DStreamHelper& h) {
+        for (ULONG i = 0; i < kWindow - 9 - kMarker.size(); ++i)
+            h.SkipInt8();
+        ULONG version = 0;
+        EXPECT_EQ(h.ChunkReadOpen(0x51, &version), S_OK);
+        EXPECT_EQ(version, 1u);
     });
 }
 

@@ -1,3 +1,4 @@
+// The feature-version chunk read into the feature table.
 #include <vector>
 
 #include <gtest/gtest.h>

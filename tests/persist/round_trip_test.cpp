@@ -6,7 +6,7 @@
 
 #include <gtest/gtest.h>
 
-#include "persist/streams.h"
+#include "persist/save_load.h"
 
 namespace {
 

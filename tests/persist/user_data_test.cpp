@@ -1,3 +1,4 @@
+// User data blocks: add, find, remove and persist.
 #include <vector>
 
 #include <gtest/gtest.h>

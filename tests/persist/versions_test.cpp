@@ -1,3 +1,4 @@
+// Persisted-version codes, version ids from the construction mode, database-mode queries.
 #include <gtest/gtest.h>
 
 #include <ut/host/reference_host.h>

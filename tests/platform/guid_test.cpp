@@ -1,3 +1,4 @@
+// GUIDs and their text form.
 #include <cstring>
 
 #include <gtest/gtest.h>

@@ -1,3 +1,4 @@
+// UTF-8 and UTF-16LE conversion of wide text.
 #include <algorithm>
 
 #include <gtest/gtest.h>

@@ -1,3 +1,4 @@
+// VARIANT, BSTR and SAFEARRAY basics.
 #include <cstring>
 
 #include <gtest/gtest.h>

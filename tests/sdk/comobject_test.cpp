@@ -1,3 +1,4 @@
+// CGWCOMObject's interface maps and reference counts.
 #include <gtest/gtest.h>
 
 #include <ut/sdk/comobject.h>
@@ -16,17 +17,16 @@ struct IPong : IUnknown {
     virtual int STDMETHODCALLTYPE Pong() = 0;
 };
 
-class PingPong final : public CGWCOMObject, public IPing, public IPong {
+class PingPong final : public ut::sdk::ComObject<IPing, IPong> {
 public:
     explicit PingPong(bool* destroyed = nullptr) : destroyed_(destroyed) {}
     ~PingPong() override {
         if (destroyed_)
             *destroyed_ = true;
     }
-    UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {UT_INTERFACE_ENTRY(PingPong, IPing, IID_IPing),
-                                             UT_INTERFACE_ENTRY(PingPong, IPong, IID_IPong)};
+        static const InterfaceEntry map[] = {ut::sdk::Entry<PingPong, IPing>(IID_IPing),
+                                             ut::sdk::Entry<PingPong, IPong>(IID_IPong)};
         return map;
     }
     int STDMETHODCALLTYPE Ping() override { return 1; }

@@ -1,3 +1,4 @@
+// Generic objects and class factories: install, query, create, revoke.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -28,11 +29,10 @@ struct IWidget : IUnknown {
     virtual int STDMETHODCALLTYPE Size() = 0;
 };
 
-class Widget final : public CGWCOMObject, public IWidget {
+class Widget final : public ut::sdk::ComObject<IWidget> {
 public:
-    UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {UT_INTERFACE_ENTRY(Widget, IWidget, IID_IWidget)};
+        static const InterfaceEntry map[] = {ut::sdk::Entry<Widget, IWidget>(IID_IWidget)};
         return map;
     }
     HRESULT Construct() override { return failConstruct ? E_OUTOFMEMORY : S_OK; }
@@ -45,7 +45,8 @@ TEST(GenericObjects, InstalledServicesAreFoundByClass) {
     ut::test::RefTracker refs;
     refs.Track(&service, 1, "service");
     ut::test::ScopedGenericObject installed(kServiceClass, &service);
-    EXPECT_CALL(service, Answer(testing::_)).WillOnce(testing::DoAll(testing::SetArgPointee<0>(42), testing::Return(S_OK)));
+    EXPECT_CALL(service, Answer(testing::_))
+        .WillOnce(testing::DoAll(testing::SetArgPointee<0>(42), testing::Return(S_OK)));
 
     ut::ComPtr<IService> found;
     ASSERT_EQ(GWQueryGenericObject(kServiceClass, IID_IService, found.PutVoid()), S_OK);
@@ -110,7 +111,8 @@ TEST(FaultPlan, FailsExactlyTheChosenHostCall) {
     static_cast<IUnknown*>(out)->Release();
     EXPECT_EQ(GWQueryGenericObject(kServiceClass, IID_IService, &out), E_ACCESSDENIED);
     EXPECT_EQ(KXCreateInstance(kWidgetClass, IID_IWidget, &out), REGDB_E_CLASSNOTREG);
-    EXPECT_THAT(plan.Seen(), testing::ElementsAre("GWQueryGenericObject", "GWQueryGenericObject", "KXCreateInstance"));
+    EXPECT_THAT(plan.Seen(),
+                testing::ElementsAre("GWQueryGenericObject", "GWQueryGenericObject", "KXCreateInstance"));
     EXPECT_EQ(service.Extra(), 1u); // the installation's own reference
 }
 

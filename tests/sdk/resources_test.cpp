@@ -1,17 +1,21 @@
+// Module registry keys and string dictionaries.
 #include <gtest/gtest.h>
 
+#include <ut/detail/names.h>
 #include <ut/platform/process.h>
 #include <ut/sdk/resources.h>
 
 namespace {
 
-HINSTANCE ThisExecutable() { return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisExecutable)); }
+HINSTANCE ThisExecutable() {
+    return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisExecutable));
+}
 
 TEST(RegistryKey, NamesTheModuleAndEndsInABackslash) {
-    wchar_t key[260];
-    ASSERT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"", key, 260), ERROR_SUCCESS);
+    wchar_t key[ut::kPathCapacity];
+    ASSERT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"", key, ut::kPathCapacity), ERROR_SUCCESS);
     EXPECT_STREQ(key, L"Software\\ut\\Modules\\ut_sdk_tests\\");
-    ASSERT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"Views", key, 260), ERROR_SUCCESS);
+    ASSERT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"Views", key, ut::kPathCapacity), ERROR_SUCCESS);
     EXPECT_STREQ(key, L"Software\\ut\\Modules\\ut_sdk_tests\\Views\\");
 }
 

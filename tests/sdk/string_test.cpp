@@ -1,3 +1,4 @@
+// CKXString's operations.
 #include <cstdlib>
 #include <cstring>
 

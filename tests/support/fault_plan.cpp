@@ -1,3 +1,4 @@
+// FaultPlan: fails the N-th host call through the SDK's fault hook.
 #include "support/fault_plan.h"
 
 #include <ut/sdk/objects.h>

@@ -1,3 +1,4 @@
+// Reference and live-object checks for tests.
 #include "support/ref_tracker.h"
 
 #include <gtest/gtest.h>

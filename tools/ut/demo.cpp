@@ -2,6 +2,7 @@
 #include <cstdio>
 #include <string>
 
+#include <ut/detail/names.h>
 #include <ut/host/reference_host.h>
 #include <ut/platform/process.h>
 #include <ut/platform/stream.h>
@@ -22,13 +23,13 @@ std::string Narrow(const std::wstring& text) {
 }
 
 int ShowModule() {
-    HINSTANCE library = KXDictFindInstance(L"QVXUT");
+    HINSTANCE library = KXDictFindInstance(ut::kDictionaryName);
     if (!library) {
         std::printf("module      the library did not register its dictionary: it failed to load\n");
         return 1;
     }
-    wchar_t key[260];
-    if (GWResourceConstructRegKey(library, L"", key, 260) != ERROR_SUCCESS) {
+    wchar_t key[ut::kPathCapacity];
+    if (GWResourceConstructRegKey(library, L"", key, ut::kPathCapacity) != ERROR_SUCCESS) {
         std::printf("module      no registry base key\n");
         return 1;
     }

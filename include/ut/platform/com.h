@@ -12,16 +12,17 @@
 
 namespace ut {
 
-// Maps an interface type to its identifier so that ComPtr::As can ask for it by type.
-// Declare with UT_INTERFACE_ID(Interface, iid) next to the interface.
+// Maps an interface type to its identifier so that ComPtr::As can ask for it by type. Declare it
+// next to the interface:
+//   template <>
+//   struct ut::InterfaceId<IThing> : ut::Iid<IID_IThing> {};
 template <class Interface>
 struct InterfaceId;
 
-#define UT_INTERFACE_ID(Interface, iid)                                                                  \
-    template <>                                                                                          \
-    struct ut::InterfaceId<Interface> {                                                                  \
-        static const IID& Get() { return iid; }                                                         \
-    }
+template <const IID& iid>
+struct Iid {
+    static const IID& Get() { return iid; }
+};
 
 template <class Interface>
 concept HasInterfaceId = requires { InterfaceId<Interface>::Get(); };
@@ -160,5 +161,7 @@ struct TaskMemDeleter {
 
 } // namespace ut
 
-UT_INTERFACE_ID(IUnknown, IID_IUnknown);
-UT_INTERFACE_ID(IClassFactory, IID_IClassFactory);
+template <>
+struct ut::InterfaceId<IUnknown> : ut::Iid<IID_IUnknown> {};
+template <>
+struct ut::InterfaceId<IClassFactory> : ut::Iid<IID_IClassFactory> {};

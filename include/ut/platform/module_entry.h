@@ -8,9 +8,10 @@
 
 #include <ut/platform/com.h>
 
-namespace ut::platform {
+// Defined by the library whose load step they are; called by the platform's entry object.
+namespace ut::module {
 
-HRESULT OnModuleAttach(HINSTANCE self);
-void OnModuleDetach();
+HRESULT OnAttach(HINSTANCE self);
+void OnDetach();
 
-} // namespace ut::platform
+} // namespace ut::module

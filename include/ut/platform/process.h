@@ -16,6 +16,10 @@ UT_PLATFORM_API HINSTANCE ModuleOf(const void* address);
 // The full file name of a loaded module, or an empty string when it is unknown.
 UT_PLATFORM_API std::wstring ModuleFileName(HINSTANCE module);
 
+// Whether the process runs on a compatibility layer rather than the home's own system (wine on
+// Windows builds). Tests use it to mark the rare expectation that only holds there.
+UT_PLATFORM_API bool RunningUnderCompatibilityLayer();
+
 // Writes one line to the process's error output (standard error, or the debugger on Windows
 // when there is no console).
 UT_PLATFORM_API void ReportError(const std::wstring& line);

@@ -24,5 +24,7 @@ UT_PLATFORM_API HRESULT OpenFileStream(const wchar_t* path, DWORD mode, IStream*
 
 } // namespace ut::platform
 
-UT_INTERFACE_ID(ISequentialStream, IID_ISequentialStream);
-UT_INTERFACE_ID(IStream, IID_IStream);
+template <>
+struct ut::InterfaceId<ISequentialStream> : ut::Iid<IID_ISequentialStream> {};
+template <>
+struct ut::InterfaceId<IStream> : ut::Iid<IID_IStream> {};

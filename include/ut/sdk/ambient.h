@@ -26,7 +26,8 @@ protected:
     ~IGWAmbientValues() = default;
 };
 
-UT_INTERFACE_ID(IGWAmbientValues, IID_IGWAmbientValues);
+template <>
+struct ut::InterfaceId<IGWAmbientValues> : ut::Iid<IID_IGWAmbientValues> {};
 
 // The application's ambient values manager (found through GWQueryGenericObject).
 UT_SDK_API HRESULT KXGetAmbientValuesMgr(IGWAmbientValues** manager);

@@ -2,13 +2,13 @@
 //
 // A class answers QueryInterface through its interface map: a table of (interface id, cast)
 // entries returned by GetInterfaceMap. IUnknown is always answered, with the object's identity.
-// A class that also derives from another interface resolves the IUnknown methods once:
+// A class that implements further interfaces derives from ComObject, which resolves the IUnknown
+// methods of all its bases to CGWCOMObject's once:
 //
-//   class CThing : public CGWCOMObject, public IThing {
+//   class CThing : public ut::sdk::ComObject<IThing> {
 //   public:
-//       UT_COM_OBJECT_IUNKNOWN()
 //       std::span<const InterfaceEntry> GetInterfaceMap() const override {
-//           static const InterfaceEntry map[] = {UT_INTERFACE_ENTRY(CThing, IThing, IID_IThing)};
+//           static const InterfaceEntry map[] = {ut::sdk::Entry<CThing, IThing>(IID_IThing)};
 //           return map;
 //       }
 //   };
@@ -55,20 +55,25 @@ template <class Object, class Interface>
 void* CastTo(CGWCOMObject* self) {
     return static_cast<Interface*>(static_cast<Object*>(self));
 }
+
+// The interface-map entry that answers `iid` with the object's `Interface` part.
+template <class Object, class Interface>
+constexpr CGWCOMObject::InterfaceEntry Entry(const IID& iid) {
+    return {&iid, &CastTo<Object, Interface>};
+}
+
+// CGWCOMObject together with the interfaces a class implements.
+template <class... Interfaces>
+class ComObject : public CGWCOMObject, public Interfaces... {
+public:
+    HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override {
+        return CGWCOMObject::QueryInterface(iid, object);
+    }
+    ULONG STDMETHODCALLTYPE AddRef() override { return CGWCOMObject::AddRef(); }
+    ULONG STDMETHODCALLTYPE Release() override { return CGWCOMObject::Release(); }
+
+protected:
+    ComObject() = default;
+    ~ComObject() override = default;
+};
 } // namespace ut::sdk
-
-#define UT_INTERFACE_ENTRY(Object, Interface, iid)                                                           \
-    CGWCOMObject::InterfaceEntry {                                                                           \
-        &(iid), &ut::sdk::CastTo<Object, Interface>                                                          \
-    }
-
-#define UT_COM_OBJECT_IUNKNOWN()                                                                             \
-    HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override {                           \
-        return CGWCOMObject::QueryInterface(iid, object);                                                    \
-    }                                                                                                        \
-    ULONG STDMETHODCALLTYPE AddRef() override {                                                              \
-        return CGWCOMObject::AddRef();                                                                       \
-    }                                                                                                        \
-    ULONG STDMETHODCALLTYPE Release() override {                                                             \
-        return CGWCOMObject::Release();                                                                      \
-    }

@@ -19,4 +19,5 @@ protected:
     ~IGWActiveDatabase() = default;
 };
 
-UT_INTERFACE_ID(IGWActiveDatabase, IID_IGWActiveDatabase);
+template <>
+struct ut::InterfaceId<IGWActiveDatabase> : ut::Iid<IID_IGWActiveDatabase> {};

@@ -50,8 +50,10 @@ protected:
     ~IGWNotificationService() = default;
 };
 
-UT_INTERFACE_ID(IGwNotifySink, IID_IGwNotifySink);
-UT_INTERFACE_ID(IGWNotificationService, IID_IGWNotificationService);
+template <>
+struct ut::InterfaceId<IGwNotifySink> : ut::Iid<IID_IGwNotifySink> {};
+template <>
+struct ut::InterfaceId<IGWNotificationService> : ut::Iid<IID_IGWNotificationService> {};
 
 namespace ut::sdk {
 

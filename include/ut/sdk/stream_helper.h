@@ -35,8 +35,8 @@
 
 #include <ut/platform/stream.h>
 #include <ut/platform/variant.h>
+#include <ut/sdk/detail/stream_buffer.h>
 #include <ut/sdk/export.h>
-#include <ut/sdk/stream_buffer.h>
 
 enum STMHELPERDIR : ULONG { STMHELPER_FORWARD = 0, STMHELPER_BACKWARD = 1 };
 
@@ -58,15 +58,8 @@ protected:
     ~IGWStreamCapabilities() = default;
 };
 
-UT_INTERFACE_ID(IGWStreamCapabilities, IID_IGWStreamCapabilities);
-
-namespace ut::sdk {
-// The chunk id of a four-character name: the bytes in written order, each sign-extended.
-UT_SDK_API ULONG ChunkIdFromName(const char* name);
-// Closes the innermost chunk open for writing: pops the start of its body and writes the body's
-// size into the 4 bytes before it (an empty body keeps the 0 written at the open).
-UT_SDK_API HRESULT CloseWrittenChunk(StreamBuffer& buffer, std::vector<ULONGLONG>& bodyStarts);
-} // namespace ut::sdk
+template <>
+struct ut::InterfaceId<IGWStreamCapabilities> : ut::Iid<IID_IGWStreamCapabilities> {};
 
 class UT_SDK_API CGWStreamHelper {
 public:

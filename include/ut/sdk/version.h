@@ -27,4 +27,5 @@ protected:
     ~IGWVersionInfo() = default;
 };
 
-UT_INTERFACE_ID(IGWVersionInfo, IID_IGWVersionInfo);
+template <>
+struct ut::InterfaceId<IGWVersionInfo> : ut::Iid<IID_IGWVersionInfo> {};

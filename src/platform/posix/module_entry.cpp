@@ -11,7 +11,7 @@ HINSTANCE ThisModule() { return ut::platform::ModuleOf(reinterpret_cast<const vo
 
 __attribute__((constructor)) void AttachModule() {
     HINSTANCE self = ThisModule();
-    HRESULT hr = ut::platform::OnModuleAttach(self);
+    HRESULT hr = ut::module::OnAttach(self);
     if (SUCCEEDED(hr))
         return;
     char code[16];
@@ -21,6 +21,6 @@ __attribute__((constructor)) void AttachModule() {
                               L"); every call will answer E_UNEXPECTED");
 }
 
-__attribute__((destructor)) void DetachModule() { ut::platform::OnModuleDetach(); }
+__attribute__((destructor)) void DetachModule() { ut::module::OnDetach(); }
 
 } // namespace

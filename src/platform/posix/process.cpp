@@ -1,3 +1,4 @@
+// Process queries on POSIX: environment, module file names, the executable.
 #include <cstdlib>
 #include <dlfcn.h>
 
@@ -10,6 +11,10 @@ namespace ut::platform {
 
 bool HasEnvironmentVariable(const char* name) {
     return name && std::getenv(name) != nullptr;
+}
+
+bool RunningUnderCompatibilityLayer() {
+    return false;
 }
 
 HINSTANCE ModuleOf(const void* address) {

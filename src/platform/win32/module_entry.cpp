@@ -6,9 +6,9 @@ extern "C" BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID) {
     switch (reason) {
     case DLL_PROCESS_ATTACH:
         DisableThreadLibraryCalls(instance);
-        return SUCCEEDED(ut::platform::OnModuleAttach(instance)) ? TRUE : FALSE;
+        return SUCCEEDED(ut::module::OnAttach(instance)) ? TRUE : FALSE;
     case DLL_PROCESS_DETACH:
-        ut::platform::OnModuleDetach();
+        ut::module::OnDetach();
         return TRUE;
     default:
         return TRUE;

@@ -1,3 +1,4 @@
+// Process queries on Windows: environment, module file names, the executable.
 #include <string>
 
 #include <ut/platform/process.h>
@@ -21,6 +22,12 @@ bool HasEnvironmentVariable(const char* name) {
     if (GetEnvironmentVariableA(name, nullptr, 0) != 0)
         return true;
     return GetLastError() != ERROR_ENVVAR_NOT_FOUND;
+}
+
+// Wine's own ntdll exports its version; the system's does not.
+bool RunningUnderCompatibilityLayer() {
+    HMODULE ntdll = GetModuleHandleW(L"ntdll.dll");
+    return ntdll && GetProcAddress(ntdll, "wine_get_version");
 }
 
 HINSTANCE ModuleOf(const void* address) {

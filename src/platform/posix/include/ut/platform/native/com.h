@@ -56,12 +56,12 @@ struct HINSTANCE__;
 using HINSTANCE = HINSTANCE__*;
 using HMODULE = HINSTANCE;
 
+// The calling-convention markers of the system's declarations, which this home has one of: the
+// only macros of the face besides the export macros, since they stand where no name can.
 #define STDMETHODCALLTYPE
 #define STDAPICALLTYPE
-#ifndef TRUE
-#define TRUE 1
-#define FALSE 0
-#endif
+inline constexpr BOOL TRUE = 1;
+inline constexpr BOOL FALSE = 0;
 
 constexpr bool SUCCEEDED(HRESULT hr) { return hr >= 0; }
 constexpr bool FAILED(HRESULT hr) { return hr < 0; }

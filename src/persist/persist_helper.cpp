@@ -1,3 +1,4 @@
+// C3DStreamHelper: routes values and chunks to the stream's compressor, and counts open chunks.
 #include <cstdlib>
 
 #include <ut/persist.h>
@@ -21,7 +22,7 @@ HRESULT Route(I3DStreamCompressor* compressor, ViaCompressor viaCompressor, ViaB
 C3DStreamHelper::C3DStreamHelper(IStream* stream) : CGWStreamHelper(stream) {
     if (!stream)
         return;
-    stream->QueryInterface(IID_I3DStreamCompressor, compressor_.PutVoid());
+    (void)stream->QueryInterface(IID_I3DStreamCompressor, compressor_.PutVoid()); // none: the plain form
     ut::ComPtr<IUnknown> counting;
     if (SUCCEEDED(stream->QueryInterface(IID_IGWChunkCountingStream, counting.PutVoid())) && counting)
         return;
@@ -31,7 +32,7 @@ C3DStreamHelper::C3DStreamHelper(IStream* stream) : CGWStreamHelper(stream) {
     }
     ULONG hostVersionKnown = 0;
     ULONG startDepth = 0;
-    compressor_->GetStartCount(hostVersionKnown, startDepth);
+    (void)compressor_->GetStartCount(hostVersionKnown, startDepth); // a failure leaves depth 0: counting on
     openDepth_ = startDepth;
     ut::ComPtr<IGWStreamCapabilities> capabilities;
     if (SUCCEEDED(stream->QueryInterface(IID_IGWStreamCapabilities, capabilities.PutVoid())) &&
@@ -44,7 +45,8 @@ C3DStreamHelper::~C3DStreamHelper() {
     if (openDepth_ == 0 || openDepth_ == kCountingOff)
         return;
     for (ULONG remaining = openDepth_; remaining > 0; --remaining)
-        CountClose(lastOpenWasRead_ ? _ChunkReadClose() : _ChunkWriteClose());
+        (void)CountClose(lastOpenWasRead_ ? RawChunkReadClose()
+                                          : RawChunkWriteClose()); // runs its full count
 }
 
 // Counting of open chunks. Writing always counts, even on a stream where reading does not.
@@ -176,20 +178,20 @@ HRESULT C3DStreamHelper::ChunkSafeReadOpen(ULONG id, ULONG* version) {
 }
 
 HRESULT C3DStreamHelper::ChunkWriteClose() {
-    return CountClose(_ChunkWriteClose());
+    return CountClose(RawChunkWriteClose());
 }
 
 HRESULT C3DStreamHelper::ChunkReadClose() {
-    return CountClose(_ChunkReadClose());
+    return CountClose(RawChunkReadClose());
 }
 
-HRESULT C3DStreamHelper::_ChunkWriteClose() {
+HRESULT C3DStreamHelper::RawChunkWriteClose() {
     return Route(
         compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkWriteClose(); },
         [&] { return CGWStreamHelper::ChunkWriteClose(); });
 }
 
-HRESULT C3DStreamHelper::_ChunkReadClose() {
+HRESULT C3DStreamHelper::RawChunkReadClose() {
     return Route(
         compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkReadClose(); },
         [&] { return CGWStreamHelper::ChunkReadClose(); });

@@ -1,4 +1,5 @@
-// The byte window that every stream helper works through.
+// The byte window that every stream helper works through, and the chunk machinery the SDK and
+// the library share. Not for plug-ins: the helpers are their interface.
 //
 // Helpers write and read values of a few bytes each; calling the stream for every value would
 // cost a virtual call and a copy per byte. A StreamBuffer keeps a window of the stream in memory
@@ -21,6 +22,7 @@
 #include <bit>
 #include <cstring>
 #include <memory>
+#include <vector>
 
 #include <ut/platform/stream.h>
 #include <ut/sdk/export.h>
@@ -44,7 +46,8 @@ protected:
     ~IGWStreamBufferSource() = default;
 };
 
-UT_INTERFACE_ID(IGWStreamBufferSource, IID_IGWStreamBufferSource);
+template <>
+struct ut::InterfaceId<IGWStreamBufferSource> : ut::Iid<IID_IGWStreamBufferSource> {};
 
 namespace ut::sdk {
 
@@ -175,6 +178,12 @@ private:
     StreamBuffer& buffer_;
     ULONGLONG start_;
 };
+
+// The chunk id of a four-character name: the bytes in written order, each sign-extended.
+UT_SDK_API ULONG ChunkIdFromName(const char* name);
+// Closes the innermost chunk open for writing: pops the start of its body and writes the body's
+// size into the 4 bytes before it (an empty body keeps the 0 written at the open).
+UT_SDK_API HRESULT CloseWrittenChunk(StreamBuffer& buffer, std::vector<ULONGLONG>& bodyStarts);
 
 // An IStream that goes through a StreamBuffer of its own and answers IGWStreamBufferSource, so
 // that helpers built over it share the buffer. Clone is not supported.

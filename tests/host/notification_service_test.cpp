@@ -1,3 +1,4 @@
+// The reference notification service: advise, unadvise and re-entrant broadcasts.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -21,13 +22,12 @@ public:
 };
 
 // Owned only by the service: it withdraws inside its own call and then still uses a member.
-class SelfWithdrawingSink final : public CGWCOMObject, public IGwNotifySink {
+class SelfWithdrawingSink final : public ut::sdk::ComObject<IGwNotifySink> {
 public:
     explicit SelfWithdrawingSink(IGWNotificationService* service) : service_(service) {}
-    UT_COM_OBJECT_IUNKNOWN()
     std::span<const InterfaceEntry> GetInterfaceMap() const override {
         static const InterfaceEntry map[] = {
-            UT_INTERFACE_ENTRY(SelfWithdrawingSink, IGwNotifySink, IID_IGwNotifySink)};
+            ut::sdk::Entry<SelfWithdrawingSink, IGwNotifySink>(IID_IGwNotifySink)};
         return map;
     }
     HRESULT STDMETHODCALLTYPE PropertyChanged(const wchar_t* name, ULONG, const VARIANT*, int) override {
