@@ -5,14 +5,20 @@
 
 #include <ut/sdk/ambient.h>
 #include <ut/sdk/database.h>
+#include <ut/sdk/families.h>
 #include <ut/sdk/notify.h>
 #include <ut/sdk/objects.h>
+#include <ut/sdk/preferences.h>
 #include <ut/sdk/version.h>
+#include <ut/sdk/views.h>
 
 #include "active_database.h"
 #include "ambient_values.h"
+#include "families_manager.h"
 #include "notification_service.h"
+#include "preferences.h"
 #include "version_info.h"
+#include "view_manager.h"
 
 namespace ut::host {
 namespace {
@@ -32,6 +38,9 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWAmbientValues, NewService<AmbientValues>(settings).Get());
     InstallService(CLSID_GWActiveDatabase, NewService<ActiveDatabase>(settings).Get());
     InstallService(CLSID_GWNotificationService, NewService<NotificationService>(settings).Get());
+    InstallService(CLSID_GWFamiliesManager, NewService<FamiliesManager>(settings).Get());
+    InstallService(CLSID_GWViewManager, NewService<ViewManager>(settings).Get());
+    InstallService(CLSID_GWPreferences, NewService<Preferences>(settings).Get());
 }
 
 ReferenceHost::~ReferenceHost() {

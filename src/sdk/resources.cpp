@@ -1,10 +1,11 @@
-// Module registry keys and the string-dictionary registry.
+// Module registry keys, the string-dictionary registry and the modules' string tables.
+#include <deque>
 #include <map>
 #include <mutex>
 #include <string>
 
-#include <ut/platform/process.h>
 #include <ut/platform/detail/boundary.h>
+#include <ut/platform/process.h>
 #include <ut/sdk/resources.h>
 
 namespace {
@@ -30,6 +31,20 @@ struct Dictionaries {
 Dictionaries& AllDictionaries() {
     static Dictionaries* dictionaries = new Dictionaries;
     return *dictionaries;
+}
+
+// The texts that modules gave, by module and id. Texts are never freed, so that a pointer handed
+// out stays valid when its entry is replaced.
+struct StringTables {
+    std::mutex mutex;
+    std::deque<std::wstring> texts;
+    std::map<std::pair<HINSTANCE, unsigned int>, const wchar_t*> byId;
+};
+
+// Never destroyed: texts handed out must outlive every module that reads them.
+StringTables& AllStringTables() {
+    static StringTables* tables = new StringTables;
+    return *tables;
 }
 
 LONG ConstructRegKey(HINSTANCE module, const wchar_t* subKey, wchar_t* buffer, int capacity) {
@@ -91,4 +106,30 @@ HINSTANCE KXDictFindInstance(const wchar_t* name) {
             return it == all.byName.end() ? HINSTANCE{} : it->second;
         },
         HINSTANCE{});
+}
+
+HRESULT KXDictAddInstanceStrings(HINSTANCE module, const KXDictString* strings, unsigned int count) {
+    if (!module)
+        return E_INVALIDARG;
+    if (count != 0 && !strings)
+        return E_POINTER;
+    for (unsigned int i = 0; i < count; ++i)
+        if (!strings[i].text)
+            return E_POINTER;
+    return ut::ExportBoundary([&] {
+        StringTables& tables = AllStringTables();
+        std::lock_guard lock(tables.mutex);
+        for (unsigned int i = 0; i < count; ++i) {
+            const wchar_t* text = tables.texts.emplace_back(strings[i].text).c_str();
+            tables.byId.insert_or_assign(std::pair(module, strings[i].id), text);
+        }
+        return S_OK;
+    });
+}
+
+const wchar_t* KXDictLoadInstanceIdstring(HINSTANCE module, unsigned int id) {
+    StringTables& tables = AllStringTables();
+    std::lock_guard lock(tables.mutex);
+    auto found = tables.byId.find(std::pair(module, id));
+    return found == tables.byId.end() ? L"" : found->second;
 }
