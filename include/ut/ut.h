@@ -4,3 +4,4 @@
 #include <ut/export.h>
 #include <ut/memory.h>
 #include <ut/persist.h>
+#include <ut/registration.h>
