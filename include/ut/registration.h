@@ -24,9 +24,10 @@
 // Unregistration never stops early (except KXUnRegisterManipulator, see there) and returns the
 // result of its last step. Callers test results for being non-negative.
 //
-// Every call that writes groups its writes into one registry transaction where the registry has
-// them, so that a registration reaches the disk once; what was written is kept even when a later
-// step fails. Calls that need the base key answer E_UNEXPECTED while the library is not loaded.
+// Every call runs its registry calls in one registry transaction where the registry has them: a
+// registration reaches the disk once, and a lookup sees one state of the registry. What was
+// written is kept even when a later step fails. Calls that need the base key answer E_UNEXPECTED
+// while the library is not loaded.
 #pragma once
 
 #include <ut/export.h>

@@ -3,6 +3,7 @@
 
 #include <new>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <ut/platform/detail/boundary.h>
@@ -36,8 +37,11 @@ std::wstring MemberKey(REFGUID family, REFCLSID clsid) {
     return MembersKey(family) + L"\\" + GuidToString(clsid);
 }
 
-// GUID_NULL in a list of `count` families is E_INVALIDARG, a null list with a count E_POINTER.
-HRESULT CheckFamilies(ULONG count, const GUID* families) {
+// GUID_NULL as the class or in the list of `count` families is E_INVALIDARG, a null list with a
+// count E_POINTER.
+HRESULT CheckMembers(REFCLSID clsid, ULONG count, const GUID* families) {
+    if (IsEqualGUID(clsid, GUID_NULL))
+        return E_INVALIDARG;
     if (count != 0 && !families)
         return E_POINTER;
     for (ULONG i = 0; i < count; ++i)
@@ -72,6 +76,23 @@ HRESULT DropWhatIsEmpty(REFGUID family) {
     return FAILED(whole) ? whole : S_OK;
 }
 
+// A write of the manager: the fault hook under `operation`, then `body` in one registry batch under
+// the error boundary.
+template <class Body>
+HRESULT Write(std::string_view operation, Body&& body) {
+    if (HRESULT hr = sdk::CheckHostFault(operation); FAILED(hr))
+        return hr;
+    return ExportBoundary([&] { return sdk::Batched(body, E_FAIL); });
+}
+
+// A read: the fault hook, then `body` under the error boundary.
+template <class Body>
+HRESULT Read(std::string_view operation, Body&& body) {
+    if (HRESULT hr = sdk::CheckHostFault(operation); FAILED(hr))
+        return hr;
+    return ExportBoundary(static_cast<Body&&>(body));
+}
+
 class GuidList final : public sdk::ComObject<IGWEnumGUID> {
 public:
     explicit GuidList(std::vector<GUID> ids) : ids_(std::move(ids)) {}
@@ -94,11 +115,6 @@ public:
         if (fetched)
             *fetched = copied;
         return copied == count ? S_OK : S_FALSE;
-    }
-    HRESULT STDMETHODCALLTYPE Skip(ULONG count) override {
-        std::size_t left = ids_.size() - next_;
-        next_ += count < left ? count : left;
-        return count <= left ? S_OK : S_FALSE;
     }
     HRESULT STDMETHODCALLTYPE Reset() override {
         next_ = 0;
@@ -123,49 +139,35 @@ HRESULT FamiliesManager::RegisterFamily(REFGUID family, REFCLSID familyClass, RE
                                         REFCLSID editor, REFCLSID inspector) {
     if (IsEqualGUID(family, GUID_NULL))
         return E_INVALIDARG;
-    if (HRESULT hr = sdk::CheckHostFault("IGWFamiliesManager::RegisterFamily"); FAILED(hr))
-        return hr;
-    return ExportBoundary([&] {
-        std::wstring server = platform::ModuleFileName(module);
-        return sdk::Batched(
-            [&] {
-                UniqueHKey key;
-                LONG result = CreateKey(HKEY_LOCAL_MACHINE, FamilyKey(family).c_str(), key);
-                if (result != ERROR_SUCCESS)
-                    return FromRegistry(result);
-                (void)DeleteDescription(key.get()); // only the new description counts
-                const LONG written[] = {SetIdentifier(key.get(), L"Class", familyClass),
-                                        SetIdentifier(key.get(), L"Parent", parent),
-                                        SetTextIfAny(key.get(), L"Kind", kind ? kind : L""),
-                                        SetTextIfAny(key.get(), L"Path", path ? path : L""),
-                                        SetTextIfAny(key.get(), L"Module", server),
-                                        SetIdentifier(key.get(), L"Editor", editor),
-                                        SetIdentifier(key.get(), L"Inspector", inspector)};
-                for (LONG one : written)
-                    if (one != ERROR_SUCCESS)
-                        return FromRegistry(one);
-                return S_OK;
-            },
-            E_FAIL);
+    return Write("IGWFamiliesManager::RegisterFamily", [&] {
+        UniqueHKey key;
+        LONG result = CreateKey(HKEY_LOCAL_MACHINE, FamilyKey(family).c_str(), key);
+        if (result != ERROR_SUCCESS)
+            return FromRegistry(result);
+        (void)DeleteDescription(key.get()); // only the new description counts
+        const LONG written[] = {SetIdentifier(key.get(), L"Class", familyClass),
+                                SetIdentifier(key.get(), L"Parent", parent),
+                                SetTextIfAny(key.get(), L"Kind", kind ? kind : L""),
+                                SetTextIfAny(key.get(), L"Path", path ? path : L""),
+                                SetTextIfAny(key.get(), L"Module", platform::ModuleFileName(module)),
+                                SetIdentifier(key.get(), L"Editor", editor),
+                                SetIdentifier(key.get(), L"Inspector", inspector)};
+        for (LONG one : written)
+            if (one != ERROR_SUCCESS)
+                return FromRegistry(one);
+        return S_OK;
     });
 }
 
 HRESULT FamiliesManager::UnregisterFamily(REFGUID family, HINSTANCE) {
     if (IsEqualGUID(family, GUID_NULL))
         return E_INVALIDARG;
-    if (HRESULT hr = sdk::CheckHostFault("IGWFamiliesManager::UnregisterFamily"); FAILED(hr))
-        return hr;
-    return ExportBoundary([&] {
-        return sdk::Batched(
-            [&] {
-                bool had = false;
-                if (UniqueHKey key =
-                        sdk::OpenKey(HKEY_LOCAL_MACHINE, FamilyKey(family).c_str(), sdk::kReadWrite))
-                    had = DeleteDescription(key.get());
-                HRESULT dropped = DropWhatIsEmpty(family);
-                return FAILED(dropped) ? dropped : had ? S_OK : S_FALSE;
-            },
-            E_FAIL);
+    return Write("IGWFamiliesManager::UnregisterFamily", [&] {
+        bool had = false;
+        if (UniqueHKey key = sdk::OpenKey(HKEY_LOCAL_MACHINE, FamilyKey(family).c_str(), sdk::kReadWrite))
+            had = DeleteDescription(key.get());
+        HRESULT dropped = DropWhatIsEmpty(family);
+        return FAILED(dropped) ? dropped : had ? S_OK : S_FALSE;
     });
 }
 
@@ -173,55 +175,39 @@ HRESULT FamiliesManager::RegisterMembers(REFCLSID clsid, ULONG count, const GUID
                                          const wchar_t* name, HINSTANCE) {
     if (!name)
         return E_POINTER;
-    if (IsEqualGUID(clsid, GUID_NULL))
-        return E_INVALIDARG;
-    if (HRESULT hr = CheckFamilies(count, families); FAILED(hr))
+    if (HRESULT hr = CheckMembers(clsid, count, families); FAILED(hr))
         return hr;
-    if (HRESULT hr = sdk::CheckHostFault("IGWFamiliesManager::RegisterMembers"); FAILED(hr))
-        return hr;
-    return ExportBoundary([&] {
-        return sdk::Batched(
-            [&] {
-                const DWORD flagValue = flag ? 1 : 0;
-                for (ULONG i = 0; i < count; ++i) {
-                    UniqueHKey key;
-                    LONG result = CreateKey(HKEY_LOCAL_MACHINE, MemberKey(families[i], clsid).c_str(), key);
-                    if (result == ERROR_SUCCESS)
-                        result = SetText(key.get(), L"Name", name);
-                    if (result == ERROR_SUCCESS)
-                        result = RegSetValueExW(key.get(), L"Flag", 0, REG_DWORD,
-                                                reinterpret_cast<const BYTE*>(&flagValue), sizeof flagValue);
-                    if (result != ERROR_SUCCESS)
-                        return FromRegistry(result);
-                }
-                return S_OK;
-            },
-            E_FAIL);
+    return Write("IGWFamiliesManager::RegisterMembers", [&] {
+        const DWORD flagValue = flag ? 1 : 0;
+        for (ULONG i = 0; i < count; ++i) {
+            UniqueHKey key;
+            LONG result = CreateKey(HKEY_LOCAL_MACHINE, MemberKey(families[i], clsid).c_str(), key);
+            if (result == ERROR_SUCCESS)
+                result = SetText(key.get(), L"Name", name);
+            if (result == ERROR_SUCCESS)
+                result = RegSetValueExW(key.get(), L"Flag", 0, REG_DWORD,
+                                        reinterpret_cast<const BYTE*>(&flagValue), sizeof flagValue);
+            if (result != ERROR_SUCCESS)
+                return FromRegistry(result);
+        }
+        return S_OK;
     });
 }
 
 HRESULT FamiliesManager::UnregisterMembers(REFCLSID clsid, ULONG count, const GUID* families, HINSTANCE) {
-    if (IsEqualGUID(clsid, GUID_NULL))
-        return E_INVALIDARG;
-    if (HRESULT hr = CheckFamilies(count, families); FAILED(hr))
+    if (HRESULT hr = CheckMembers(clsid, count, families); FAILED(hr))
         return hr;
-    if (HRESULT hr = sdk::CheckHostFault("IGWFamiliesManager::UnregisterMembers"); FAILED(hr))
-        return hr;
-    return ExportBoundary([&] {
-        return sdk::Batched(
-            [&] {
-                bool all = true;
-                for (ULONG i = 0; i < count; ++i) {
-                    LONG deleted = RegDeleteKeyW(HKEY_LOCAL_MACHINE, MemberKey(families[i], clsid).c_str());
-                    if (deleted != ERROR_SUCCESS && deleted != ERROR_FILE_NOT_FOUND)
-                        return FromRegistry(deleted);
-                    all &= deleted == ERROR_SUCCESS;
-                    if (HRESULT dropped = DropWhatIsEmpty(families[i]); FAILED(dropped))
-                        return dropped;
-                }
-                return all ? S_OK : S_FALSE;
-            },
-            E_FAIL);
+    return Write("IGWFamiliesManager::UnregisterMembers", [&] {
+        bool all = true;
+        for (ULONG i = 0; i < count; ++i) {
+            LONG deleted = RegDeleteKeyW(HKEY_LOCAL_MACHINE, MemberKey(families[i], clsid).c_str());
+            if (deleted != ERROR_SUCCESS && deleted != ERROR_FILE_NOT_FOUND)
+                return FromRegistry(deleted);
+            all &= deleted == ERROR_SUCCESS;
+            if (HRESULT dropped = DropWhatIsEmpty(families[i]); FAILED(dropped))
+                return dropped;
+        }
+        return all ? S_OK : S_FALSE;
     });
 }
 
@@ -231,9 +217,7 @@ HRESULT FamiliesManager::EnumMembers(REFGUID family, IGWEnumGUID** members) {
     *members = nullptr;
     if (IsEqualGUID(family, GUID_NULL))
         return E_INVALIDARG;
-    if (HRESULT hr = sdk::CheckHostFault("IGWFamiliesManager::EnumMembers"); FAILED(hr))
-        return hr;
-    return ExportBoundary([&] {
+    return Read("IGWFamiliesManager::EnumMembers", [&] {
         std::vector<GUID> ids;
         if (UniqueHKey key = sdk::OpenKey(HKEY_LOCAL_MACHINE, MembersKey(family).c_str())) {
             LONG listed = sdk::ForEachSubKey(key.get(), [&](const wchar_t* name) {
@@ -253,10 +237,9 @@ HRESULT FamiliesManager::EnumMembers(REFGUID family, IGWEnumGUID** members) {
 HRESULT FamiliesManager::IsMember(REFCLSID clsid, REFGUID family) {
     if (IsEqualGUID(clsid, GUID_NULL) || IsEqualGUID(family, GUID_NULL))
         return E_INVALIDARG;
-    if (HRESULT hr = sdk::CheckHostFault("IGWFamiliesManager::IsMember"); FAILED(hr))
-        return hr;
-    return ExportBoundary(
-        [&] { return sdk::OpenKey(HKEY_LOCAL_MACHINE, MemberKey(family, clsid).c_str()) ? S_OK : S_FALSE; });
+    return Read("IGWFamiliesManager::IsMember", [&] {
+        return sdk::OpenKey(HKEY_LOCAL_MACHINE, MemberKey(family, clsid).c_str()) ? S_OK : S_FALSE;
+    });
 }
 
 } // namespace ut::host

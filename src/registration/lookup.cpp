@@ -64,13 +64,16 @@ HRESULT GetCLSIDList(const wchar_t* keyName, DWORD* count, GUID** list) {
     return ListSubKeyIds(std::move(category), count, list);
 }
 
+// Opens the category for reading, then the class key below it by its identifier text.
+UniqueHKey OpenClassKey(const wchar_t* category, const GUID& clsid) {
+    UniqueHKey categoryKey = Open(HKEY_LOCAL_MACHINE, CategoryKey(category));
+    return categoryKey ? Open(categoryKey.get(), GuidToString(clsid)) : nullptr;
+}
+
 HRESULT GetManipulator3DControls(const GUID& manipulator, DWORD* count, GUID** list) {
     *count = 0;
     *list = nullptr;
-    UniqueHKey category = Open(HKEY_LOCAL_MACHINE, CategoryKey(L"Manipulator"));
-    if (!category)
-        return E_FAIL;
-    UniqueHKey classKey = Open(category.get(), GuidToString(manipulator));
+    UniqueHKey classKey = OpenClassKey(L"Manipulator", manipulator);
     if (!classKey)
         return E_FAIL;
     return ListSubKeyIds(std::move(classKey), count, list);
@@ -91,10 +94,7 @@ HRESULT GetQDEFFilename(const GUID& clsid, wchar_t* fileName, DWORD* byteCount) 
 }
 
 HRESULT GetCorvaneViewName(const GUID& clsid, wchar_t* name) {
-    UniqueHKey category = Open(HKEY_LOCAL_MACHINE, CategoryKey(L"View"));
-    if (!category)
-        return E_FAIL;
-    UniqueHKey classKey = Open(category.get(), GuidToString(clsid));
+    UniqueHKey classKey = OpenClassKey(L"View", clsid);
     if (!classKey)
         return E_FAIL;
     DWORD bytes = TextBytes(kShortTextCapacity);

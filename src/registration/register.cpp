@@ -22,36 +22,49 @@ const wchar_t* TextOf(HINSTANCE module, unsigned int id) {
     return KXDictLoadInstanceIdstring(module, id);
 }
 
+// Every export of this file: its body under the guard, a registry write that is lost giving 1.
+template <class Body>
+HRESULT Registration(Body&& body) {
+    return Guarded(S_FALSE, static_cast<Body&&>(body));
+}
+
 // The COM entry, then the category's "Name" record (0, or 1 when it could not be written).
 HRESULT RegisterNamed(const GUID& clsid, const wchar_t* category, HINSTANCE module, const wchar_t* name) {
-    HRESULT hr = GWRegisterCOMObject(clsid, module, name);
-    if (FAILED(hr))
-        return hr;
-    return KXAddRegistryKey(clsid, category, kName, name);
+    return Registration([&] {
+        HRESULT hr = GWRegisterCOMObject(clsid, module, name);
+        return FAILED(hr) ? hr : KXAddRegistryKey(clsid, category, kName, name);
+    });
 }
 
 HRESULT RegisterNamedId(const GUID& clsid, const wchar_t* category, HINSTANCE module, unsigned int nameId) {
-    if (nameId == 0)
-        return E_FAIL;
-    return RegisterNamed(clsid, category, module, TextOf(module, nameId));
+    return nameId == 0 ? E_FAIL : RegisterNamed(clsid, category, module, TextOf(module, nameId));
+}
+
+// The Ex forms: the class and its record, then its companion and families (`more`); the record's
+// result does not count.
+template <class More>
+HRESULT RegisterEx(const GUID& clsid, const wchar_t* category, HINSTANCE module, unsigned int nameId,
+                   More&& more) {
+    return Registration([&] {
+        HRESULT hr = RegisterNamedId(clsid, category, module, nameId);
+        return FAILED(hr) ? hr : more();
+    });
 }
 
 HRESULT RegisterInspectable(const GUID& clsid, const wchar_t* category, HINSTANCE module, unsigned int nameId,
                             const GUID& companion, unsigned int companionNameId, const GUID& family) {
-    HRESULT hr = RegisterNamedId(clsid, category, module, nameId);
-    if (FAILED(hr))
-        return hr;
-    return KXRegisterInspectableObject(clsid, module, nameId, companion, companionNameId, family);
+    return RegisterEx(clsid, category, module, nameId, [&] {
+        return KXRegisterInspectableObject(clsid, module, nameId, companion, companionNameId, family);
+    });
 }
 
 HRESULT RegisterInspectable(const GUID& clsid, const wchar_t* category, HINSTANCE module, unsigned int nameId,
                             bool flag, const GUID& companion, unsigned int companionNameId,
                             unsigned int familyCount, const GUID* families) {
-    HRESULT hr = RegisterNamedId(clsid, category, module, nameId);
-    if (FAILED(hr))
-        return hr;
-    return KXRegisterInspectableObject(clsid, module, nameId, flag, companion, companionNameId, familyCount,
-                                       families);
+    return RegisterEx(clsid, category, module, nameId, [&] {
+        return KXRegisterInspectableObject(clsid, module, nameId, flag, companion, companionNameId,
+                                           familyCount, families);
+    });
 }
 
 void CleanCategory(const wchar_t* category) {
@@ -59,10 +72,12 @@ void CleanCategory(const wchar_t* category) {
 }
 
 HRESULT UnregisterCategory(const GUID& clsid, const wchar_t* category) {
-    (void)GWUnregisterCOMObject(clsid); // the record goes whether or not the class was entered
-    HRESULT hr = KXRemRegistryKey(clsid, category);
-    CleanCategory(category);
-    return hr;
+    return Registration([&] {
+        (void)GWUnregisterCOMObject(clsid); // the record goes whether or not the class was entered
+        HRESULT hr = KXRemRegistryKey(clsid, category);
+        CleanCategory(category);
+        return hr;
+    });
 }
 
 // The first steps of the Ex forms' removal, whose results are not used.
@@ -74,14 +89,18 @@ void UnregisterExClass(const GUID& clsid, const wchar_t* category) {
 
 HRESULT UnregisterInspectable(const GUID& clsid, const wchar_t* category, const GUID& companion,
                               unsigned int familyCount, const GUID* families, HINSTANCE module) {
-    UnregisterExClass(clsid, category);
-    return KXUnRegisterInspectableObject(clsid, companion, familyCount, families, module);
+    return Registration([&] {
+        UnregisterExClass(clsid, category);
+        return KXUnRegisterInspectableObject(clsid, companion, familyCount, families, module);
+    });
 }
 
 HRESULT UnregisterInspectable(const GUID& clsid, const wchar_t* category, const GUID& companion,
                               const GUID& family, HINSTANCE module) {
-    UnregisterExClass(clsid, category);
-    return KXUnRegisterInspectableObject(clsid, companion, family, module);
+    return Registration([&] {
+        UnregisterExClass(clsid, category);
+        return KXUnRegisterInspectableObject(clsid, companion, family, module);
+    });
 }
 
 HRESULT RegisterManipulator(const GUID& clsid, HINSTANCE module, const wchar_t* name,
@@ -131,88 +150,76 @@ using ut::UniqueHKey;
 // --- By name and by string identifier
 
 HRESULT KXRegisterOperator(const GUID& clsid, HINSTANCE module, const wchar_t* name) {
-    return Guarded(S_FALSE, [&] { return RegisterNamed(clsid, L"Operator", module, name); });
+    return RegisterNamed(clsid, L"Operator", module, name);
 }
 HRESULT KXRegisterProperty(const GUID& clsid, HINSTANCE module, const wchar_t* name) {
-    return Guarded(S_FALSE, [&] { return RegisterNamed(clsid, L"Property", module, name); });
+    return RegisterNamed(clsid, L"Property", module, name);
 }
 HRESULT KXRegisterPrimitive(const GUID& clsid, HINSTANCE module, const wchar_t* name) {
-    return Guarded(S_FALSE, [&] { return RegisterNamed(clsid, L"Primitive", module, name); });
+    return RegisterNamed(clsid, L"Primitive", module, name);
 }
 HRESULT KXRegisterView(const GUID& clsid, HINSTANCE module, const wchar_t* name) {
-    return Guarded(S_FALSE, [&] { return RegisterNamed(clsid, L"View", module, name); });
+    return RegisterNamed(clsid, L"View", module, name);
 }
 HRESULT KXRegisterPointLocatorArray(const GUID& clsid, HINSTANCE module, const wchar_t* name) {
-    return Guarded(S_FALSE, [&] { return RegisterNamed(clsid, L"PointLocatorArray", module, name); });
+    return RegisterNamed(clsid, L"PointLocatorArray", module, name);
 }
 HRESULT KXRegisterOperator(const GUID& clsid, HINSTANCE module, unsigned int nameId) {
-    return Guarded(S_FALSE, [&] { return RegisterNamedId(clsid, L"Operator", module, nameId); });
+    return RegisterNamedId(clsid, L"Operator", module, nameId);
 }
 HRESULT KXRegisterProperty(const GUID& clsid, HINSTANCE module, unsigned int nameId) {
-    return Guarded(S_FALSE, [&] { return RegisterNamedId(clsid, L"Property", module, nameId); });
+    return RegisterNamedId(clsid, L"Property", module, nameId);
 }
 HRESULT KXRegisterPrimitive(const GUID& clsid, HINSTANCE module, unsigned int nameId) {
-    return Guarded(S_FALSE, [&] { return RegisterNamedId(clsid, L"Primitive", module, nameId); });
+    return RegisterNamedId(clsid, L"Primitive", module, nameId);
 }
 HRESULT KXRegisterView(const GUID& clsid, HINSTANCE module, unsigned int nameId) {
-    return Guarded(S_FALSE, [&] { return RegisterNamedId(clsid, L"View", module, nameId); });
+    return RegisterNamedId(clsid, L"View", module, nameId);
 }
 
 // --- Ex forms
 
 HRESULT KXRegisterOperatorEx(const GUID& clsid, HINSTANCE module, unsigned int nameId, const GUID& companion,
                              unsigned int companionNameId, const GUID& family) {
-    return Guarded(S_FALSE, [&] {
-        return RegisterInspectable(clsid, L"Operator", module, nameId, companion, companionNameId, family);
-    });
+    return RegisterInspectable(clsid, L"Operator", module, nameId, companion, companionNameId, family);
 }
 HRESULT KXRegisterPropertyEx(const GUID& clsid, HINSTANCE module, unsigned int nameId, const GUID& companion,
                              unsigned int companionNameId, const GUID& family) {
-    return Guarded(S_FALSE, [&] {
-        return RegisterInspectable(clsid, L"Property", module, nameId, companion, companionNameId, family);
-    });
+    return RegisterInspectable(clsid, L"Property", module, nameId, companion, companionNameId, family);
 }
 HRESULT KXRegisterOperatorEx(const GUID& clsid, HINSTANCE module, unsigned int nameId, bool flag,
                              const GUID& companion, unsigned int companionNameId, unsigned int familyCount,
                              const GUID* families) {
-    return Guarded(S_FALSE, [&] {
-        return RegisterInspectable(clsid, L"Operator", module, nameId, flag, companion, companionNameId,
-                                   familyCount, families);
-    });
+    return RegisterInspectable(clsid, L"Operator", module, nameId, flag, companion, companionNameId,
+                               familyCount, families);
 }
 HRESULT KXRegisterPropertyEx(const GUID& clsid, HINSTANCE module, unsigned int nameId, bool flag,
                              const GUID& companion, unsigned int companionNameId, unsigned int familyCount,
                              const GUID* families) {
-    return Guarded(S_FALSE, [&] {
-        return RegisterInspectable(clsid, L"Property", module, nameId, flag, companion, companionNameId,
-                                   familyCount, families);
-    });
+    return RegisterInspectable(clsid, L"Property", module, nameId, flag, companion, companionNameId,
+                               familyCount, families);
 }
 HRESULT KXRegisterPrimitiveEx(const GUID& clsid, HINSTANCE module, unsigned int nameId, bool flag,
                               const GUID& companion, unsigned int companionNameId, unsigned int familyCount,
                               const GUID* families) {
-    return Guarded(S_FALSE, [&] {
-        return RegisterInspectable(clsid, L"Primitive", module, nameId, flag, companion, companionNameId,
-                                   familyCount, families);
-    });
+    return RegisterInspectable(clsid, L"Primitive", module, nameId, flag, companion, companionNameId,
+                               familyCount, families);
 }
 HRESULT KXRegisterConstraint(const GUID& clsid, HINSTANCE module, unsigned int nameId, bool flag,
                              const GUID& companion, unsigned int companionNameId, unsigned int familyCount,
                              const GUID* families) {
-    return Guarded(S_FALSE, [&] {
-        return RegisterInspectable(clsid, L"Constraint", module, nameId, flag, companion, companionNameId,
-                                   familyCount, families);
-    });
+    return RegisterInspectable(clsid, L"Constraint", module, nameId, flag, companion, companionNameId,
+                               familyCount, families);
 }
 
 // --- Caller-named categories, paths, inspectors, manipulators and families
 
 HRESULT KXRegisterKeyName(const GUID& clsid, const wchar_t* keyName, HINSTANCE module, const wchar_t* name) {
-    return Guarded(S_FALSE, [&] { return RegisterNamed(clsid, keyName, module, name); });
+    return RegisterNamed(clsid, keyName, module, name);
 }
 HRESULT KXRegisterKeyNameId(const GUID& clsid, const wchar_t* keyName, HINSTANCE module,
                             unsigned int nameId) {
-    return Guarded(S_FALSE, [&] { return RegisterNamedId(clsid, keyName, module, nameId); });
+    return RegisterNamedId(clsid, keyName, module, nameId);
 }
 HRESULT KXRegisterKeyPath(const GUID& clsid, const wchar_t* keyName, const wchar_t* path) {
     return KXAddRegistryKey(clsid, keyName, kPath, path);
@@ -225,7 +232,7 @@ HRESULT KXRegisterResources(const GUID& clsid, const wchar_t* path) {
 }
 
 HRESULT KXRegisterViewInspector(const GUID& clsid, HINSTANCE module, const GUID& inspectedView) {
-    return Guarded(S_FALSE, [&] {
+    return Registration([&] {
         CKXString name = CKXString::FromGUID(inspectedView);
         HRESULT hr = GWRegisterCOMObject(clsid, module, name);
         if (SUCCEEDED(hr))
@@ -240,7 +247,7 @@ HRESULT KXRegisterManipulator(const GUID& clsid, HINSTANCE module, const wchar_t
         return E_INVALIDARG;
     if (!controls)
         return E_POINTER;
-    return Guarded(S_FALSE, [&] { return RegisterManipulator(clsid, module, name, controlCount, controls); });
+    return Registration([&] { return RegisterManipulator(clsid, module, name, controlCount, controls); });
 }
 
 HRESULT KXRegisterObjectFamilies(const GUID& clsid, HINSTANCE module, unsigned int nameId, bool flag,
@@ -253,7 +260,7 @@ HRESULT KXRegisterObjectFamilies(const GUID& clsid, HINSTANCE module, unsigned i
 HRESULT KXRegisterInspectableObject(const GUID& clsid, HINSTANCE module, unsigned int nameId, bool flag,
                                     const GUID& companion, unsigned int companionNameId,
                                     unsigned int familyCount, const GUID* families) {
-    return Guarded(S_FALSE, [&] {
+    return Registration([&] {
         HRESULT hr = S_OK;
         if (!IsNull(companion)) {
             hr = GWRegisterCOMObject(companion, module, TextOf(module, companionNameId));
@@ -275,7 +282,7 @@ HRESULT KXRegisterInspectableObject(const GUID& clsid, HINSTANCE module, unsigne
 
 HRESULT KXRegisterInspectableObject(const GUID& clsid, HINSTANCE module, unsigned int /*nameId*/,
                                     const GUID& companion, unsigned int companionNameId, const GUID& family) {
-    return Guarded(S_FALSE, [&] {
+    return Registration([&] {
         const wchar_t* name = TextOf(module, companionNameId);
         HRESULT hr = S_OK;
         if (!IsNull(companion)) {
@@ -299,61 +306,51 @@ HRESULT KXRegisterInspectableObject(const GUID& clsid, HINSTANCE module, unsigne
 // --- Unregistration
 
 HRESULT KXUnRegisterOperator(const GUID& clsid) {
-    return Guarded(S_FALSE, [&] { return UnregisterCategory(clsid, L"Operator"); });
+    return UnregisterCategory(clsid, L"Operator");
 }
 HRESULT KXUnRegisterProperty(const GUID& clsid) {
-    return Guarded(S_FALSE, [&] { return UnregisterCategory(clsid, L"Property"); });
+    return UnregisterCategory(clsid, L"Property");
 }
 HRESULT KXUnRegisterPrimitive(const GUID& clsid) {
-    return Guarded(S_FALSE, [&] { return UnregisterCategory(clsid, L"Primitive"); });
+    return UnregisterCategory(clsid, L"Primitive");
 }
 HRESULT KXUnRegisterView(const GUID& clsid) {
-    return Guarded(S_FALSE, [&] { return UnregisterCategory(clsid, L"View"); });
+    return UnregisterCategory(clsid, L"View");
 }
 HRESULT KXUnRegisterPointLocatorArray(const GUID& clsid) {
-    return Guarded(S_FALSE, [&] { return UnregisterCategory(clsid, L"PointLocatorArray"); });
+    return UnregisterCategory(clsid, L"PointLocatorArray");
 }
 HRESULT KXUnRegisterViewInspector(const GUID& clsid) {
-    return Guarded(S_FALSE, [&] { return UnregisterCategory(clsid, L"Inspector View"); });
+    return UnregisterCategory(clsid, L"Inspector View");
 }
 
 HRESULT KXUnRegisterOperatorEx(const GUID& clsid, const GUID& companion, unsigned int familyCount,
                                const GUID* families, HINSTANCE module) {
-    return Guarded(S_FALSE, [&] {
-        return UnregisterInspectable(clsid, L"Operator", companion, familyCount, families, module);
-    });
+    return UnregisterInspectable(clsid, L"Operator", companion, familyCount, families, module);
 }
 HRESULT KXUnRegisterPropertyEx(const GUID& clsid, const GUID& companion, unsigned int familyCount,
                                const GUID* families, HINSTANCE module) {
-    return Guarded(S_FALSE, [&] {
-        return UnregisterInspectable(clsid, L"Property", companion, familyCount, families, module);
-    });
+    return UnregisterInspectable(clsid, L"Property", companion, familyCount, families, module);
 }
 HRESULT KXUnRegisterPrimitiveEx(const GUID& clsid, const GUID& companion, unsigned int familyCount,
                                 const GUID* families, HINSTANCE module) {
-    return Guarded(S_FALSE, [&] {
-        return UnregisterInspectable(clsid, L"Primitive", companion, familyCount, families, module);
-    });
+    return UnregisterInspectable(clsid, L"Primitive", companion, familyCount, families, module);
 }
 HRESULT KXUnRegisterConstraint(const GUID& clsid, const GUID& companion, unsigned int familyCount,
                                const GUID* families, HINSTANCE module) {
-    return Guarded(S_FALSE, [&] {
-        return UnregisterInspectable(clsid, L"Constraint", companion, familyCount, families, module);
-    });
+    return UnregisterInspectable(clsid, L"Constraint", companion, familyCount, families, module);
 }
 HRESULT KXUnRegisterOperatorEx(const GUID& clsid, const GUID& companion, const GUID& family,
                                HINSTANCE module) {
-    return Guarded(S_FALSE,
-                   [&] { return UnregisterInspectable(clsid, L"Operator", companion, family, module); });
+    return UnregisterInspectable(clsid, L"Operator", companion, family, module);
 }
 HRESULT KXUnRegisterPropertyEx(const GUID& clsid, const GUID& companion, const GUID& family,
                                HINSTANCE module) {
-    return Guarded(S_FALSE,
-                   [&] { return UnregisterInspectable(clsid, L"Property", companion, family, module); });
+    return UnregisterInspectable(clsid, L"Property", companion, family, module);
 }
 
 HRESULT KXUnRegisterKeyName(const GUID& clsid, const wchar_t* keyName) {
-    return Guarded(S_FALSE, [&] {
+    return Registration([&] {
         (void)GWUnregisterCOMObject(clsid); // the record goes whether or not the class was entered
         return KXRemRegistryKey(clsid, keyName);
     });
@@ -366,12 +363,12 @@ HRESULT KXUnRegisterResources(const GUID& clsid) {
 }
 
 HRESULT KXUnRegisterManipulator(const GUID& clsid) {
-    return Guarded(S_FALSE, [&] { return UnregisterManipulator(clsid); });
+    return Registration([&] { return UnregisterManipulator(clsid); });
 }
 
 HRESULT KXUnRegisterInspectableObject(const GUID& clsid, const GUID& companion, unsigned int familyCount,
                                       const GUID* families, HINSTANCE module) {
-    return Guarded(S_FALSE, [&] {
+    return Registration([&] {
         HRESULT hr = S_OK;
         if (!IsNull(companion))
             hr = GWUnregisterCOMObject(companion);
@@ -383,7 +380,7 @@ HRESULT KXUnRegisterInspectableObject(const GUID& clsid, const GUID& companion, 
 
 HRESULT KXUnRegisterInspectableObject(const GUID& clsid, const GUID& companion, const GUID& family,
                                       HINSTANCE module) {
-    return Guarded(S_FALSE, [&] {
+    return Registration([&] {
         HRESULT hr = S_OK;
         if (!IsNull(companion))
             hr = GWUnregisterCOMObject(companion);

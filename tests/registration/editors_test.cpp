@@ -112,7 +112,7 @@ TEST_F(RegistrationTest, TheExplorersEditorIsAPreferenceWithTheRegistryBehindIt)
     {
         UniqueHKey key;
         ASSERT_EQ(sdk::CreateKey(HKEY_LOCAL_MACHINE, defaultEditor.c_str(), key), ERROR_SUCCESS);
-        ASSERT_EQ(sdk::SetText(key.get(), L"CLSID", ClassText(kTree).c_str()), ERROR_SUCCESS);
+        ASSERT_EQ(sdk::SetText(key.get(), L"CLSID", GuidToString(kTree).c_str()), ERROR_SUCCESS);
     }
     EXPECT_EQ(KXGetDefaultQVXExplorerEditor(&editor, nullptr), S_OK);
     EXPECT_EQ(editor, kTree);
@@ -160,8 +160,19 @@ TEST_F(RegistrationTest, SourceOperatorsListTheirViewsPerClassAndPerFamily) {
     EXPECT_EQ(ViewsOf(KXGetQVXExplorerSourceOpViews, kSourceOp, S_OK), (Ids{kView, kOther}));
     EXPECT_EQ(ViewsOf(KXGetQVXExplorerSourceOpViews, kTree, S_OK), Ids{kOther});
     EXPECT_EQ(ViewsOf(KXGetQVXExplorerSourceOpViews, kView, S_FALSE), Ids{});
-    // The animation editor has no family source operators.
+    // The animation editor has no family source operators; names that are no identifiers are skipped.
     EXPECT_EQ(ViewsOf(KXGetAnimationEditorSourceOpViews, kTree, S_FALSE), Ids{});
+    const std::wstring views = Base(L"Animation Editor\\SourceOps\\") + GuidToString(kSourceOp);
+    UniqueHKey stray, owner = sdk::OpenKey(HKEY_LOCAL_MACHINE, views.c_str(), sdk::kReadWrite);
+    ASSERT_EQ(sdk::CreateKey(HKEY_LOCAL_MACHINE, Base(L"Animation Editor\\SourceOps\\stray").c_str(), stray),
+              ERROR_SUCCESS);
+    ASSERT_EQ(sdk::SetText(owner.get(), L"stray", L"x"), ERROR_SUCCESS);
+    EXPECT_EQ(Listing(KXGetAnimationEditorSourceOps, S_OK), Ids{kSourceOp});
+    EXPECT_EQ(ViewsOf(KXGetAnimationEditorSourceOpViews, kSourceOp, S_OK), (Ids{kOther, kView}));
+    ASSERT_EQ(RegDeleteValueW(owner.get(), L"stray"), ERROR_SUCCESS);
+    ASSERT_EQ(RegDeleteKeyW(HKEY_LOCAL_MACHINE, Base(L"Animation Editor\\SourceOps\\stray").c_str()),
+              ERROR_SUCCESS);
+    owner.reset();
 
     // Removing the last view of an owner removes its key, then its emptied parents.
     EXPECT_EQ(KXUnRegisterAnimationEditorSourceOp(kSourceOp, kView), S_OK);
@@ -174,21 +185,6 @@ TEST_F(RegistrationTest, SourceOperatorsListTheirViewsPerClassAndPerFamily) {
     EXPECT_EQ(Listing(KXGetQVXExplorerSourceOps, S_FALSE), Ids{});
     EXPECT_EQ(KXUnRegisterQVXExplorerFamilySourceOp(kFamily, kOther), S_OK);
     EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, Base(L"QVX Explorer")));
-}
-
-TEST_F(RegistrationTest, NamesThatAreNoIdentifiersAreSkipped) {
-    HINSTANCE m = Module();
-    ASSERT_EQ(KXRegisterAnimationEditorSourceOp(kSourceOp, kView, m), S_OK);
-    UniqueHKey stray;
-    ASSERT_EQ(sdk::CreateKey(HKEY_LOCAL_MACHINE, Base(L"Animation Editor\\SourceOps\\stray").c_str(), stray),
-              ERROR_SUCCESS);
-    UniqueHKey views =
-        sdk::OpenKey(HKEY_LOCAL_MACHINE,
-                     Base(L"Animation Editor\\SourceOps\\" + ClassText(kSourceOp)).c_str(), sdk::kReadWrite);
-    ASSERT_TRUE(views);
-    ASSERT_EQ(sdk::SetText(views.get(), L"stray", L"x"), ERROR_SUCCESS);
-    EXPECT_EQ(Listing(KXGetAnimationEditorSourceOps, S_OK), std::vector<GUID>{kSourceOp});
-    EXPECT_EQ(ViewsOf(KXGetAnimationEditorSourceOpViews, kSourceOp, S_OK), std::vector<GUID>{kView});
 }
 
 } // namespace

@@ -59,7 +59,7 @@ TEST_F(RegistrationTest, EveryHostFailureEndsAsTheRulesSay) {
         UniqueHKey key;
         ASSERT_EQ(sdk::CreateKey(HKEY_LOCAL_MACHINE, Base(L"QVX Explorer\\DefaultEditor").c_str(), key),
                   ERROR_SUCCESS);
-        ASSERT_EQ(sdk::SetText(key.get(), L"CLSID", ClassText(kTree).c_str()), ERROR_SUCCESS);
+        ASSERT_EQ(sdk::SetText(key.get(), L"CLSID", GuidToString(kTree).c_str()), ERROR_SUCCESS);
     };
     const Walk walks[] = {
         {"operator", [] {}, [&] { return KXRegisterOperator(kClass, m, kTwist); }, Propagated},

@@ -1,10 +1,10 @@
 // A second process for the POSIX registration tests, on the store that UT_REGISTRY names:
 //
 //   registration_child register FIRST COUNT   registers the operators FIRST .. FIRST+COUNT-1, printing
-//                                             "pid N" first and then each number once its
-//                                             registration has returned
+//                                             each number once its registration has returned
 //   registration_child probe                  as an unprivileged user (when started as root), tries
 //                                             registrations and prints their results
+// Each starts by printing "pid N".
 #include <cstdio>
 #include <cstdlib>
 #include <string>
@@ -21,8 +21,6 @@ std::wstring OperatorName(long n) {
 }
 
 int Register(long first, long count) {
-    std::printf("pid %ld\n", static_cast<long>(getpid()));
-    std::fflush(stdout);
     for (long n = first; n < first + count; ++n) {
         HRESULT hr = KXRegisterOperator(ut::test::TestGuid(static_cast<ULONG>(n)), ut::test::TestModule(),
                                         OperatorName(n).c_str());
@@ -56,6 +54,8 @@ int Probe() {
 } // namespace
 
 int main(int argc, char** argv) {
+    std::printf("pid %ld\n", static_cast<long>(getpid()));
+    std::fflush(stdout);
     std::string command = argc > 1 ? argv[1] : "";
     if (command == "register" && argc == 4)
         return Register(std::atol(argv[2]), std::atol(argv[3]));

@@ -19,23 +19,28 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// A run of registration_child, its output read line by line.
+// A run of registration_child, its output read line by line after the "pid N" it starts with.
 class Child {
 public:
     explicit Child(const std::string& arguments)
-        : output_(popen(("exec " + std::string(UT_REGISTRATION_CHILD) + " " + arguments).c_str(), "r")) {}
-    ~Child() { (void)Wait(); } // a test that failed first may leave the child running
+        : output_(popen(("exec " + std::string(UT_REGISTRATION_CHILD) + " " + arguments).c_str(), "r")) {
+        std::string first = ReadLine().value_or("");
+        pid_ = first.rfind("pid ", 0) == 0 ? static_cast<pid_t>(std::stol(first.substr(4))) : -1;
+    }
+    ~Child() {
+        if (output_ && pid_ > 0)
+            Kill(); // a test that failed first may leave the child running
+        (void)Wait();
+    }
     Child(const Child&) = delete;
     Child& operator=(const Child&) = delete;
 
+    void Kill() { kill(pid_, SIGKILL); }
     std::optional<std::string> ReadLine() {
-        char line[128];
-        if (!output_ || !std::fgets(line, sizeof line, output_))
-            return std::nullopt;
-        std::string text(line);
-        if (!text.empty() && text.back() == '\n')
-            text.pop_back();
-        return text;
+        std::string line;
+        for (int c; output_ && (c = std::fgetc(output_)) != EOF && c != '\n';)
+            line.push_back(static_cast<char>(c));
+        return line.empty() ? std::nullopt : std::optional(line);
     }
     // The exit status once the child's output is read to its end, or -1 when the child did not end
     // by itself.
@@ -51,6 +56,7 @@ public:
 
 private:
     std::FILE* output_;
+    pid_t pid_ = -1;
 };
 
 std::wstring OperatorName(long n) {
@@ -74,22 +80,21 @@ TEST_F(RegistrationTest, AKilledWriterLosesNoRegistrationThatHadReturned) {
     std::vector<long> returned;
     {
         Child writer("register 0 1000000");
-        std::optional<std::string> pid = writer.ReadLine();
-        ASSERT_TRUE(pid && pid->rfind("pid ", 0) == 0);
         while (returned.size() < 40) {
             std::optional<std::string> line = writer.ReadLine();
             ASSERT_TRUE(line);
             returned.push_back(std::stol(*line));
         }
-        kill(static_cast<pid_t>(std::stol(pid->substr(4))), SIGKILL);
+        writer.Kill();
         while (std::optional<std::string> line = writer.ReadLine())
             returned.push_back(std::stol(*line));
         EXPECT_EQ(writer.Wait(), -1);
     }
     for (long n : returned) {
         ASSERT_EQ(NameOf(L"Operator", TestGuid(static_cast<ULONG>(n))), OperatorName(n)) << n;
-        ASSERT_EQ(TextAt(HKEY_CLASSES_ROOT, L"CLSID\\" + ClassText(TestGuid(static_cast<ULONG>(n))), nullptr),
-                  OperatorName(n));
+        ASSERT_EQ(
+            TextAt(HKEY_CLASSES_ROOT, L"CLSID\\" + GuidToString(TestGuid(static_cast<ULONG>(n))), nullptr),
+            OperatorName(n));
     }
     // The interrupted registration, if any, is there whole or not at all.
     EXPECT_GE(Listed(L"Operator").size(), returned.size());

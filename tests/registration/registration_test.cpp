@@ -3,6 +3,7 @@
 #include "registration/registration_test.h"
 
 #include <functional>
+#include <memory>
 
 #include <ut/platform/process.h>
 #include <ut/registration.h>
@@ -24,9 +25,7 @@ std::vector<GUID> Listed(const wchar_t* category, HRESULT* hr) {
     std::unique_ptr<GUID, TaskMemDeleter> owned(list);
     if (hr)
         *hr = listed;
-    if (FAILED(listed))
-        return {GUID_NULL};
-    return std::vector<GUID>(list, list + count);
+    return FAILED(listed) ? std::vector<GUID>{GUID_NULL} : std::vector<GUID>(list, list + count);
 }
 
 std::wstring NameOf(const wchar_t* category, const GUID& clsid) {
@@ -49,122 +48,93 @@ std::wstring Base(const std::wstring& path) {
     return LibraryBaseKey() + path;
 }
 
-std::wstring ClassText(const GUID& clsid) {
-    return GuidToString(clsid);
-}
-
 namespace {
 
 using Getter = HRESULT (*)(const GUID&, wchar_t*, DWORD*);
 
 std::wstring ComName(const GUID& clsid) {
-    return TextAt(HKEY_CLASSES_ROOT, L"CLSID\\" + ClassText(clsid), nullptr);
+    return TextAt(HKEY_CLASSES_ROOT, L"CLSID\\" + GuidToString(clsid), nullptr);
 }
 
-std::wstring ByGetter(Getter getter, const GUID& clsid) {
-    wchar_t name[80] = L"";
-    DWORD bytes = sizeof name;
-    return getter(clsid, name, &bytes) == S_OK ? std::wstring(name) : L"<failed>";
+std::wstring FamilyKey(const GUID& family) {
+    return L"Software\\ut\\Families\\" + GuidToString(family);
 }
 
-const GUID kClass = TestGuid(1);
+const GUID kClass = TestGuid(1), kCompanion = TestGuid(2), kFamily = TestGuid(50),
+           kOtherFamily = TestGuid(51);
 const GUID kControls[] = {TestGuid(5), TestGuid(6)};
-const std::wstring kInspected = ClassText(TestGuid(99));
+const wchar_t* const kPath = L"c:\\plugins\\twist.dll";
 
 struct Form {
     const char* label;
-    std::function<HRESULT()> add;
+    std::function<HRESULT()> add, remove;
     const wchar_t* category;
-    const wchar_t* value; // "Name" or "Path"
-    std::wstring text;
-    bool entersClass; // a COM entry under the same text
-    Getter getter;    // the category's own name getter, if it has one
-    std::function<HRESULT()> remove;
+    std::wstring name; // the "Name" written, or empty for a "Path" record of kPath without COM entry
+    Getter getter;     // the category's own getter, if it has one
     HRESULT removed;
-    bool categoryStays; // the removal does not clean the category key
+    bool categoryStays; // the removal leaves the category key for GwRegCleanKey's caller
 };
 
 TEST_F(RegistrationTest, EveryFormWritesItsRecordThatReadsBackAndGoes) {
     HINSTANCE m = Module();
     const GUID& g = kClass;
-    const wchar_t* path = L"c:\\plugins\\twist.dll";
+    const GUID null = GUID_NULL;
     const Form forms[] = {
-        {"operator", [&] { return KXRegisterOperator(g, m, kTwist); }, L"Operator", L"Name", kTwist, true,
-         KXGetOperatorName, [&] { return KXUnRegisterOperator(g); }, S_OK, false},
-        {"property", [&] { return KXRegisterProperty(g, m, kTwist); }, L"Property", L"Name", kTwist, true,
-         KXGetPropertyName, [&] { return KXUnRegisterProperty(g); }, S_OK, false},
-        {"primitive", [&] { return KXRegisterPrimitive(g, m, kTwist); }, L"Primitive", L"Name", kTwist, true,
-         KXGetPrimitiveName, [&] { return KXUnRegisterPrimitive(g); }, S_OK, false},
-        {"view", [&] { return KXRegisterView(g, m, kTwist); }, L"View", L"Name", kTwist, true, KXGetViewName,
-         [&] { return KXUnRegisterView(g); }, S_OK, false},
-        {"point locators", [&] { return KXRegisterPointLocatorArray(g, m, kTwist); }, L"PointLocatorArray",
-         L"Name", kTwist, true, nullptr, [&] { return KXUnRegisterPointLocatorArray(g); }, S_OK, false},
-        {"operator by id", [&] { return KXRegisterOperator(g, m, kTwistId); }, L"Operator", L"Name", kTwist,
-         true, KXGetOperatorName, [&] { return KXUnRegisterOperator(g); }, S_OK, false},
-        {"property by id", [&] { return KXRegisterProperty(g, m, kTwistId); }, L"Property", L"Name", kTwist,
-         true, KXGetPropertyName, [&] { return KXUnRegisterProperty(g); }, S_OK, false},
-        {"primitive by id", [&] { return KXRegisterPrimitive(g, m, kTwistId); }, L"Primitive", L"Name",
-         kTwist, true, KXGetPrimitiveName, [&] { return KXUnRegisterPrimitive(g); }, S_OK, false},
-        {"view by id", [&] { return KXRegisterView(g, m, kTwistId); }, L"View", L"Name", kTwist, true,
-         KXGetViewName, [&] { return KXUnRegisterView(g); }, S_OK, false},
-        {"operator ex, one family",
-         [&] { return KXRegisterOperatorEx(g, m, kTwistId, GUID_NULL, 0, GUID_NULL); }, L"Operator", L"Name",
-         kTwist, true, nullptr, [&] { return KXUnRegisterOperatorEx(g, GUID_NULL, GUID_NULL, m); }, S_OK,
+        {"operator", [&] { return KXRegisterOperator(g, m, kTwist); },
+         [&] { return KXUnRegisterOperator(g); }, L"Operator", kTwist, KXGetOperatorName, S_OK, false},
+        {"property", [&] { return KXRegisterProperty(g, m, kTwist); },
+         [&] { return KXUnRegisterProperty(g); }, L"Property", kTwist, KXGetPropertyName, S_OK, false},
+        {"primitive", [&] { return KXRegisterPrimitive(g, m, kTwist); },
+         [&] { return KXUnRegisterPrimitive(g); }, L"Primitive", kTwist, KXGetPrimitiveName, S_OK, false},
+        {"view", [&] { return KXRegisterView(g, m, kTwist); }, [&] { return KXUnRegisterView(g); }, L"View",
+         kTwist, KXGetViewName, S_OK, false},
+        {"point locators", [&] { return KXRegisterPointLocatorArray(g, m, kTwist); },
+         [&] { return KXUnRegisterPointLocatorArray(g); }, L"PointLocatorArray", kTwist, nullptr, S_OK,
          false},
-        {"property ex, one family",
-         [&] { return KXRegisterPropertyEx(g, m, kTwistId, GUID_NULL, 0, GUID_NULL); }, L"Property", L"Name",
-         kTwist, true, nullptr, [&] { return KXUnRegisterPropertyEx(g, GUID_NULL, GUID_NULL, m); }, S_OK,
+        {"operator by id", [&] { return KXRegisterOperator(g, m, kTwistId); },
+         [&] { return KXUnRegisterOperator(g); }, L"Operator", kTwist, KXGetOperatorName, S_OK, false},
+        {"operator ex", [&] { return KXRegisterOperatorEx(g, m, kTwistId, null, 0, null); },
+         [&] { return KXUnRegisterOperatorEx(g, null, null, m); }, L"Operator", kTwist, nullptr, S_OK, false},
+        {"property ex, list", [&] { return KXRegisterPropertyEx(g, m, kTwistId, true, null, 0, 0, nullptr); },
+         [&] { return KXUnRegisterPropertyEx(g, null, 0, nullptr, m); }, L"Property", kTwist, nullptr, S_OK,
          false},
-        {"operator ex, family list",
-         [&] { return KXRegisterOperatorEx(g, m, kTwistId, true, GUID_NULL, 0, 0, nullptr); }, L"Operator",
-         L"Name", kTwist, true, nullptr, [&] { return KXUnRegisterOperatorEx(g, GUID_NULL, 0, nullptr, m); },
+        {"primitive ex", [&] { return KXRegisterPrimitiveEx(g, m, kTwistId, true, null, 0, 0, nullptr); },
+         [&] { return KXUnRegisterPrimitiveEx(g, null, 0, nullptr, m); }, L"Primitive", kTwist, nullptr, S_OK,
+         false},
+        {"constraint", [&] { return KXRegisterConstraint(g, m, kTwistId, true, null, 0, 0, nullptr); },
+         [&] { return KXUnRegisterConstraint(g, null, 0, nullptr, m); }, L"Constraint", kTwist, nullptr, S_OK,
+         false},
+        {"caller's category", [&] { return KXRegisterKeyName(g, L"Deformers", m, kTwist); },
+         [&] { return KXUnRegisterKeyName(g, L"Deformers"); }, L"Deformers", kTwist, nullptr, S_OK, true},
+        {"caller's path", [&] { return KXRegisterKeyPath(g, L"Shaders", kPath); },
+         [&] { return KXUnRegisterKeyName(g, L"Shaders"); }, L"Shaders", L"", nullptr, S_OK, true},
+        {"translator", [&] { return KXRegisterTranslator(g, kPath); },
+         [&] { return KXUnRegisterTranslator(g); }, L"Translator", L"", nullptr, S_OK, true},
+        {"resources", [&] { return KXRegisterResources(g, kPath); }, [&] { return KXUnRegisterResources(g); },
+         L"Resources", L"", nullptr, S_OK, true},
+        {"view inspector", [&] { return KXRegisterViewInspector(g, m, TestGuid(99)); },
+         [&] { return KXUnRegisterViewInspector(g); }, L"Inspector View", GuidToString(TestGuid(99)), nullptr,
          S_OK, false},
-        {"property ex, family list",
-         [&] { return KXRegisterPropertyEx(g, m, kTwistId, true, GUID_NULL, 0, 0, nullptr); }, L"Property",
-         L"Name", kTwist, true, nullptr, [&] { return KXUnRegisterPropertyEx(g, GUID_NULL, 0, nullptr, m); },
-         S_OK, false},
-        {"primitive ex",
-         [&] { return KXRegisterPrimitiveEx(g, m, kTwistId, true, GUID_NULL, 0, 0, nullptr); }, L"Primitive",
-         L"Name", kTwist, true, nullptr, [&] { return KXUnRegisterPrimitiveEx(g, GUID_NULL, 0, nullptr, m); },
-         S_OK, false},
-        {"constraint", [&] { return KXRegisterConstraint(g, m, kTwistId, true, GUID_NULL, 0, 0, nullptr); },
-         L"Constraint", L"Name", kTwist, true, nullptr,
-         [&] { return KXUnRegisterConstraint(g, GUID_NULL, 0, nullptr, m); }, S_OK, false},
-        {"caller's category", [&] { return KXRegisterKeyName(g, L"Deformers", m, kTwist); }, L"Deformers",
-         L"Name", kTwist, true, nullptr, [&] { return KXUnRegisterKeyName(g, L"Deformers"); }, S_OK, true},
-        {"caller's category by id", [&] { return KXRegisterKeyNameId(g, L"Deformers", m, kTwistId); },
-         L"Deformers", L"Name", kTwist, true, nullptr, [&] { return KXUnRegisterKeyName(g, L"Deformers"); },
-         S_OK, true},
-        {"caller's path", [&] { return KXRegisterKeyPath(g, L"Shaders", path); }, L"Shaders", L"Path", path,
-         false, nullptr, [&] { return KXUnRegisterKeyName(g, L"Shaders"); }, S_OK, true},
-        {"translator", [&] { return KXRegisterTranslator(g, path); }, L"Translator", L"Path", path, false,
-         nullptr, [&] { return KXUnRegisterTranslator(g); }, S_OK, true},
-        {"resources", [&] { return KXRegisterResources(g, path); }, L"Resources", L"Path", path, false,
-         nullptr, [&] { return KXUnRegisterResources(g); }, S_OK, true},
-        {"view inspector", [&] { return KXRegisterViewInspector(g, m, TestGuid(99)); }, L"Inspector View",
-         L"Name", kInspected, true, nullptr, [&] { return KXUnRegisterViewInspector(g); }, S_OK, false},
-        {"manipulator", [&] { return KXRegisterManipulator(g, m, kTwist, 2, kControls); }, L"Manipulator",
-         L"Name", kTwist, true, nullptr, [&] { return KXUnRegisterManipulator(g); }, S_FALSE, false},
+        {"manipulator", [&] { return KXRegisterManipulator(g, m, kTwist, 2, kControls); },
+         [&] { return KXUnRegisterManipulator(g); }, L"Manipulator", kTwist, nullptr, S_FALSE, false},
     };
     for (const Form& form : forms) {
         SCOPED_TRACE(form.label);
+        const bool named = !form.name.empty();
         ASSERT_EQ(form.add(), S_OK);
         EXPECT_EQ(Listed(form.category), std::vector<GUID>{g});
-        EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, Base(form.category) + L"\\" + ClassText(g), form.value),
-                  form.text);
-        if (std::wstring(form.value) == L"Name") {
-            EXPECT_EQ(NameOf(form.category, g), form.text);
-        }
-        if (form.getter) {
-            EXPECT_EQ(ByGetter(form.getter, g), form.text);
-        }
-        EXPECT_EQ(ComName(g), form.entersClass ? form.text : L"<none>");
+        EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, Base(form.category) + L"\\" + GuidToString(g),
+                         named ? L"Name" : L"Path"),
+                  named ? form.name : kPath);
+        EXPECT_EQ(NameOf(form.category, g), named ? form.name : L"");
+        wchar_t name[80] = L"";
+        DWORD bytes = sizeof name;
+        EXPECT_TRUE(!form.getter || (form.getter(g, name, &bytes) == S_OK && form.name == name));
+        EXPECT_EQ(ComName(g), named ? form.name : L"<none>");
 
         EXPECT_EQ(form.remove(), form.removed);
-        HRESULT listed = S_OK;
-        EXPECT_EQ(Listed(form.category, &listed),
+        EXPECT_EQ(Listed(form.category),
                   form.categoryStays ? std::vector<GUID>{} : std::vector<GUID>{GUID_NULL});
-        EXPECT_EQ(KeyExists(HKEY_LOCAL_MACHINE, Base(form.category)), form.categoryStays);
         EXPECT_EQ(ComName(g), L"<none>");
         ClearRegistrations();
     }
@@ -175,82 +145,60 @@ TEST_F(RegistrationTest, IdentifierZeroFailsBeforeAnythingIsWritten) {
     const GUID& g = kClass;
     const std::function<HRESULT()> forms[] = {
         [&] { return KXRegisterOperator(g, m, 0u); },
-        [&] { return KXRegisterProperty(g, m, 0u); },
-        [&] { return KXRegisterPrimitive(g, m, 0u); },
         [&] { return KXRegisterView(g, m, 0u); },
         [&] { return KXRegisterKeyNameId(g, L"Deformers", m, 0u); },
-        [&] { return KXRegisterOperatorEx(g, m, 0u, TestGuid(2), kInspectorId, TestGuid(50)); },
-        [&] { return KXRegisterPropertyEx(g, m, 0u, TestGuid(2), kInspectorId, TestGuid(50)); },
-        [&] { return KXRegisterOperatorEx(g, m, 0u, true, TestGuid(2), kInspectorId, 1, &g); },
-        [&] { return KXRegisterPropertyEx(g, m, 0u, true, TestGuid(2), kInspectorId, 1, &g); },
-        [&] { return KXRegisterPrimitiveEx(g, m, 0u, true, TestGuid(2), kInspectorId, 1, &g); },
-        [&] { return KXRegisterConstraint(g, m, 0u, true, TestGuid(2), kInspectorId, 1, &g); },
+        [&] { return KXRegisterPropertyEx(g, m, 0u, kCompanion, kInspectorId, kFamily); },
+        [&] { return KXRegisterConstraint(g, m, 0u, true, kCompanion, kInspectorId, 1, &kFamily); },
     };
-    for (std::size_t i = 0; i < std::size(forms); ++i) {
-        SCOPED_TRACE(i);
-        EXPECT_EQ(forms[i](), E_FAIL);
+    for (const auto& form : forms) {
+        EXPECT_EQ(form(), E_FAIL);
         EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, L"Software\\ut"));
-        EXPECT_EQ(ComName(g), L"<none>");
-        EXPECT_EQ(ComName(TestGuid(2)), L"<none>");
+        EXPECT_EQ(ComName(kCompanion), L"<none>");
     }
-}
-
-// The memberships that the families manager holds for a class: family text -> member's name.
-std::wstring Membership(const GUID& family, const GUID& clsid) {
-    return TextAt(HKEY_LOCAL_MACHINE,
-                  L"Software\\ut\\Families\\" + ClassText(family) + L"\\Members\\" + ClassText(clsid),
-                  L"Name");
 }
 
 TEST_F(RegistrationTest, CompanionsAndFamiliesFollowTheirForm) {
     HINSTANCE m = Module();
     const GUID& g = kClass;
-    const GUID companion = TestGuid(2), family = TestGuid(50), other = TestGuid(51);
-    const GUID both[] = {family, other};
-    std::wstring familyKey = L"Software\\ut\\Families\\" + ClassText(family);
+    const GUID both[] = {kFamily, kOtherFamily};
+    auto membership = [&](const GUID& family, const GUID& clsid) {
+        return TextAt(HKEY_LOCAL_MACHINE, FamilyKey(family) + L"\\Members\\" + GuidToString(clsid), L"Name");
+    };
 
     // Eight arguments: the companion under its own text, memberships under the class's.
-    ASSERT_EQ(KXRegisterOperatorEx(g, m, kTwistId, false, companion, kInspectorId, 2, both), S_OK);
-    EXPECT_EQ(ComName(companion), kInspector);
-    EXPECT_EQ(Membership(family, g), kTwist);
-    EXPECT_EQ(Membership(other, g), kTwist);
-    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, familyKey, L"Kind"), L"<none>"); // no family is described
-    EXPECT_EQ(KXUnRegisterOperatorEx(g, companion, 2, both, m), S_OK);
-    EXPECT_EQ(ComName(companion), L"<none>");
-    EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, familyKey));
+    ASSERT_EQ(KXRegisterOperatorEx(g, m, kTwistId, false, kCompanion, kInspectorId, 2, both), S_OK);
+    EXPECT_EQ(ComName(kCompanion), kInspector);
+    EXPECT_EQ(membership(kOtherFamily, g), kTwist);
+    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, FamilyKey(kFamily), L"Kind"), L"<none>"); // no family is made
+    EXPECT_EQ(KXUnRegisterOperatorEx(g, kCompanion, 2, both, m), S_OK);
+    EXPECT_EQ(ComName(kCompanion), L"<none>");
+    EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, FamilyKey(kFamily)));
 
     // Six arguments, deliberately: the name identifier is not used, the companion's text names
-    // both the companion and the membership, the family is created, and the flag is true.
-    ASSERT_EQ(KXRegisterInspectableObject(g, m, kUnusedId, companion, kInspectorId, family), S_OK);
-    EXPECT_EQ(ComName(companion), kInspector);
-    EXPECT_EQ(Membership(family, g), kInspector);
-    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, familyKey, L"Kind"), L"MISC_FAMILY");
-    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, familyKey, L"Path"), L"c:\\material");
-    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, familyKey, L"Class"), ClassText(family));
+    // both the companion and the membership, the family is made first, and the flag is true.
+    ASSERT_EQ(KXRegisterInspectableObject(g, m, kUnusedId, kCompanion, kInspectorId, kFamily), S_OK);
+    EXPECT_EQ(ComName(kCompanion), kInspector);
+    EXPECT_EQ(membership(kFamily, g), kInspector);
+    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, FamilyKey(kFamily), L"Kind"), L"MISC_FAMILY");
+    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, FamilyKey(kFamily), L"Path"), L"c:\\material");
+    EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, FamilyKey(kFamily), L"Class"), GuidToString(kFamily));
     DWORD flag = 0, bytes = sizeof flag;
-    UniqueHKey member = sdk::OpenKey(HKEY_LOCAL_MACHINE, (familyKey + L"\\Members\\" + ClassText(g)).c_str());
-    ASSERT_TRUE(member);
+    UniqueHKey member =
+        sdk::OpenKey(HKEY_LOCAL_MACHINE, (FamilyKey(kFamily) + L"\\Members\\" + GuidToString(g)).c_str());
     EXPECT_EQ(
         RegQueryValueExW(member.get(), L"Flag", nullptr, nullptr, reinterpret_cast<BYTE*>(&flag), &bytes),
         ERROR_SUCCESS);
     EXPECT_EQ(flag, 1u);
     member.reset();
-    // Its removal takes the family with it.
-    EXPECT_EQ(KXUnRegisterInspectableObject(g, companion, family, m), S_OK);
-    EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, familyKey));
+    EXPECT_EQ(KXUnRegisterInspectableObject(g, kCompanion, kFamily, m), S_OK); // the family goes too
+    EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, FamilyKey(kFamily)));
 
-    // Seven arguments: one family, or none for GUID_NULL, which registers only the companion.
-    ASSERT_EQ(KXRegisterInspectableObject(g, m, kTwistId, true, companion, kInspectorId, family), S_OK);
-    EXPECT_EQ(Membership(family, g), kTwist);
-    ASSERT_EQ(KXRegisterInspectableObject(other, m, kTwistId, true, companion, kInspectorId, GUID_NULL),
-              S_OK);
-    EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, L"Software\\ut\\Families\\" + ClassText(GUID_NULL)));
-    ASSERT_EQ(KXRegisterObjectFamilies(other, m, kUnusedId, false, 1, &family), S_OK);
-    EXPECT_EQ(Membership(family, other), kUnused);
-
-    // Without companion and family list only the class is entered, with the category's result.
-    ASSERT_EQ(KXRegisterOperatorEx(TestGuid(3), m, kTwistId, true, GUID_NULL, 0, 0, nullptr), S_OK);
-    EXPECT_EQ(ComName(TestGuid(3)), kTwist);
+    // Seven arguments: one family, or, for GUID_NULL, none, which leaves the companion's result.
+    ASSERT_EQ(KXRegisterInspectableObject(g, m, kTwistId, true, kCompanion, kInspectorId, kFamily), S_OK);
+    EXPECT_EQ(membership(kFamily, g), kTwist);
+    ASSERT_EQ(KXRegisterInspectableObject(TestGuid(3), m, kTwistId, true, GUID_NULL, 0, GUID_NULL), S_OK);
+    ASSERT_EQ(KXRegisterObjectFamilies(TestGuid(3), m, kUnusedId, false, 1, &kFamily), S_OK);
+    EXPECT_EQ(membership(kFamily, TestGuid(3)), kUnused);
 }
 
 TEST_F(RegistrationTest, ManipulatorsKeepTheirControlsAndGoWithThem) {
@@ -261,42 +209,34 @@ TEST_F(RegistrationTest, ManipulatorsKeepTheirControlsAndGoWithThem) {
     EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, L"Software\\ut"));
 
     ASSERT_EQ(KXRegisterManipulator(g, m, kTwist, 2, kControls), S_OK);
-    // Registering again starts clean: the first controls go.
-    ASSERT_EQ(KXRegisterManipulator(g, m, kTwist, 1, &kControls[1]), S_OK);
+    ASSERT_EQ(KXRegisterManipulator(g, m, kTwist, 1, &kControls[1]), S_OK); // starts clean
     DWORD count = 0;
     GUID* list = nullptr;
     ASSERT_EQ(KXGetManipulator3DControls(g, &count, &list), S_OK);
     EXPECT_EQ(std::vector<GUID>(list, list + count), std::vector<GUID>{kControls[1]});
     CoTaskMemFree(list);
-    EXPECT_EQ(Listed(L"Manipulator"), std::vector<GUID>{g});
     ASSERT_EQ(KXGetManipulators(&count, &list), S_OK);
     EXPECT_EQ(std::vector<GUID>(list, list + count), std::vector<GUID>{g});
     CoTaskMemFree(list);
-    // A class key with sub-keys does not go through the primitive.
-    EXPECT_EQ(KXRemRegistryKey(g, L"Manipulator"), S_FALSE);
-    EXPECT_EQ(Listed(L"Manipulator"), std::vector<GUID>{g});
-
+    EXPECT_EQ(KXRemRegistryKey(g, L"Manipulator"), S_FALSE); // a class key with sub-keys stays
     EXPECT_EQ(KXGetManipulator3DControls(GUID_NULL, &count, &list), E_INVALIDARG);
     EXPECT_EQ(KXGetManipulator3DControls(g, nullptr, &list), E_POINTER);
     EXPECT_EQ(KXGetManipulator3DControls(TestGuid(7), &count, &list), E_FAIL);
     EXPECT_EQ(KXUnRegisterManipulator(g), S_FALSE); // deliberately 1 after a removal
     EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, Base(L"Manipulator")));
-    EXPECT_EQ(ComName(g), L"<none>");
 }
 
 TEST_F(RegistrationTest, ThePrimitivesAnswerZeroOrOne) {
     const GUID& g = kClass;
-    // A missing category is created, deliberately, and the class key is not found in it.
-    EXPECT_EQ(KXRemRegistryKey(g, L"Fresh"), S_FALSE);
+    EXPECT_EQ(KXRemRegistryKey(g, L"Fresh"), S_FALSE); // deliberately makes the missing category
     EXPECT_TRUE(KeyExists(HKEY_LOCAL_MACHINE, Base(L"Fresh")));
     EXPECT_EQ(KXAddRegistryKey(g, L"Fresh", L"Name", kTwist), S_OK);
     EXPECT_EQ(KXRemRegistryKey(g, L"Fresh"), S_OK);
-    // A null value fails after the keys were made; a key name the registry refuses gives 1.
-    EXPECT_EQ(KXAddRegistryKey(g, L"Fresh", L"Name", nullptr), E_FAIL);
+    EXPECT_EQ(KXAddRegistryKey(g, L"Fresh", L"Name", nullptr), E_FAIL); // after the keys were made
     EXPECT_EQ(Listed(L"Fresh"), std::vector<GUID>{g});
+    // A key the registry refuses gives 1, also after a COM entry that succeeded.
     const std::wstring tooLong(300, L'x');
     EXPECT_EQ(KXAddRegistryKey(g, tooLong.c_str(), L"Name", kTwist), S_FALSE);
-    // After a successful COM entry, the record that fails gives 1 too.
     EXPECT_EQ(KXRegisterKeyName(g, tooLong.c_str(), Module(), kTwist), S_FALSE);
     EXPECT_EQ(ComName(g), kTwist);
 }
@@ -304,43 +244,46 @@ TEST_F(RegistrationTest, ThePrimitivesAnswerZeroOrOne) {
 // What one sample plug-in leaves below the library's key, and its class in the class registry.
 TEST_F(RegistrationTest, TheLayoutIsTheRegistrysOwn) {
     HINSTANCE m = Module();
-    const GUID op = TestGuid(1), companion = TestGuid(2), view = TestGuid(3), handle = TestGuid(4),
-               translator = TestGuid(7), family = TestGuid(50);
-    ASSERT_EQ(KXRegisterOperatorEx(op, m, kTwistId, true, companion, kInspectorId, 1, &family), S_OK);
+    const GUID op = TestGuid(1), view = TestGuid(3), handle = TestGuid(4), translator = TestGuid(7);
+    ASSERT_EQ(KXRegisterOperatorEx(op, m, kTwistId, true, kCompanion, kInspectorId, 1, &kFamily), S_OK);
     ASSERT_EQ(KXRegisterView(view, m, L"Curve view"), S_OK);
     ASSERT_EQ(KXRegisterManipulator(handle, m, L"Twist handle", 2, kControls), S_OK);
     ASSERT_EQ(KXRegisterTranslator(translator, L"c:\\plugins\\obj.dll"), S_OK);
     ASSERT_EQ(KXRegisterAnimationEditorView(view, op, m), S_OK);
     ASSERT_EQ(KXRegisterQVXExplorerSourceOp(op, view, m), S_OK);
-    ASSERT_EQ(KXRegisterQVXExplorerFamilySourceOp(family, view, m), S_OK);
+    ASSERT_EQ(KXRegisterQVXExplorerFamilySourceOp(kFamily, view, m), S_OK);
 
     std::wstring base = Base();
     base.pop_back();
-    const std::wstring root = L"[HKEY_LOCAL_MACHINE\\" + base;
-    auto key = [&](const std::wstring& path) { return root + path + L"]\r\n"; };
-    auto named = [](const std::wstring& text) { return L"\"Name\"=\"" + text + L"\"\r\n\r\n"; };
-    const std::wstring o = ClassText(op), v = ClassText(view), h = ClassText(handle);
+    auto key = [&](const std::wstring& path) { return L"[HKEY_LOCAL_MACHINE\\" + base + path + L"]\r\n"; };
+    auto empty = [&](const std::wstring& path) { return key(path) + L"\r\n"; };
+    auto value = [](const std::wstring& name, const std::wstring& data) {
+        return L"\"" + name + L"\"=" + data + L"\r\n";
+    };
+    auto text = [](const std::wstring& data) { return L"\"" + data + L"\""; };
+    const std::wstring o = GuidToString(op), v = GuidToString(view),
+                       h = L"\\Manipulator\\" + GuidToString(handle);
     const std::wstring expected =
-        L"Windows Registry Editor Version 5.00\r\n\r\n" + key(L"") + L"\r\n" + key(L"\\Animation Editor") +
-        L"\r\n" + key(L"\\Animation Editor\\DefaultView") + L"\"CLSID\"=\"" + v + L"\"\r\n\"SOURCEOP\"=\"" +
-        o + L"\"\r\n\r\n" + key(L"\\Manipulator") + L"\r\n" + key(L"\\Manipulator\\" + h) +
-        named(L"Twist handle") + key(L"\\Manipulator\\" + h + L"\\" + ClassText(kControls[0])) + L"\r\n" +
-        key(L"\\Manipulator\\" + h + L"\\" + ClassText(kControls[1])) + L"\r\n" + key(L"\\Operator") +
-        L"\r\n" + key(L"\\Operator\\" + o) + named(kTwist) + key(L"\\QVX Explorer") + L"\r\n" +
-        key(L"\\QVX Explorer\\FamilySourceOps") + L"\r\n" +
-        key(L"\\QVX Explorer\\FamilySourceOps\\" + ClassText(family)) + L"\"" + v +
-        L"\"=dword:00000001\r\n\r\n" + key(L"\\QVX Explorer\\SourceOps") + L"\r\n" +
-        key(L"\\QVX Explorer\\SourceOps\\" + o) + L"\"" + v + L"\"=dword:00000001\r\n\r\n" +
-        key(L"\\Translator") + L"\r\n" + key(L"\\Translator\\" + ClassText(translator)) +
-        L"\"Path\"=\"c:\\\\plugins\\\\obj.dll\"\r\n\r\n" + key(L"\\View") + L"\r\n" + key(L"\\View\\" + v) +
-        named(L"Curve view");
+        L"Windows Registry Editor Version 5.00\r\n\r\n" + empty(L"") + empty(L"\\Animation Editor") +
+        key(L"\\Animation Editor\\DefaultView") + value(L"CLSID", text(v)) + value(L"SOURCEOP", text(o)) +
+        L"\r\n" + empty(L"\\Manipulator") + key(h) + value(L"Name", text(L"Twist handle")) + L"\r\n" +
+        empty(h + L"\\" + GuidToString(kControls[0])) + empty(h + L"\\" + GuidToString(kControls[1])) +
+        empty(L"\\Operator") + key(L"\\Operator\\" + o) + value(L"Name", text(kTwist)) + L"\r\n" +
+        empty(L"\\QVX Explorer") + empty(L"\\QVX Explorer\\FamilySourceOps") +
+        key(L"\\QVX Explorer\\FamilySourceOps\\" + GuidToString(kFamily)) + value(v, L"dword:00000001") +
+        L"\r\n" + empty(L"\\QVX Explorer\\SourceOps") + key(L"\\QVX Explorer\\SourceOps\\" + o) +
+        value(v, L"dword:00000001") + L"\r\n" + empty(L"\\Translator") +
+        key(L"\\Translator\\" + GuidToString(translator)) +
+        value(L"Path", text(L"c:\\\\plugins\\\\obj.dll")) + L"\r\n" + empty(L"\\View") +
+        key(L"\\View\\" + v) + value(L"Name", text(L"Curve view")) + L"\r\n";
     EXPECT_EQ(ExportedText(L"HKEY_LOCAL_MACHINE\\" + base), expected);
 
     const std::wstring classKey = L"[HKEY_CLASSES_ROOT\\CLSID\\" + o;
     EXPECT_EQ(ExportedText(L"HKEY_CLASSES_ROOT\\CLSID\\" + o),
-              L"Windows Registry Editor Version 5.00\r\n\r\n" + classKey + L"]\r\n@=\"" + kTwist +
-                  L"\"\r\n\r\n" + classKey + L"\\InprocServer32]\r\n@=\"" +
-                  RegQuoted(platform::ModuleFileName(m)) + L"\"\r\n\"ThreadingModel\"=\"Apartment\"\r\n\r\n");
+              L"Windows Registry Editor Version 5.00\r\n\r\n" + classKey + L"]\r\n" + L"@=" + text(kTwist) +
+                  L"\r\n\r\n" + classKey + L"\\InprocServer32]\r\n@=" +
+                  text(RegQuoted(platform::ModuleFileName(m))) + L"\r\n" +
+                  value(L"ThreadingModel", text(L"Apartment")) + L"\r\n");
 }
 
 } // namespace

@@ -21,18 +21,14 @@ inline void PrintTo(const GUID& id, std::ostream* out) {
 
 namespace ut::test {
 
-// String identifiers of the test module's table.
-inline constexpr unsigned int kTwistId = 1;
-inline constexpr unsigned int kInspectorId = 2;
-inline constexpr unsigned int kUnusedId = 3;
-inline constexpr const wchar_t* kTwist = L"Twist deformer";
-inline constexpr const wchar_t* kInspector = L"Twist inspector";
-inline constexpr const wchar_t* kUnused = L"Never shown";
+// The test module's string table.
+inline constexpr unsigned int kTwistId = 1, kInspectorId = 2, kUnusedId = 3;
+inline constexpr const wchar_t *kTwist = L"Twist deformer", *kInspector = L"Twist inspector",
+                               *kUnused = L"Never shown";
 
 class RegistrationTest : public testing::Test {
 protected:
     void SetUp() override;
-
     static HINSTANCE Module() { return TestModule(); }
 
 private:
@@ -40,19 +36,15 @@ private:
     host::ReferenceHost host_;
 };
 
-// The classes of a category in the order listed, or a one-entry "failure" marker: {GUID_NULL}
-// with the result in `hr` when given.
+// The classes KXGetCLSIDList gives for a category; {GUID_NULL} when it fails (with its result in
+// `hr` when asked).
 std::vector<GUID> Listed(const wchar_t* category, HRESULT* hr = nullptr);
-
-// The "Name" a category holds for a class through KXGetKeyName, or "<failed>".
+// The "Name" KXGetKeyName gives, or "<failed>".
 std::wstring NameOf(const wchar_t* category, const GUID& clsid);
-
-// A text value of `root`\`path`, or "<none>".
+// A text value of `root`\`path`, or "<none>"; whether a key is there.
 std::wstring TextAt(HKEY root, const std::wstring& path, const wchar_t* value);
 bool KeyExists(HKEY root, const std::wstring& path);
-
-// The base key followed by `path`, and the key text of a class.
+// The library's base key followed by `path`.
 std::wstring Base(const std::wstring& path = L"");
-std::wstring ClassText(const GUID& clsid);
 
 } // namespace ut::test

@@ -25,8 +25,6 @@ struct IGWEnumGUID : IUnknown {
     // Copies up to `count` identifiers to `ids` and says how many in *fetched (which may be null
     // when `count` is 1): S_OK when `count` were copied, S_FALSE when the list ran out first.
     virtual HRESULT STDMETHODCALLTYPE Next(ULONG count, GUID* ids, ULONG* fetched) = 0;
-    // Passes over `count` identifiers: S_OK, or S_FALSE when fewer were left.
-    virtual HRESULT STDMETHODCALLTYPE Skip(ULONG count) = 0;
     // Starts again from the first identifier.
     virtual HRESULT STDMETHODCALLTYPE Reset() = 0;
 

@@ -21,8 +21,8 @@
 // do not hold the text and its terminator.
 UT_SDK_API HRESULT GWConstructKxcoreRegKey(const wchar_t* subKey, wchar_t* buffer, int capacity);
 
-// Enters `clsid` as an in-process class of `module` under `name`, replacing what was there; the
-// writes reach the registry as one transaction where the registry has them. E_INVALIDARG for
+// Enters `clsid` as an in-process class of `module` under `name`, writing over what was there;
+// the writes reach the disk together where the registry has transactions. E_INVALIDARG for
 // GUID_NULL or a module whose file name is unknown, E_POINTER for a null name.
 UT_SDK_API HRESULT GWRegisterCOMObject(REFCLSID clsid, HINSTANCE module, const wchar_t* name);
 // Removes the class's key with everything below it: S_OK, or S_FALSE when it was not there.
