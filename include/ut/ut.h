@@ -8,4 +8,5 @@
 #include <ut/memory.h>
 #include <ut/mifile.h>
 #include <ut/persist.h>
+#include <ut/registration.h>
 #include <ut/time.h>

@@ -7,17 +7,23 @@
 #include <ut/sdk/content.h>
 #include <ut/sdk/database.h>
 #include <ut/sdk/dialogs.h>
+#include <ut/sdk/families.h>
 #include <ut/sdk/notify.h>
 #include <ut/sdk/objects.h>
+#include <ut/sdk/preferences.h>
 #include <ut/sdk/version.h>
+#include <ut/sdk/views.h>
 
 #include "active_database.h"
 #include "ambient_values.h"
 #include "content_container.h"
+#include "families_manager.h"
 #include "file_dialogs.h"
 #include "notification_service.h"
+#include "preferences.h"
 #include "time_manager.h"
 #include "version_info.h"
+#include "view_manager.h"
 
 namespace ut::host {
 namespace {
@@ -45,6 +51,9 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallClass(CLSID_GWContentContainer, containers.Get());
     if (settings.currentContainer)
         OpenContainer();
+    InstallService(CLSID_GWFamiliesManager, NewService<FamiliesManager>(settings).Get());
+    InstallService(CLSID_GWViewManager, NewService<ViewManager>(settings).Get());
+    InstallService(CLSID_GWPreferences, NewService<Preferences>(settings).Get());
 }
 
 ReferenceHost::~ReferenceHost() {

@@ -36,7 +36,8 @@ void AddSortCommand(CLI::App& app);
 void AddHeaderCommand(CLI::App& app);
 void AddTimeCommand(CLI::App& app);
 
-// ut registry get | export | import.
+// ut registry list | get | export | import; list lives in registry_list.cpp.
 void AddRegistryCommand(CLI::App& app);
+void AddRegistryListCommand(CLI::App& registry);
 
 } // namespace ut::tool

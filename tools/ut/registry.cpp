@@ -1,6 +1,7 @@
 // ut registry: read a key, and move keys in and out as ".reg" files, on the registry the library
 // uses (on POSIX the store that UT_REGISTRY names; on Windows the system's registry).
 //
+//   ut registry list [CATEGORY]     the classes of the library's categories (registry_list.cpp)
 //   ut registry get KEY [NAME]       the values and sub-keys of KEY, or the data of one value
 //   ut registry export KEY FILE.reg  KEY with everything below it
 //   ut registry import FILE.reg      all of the file, or nothing of it
@@ -162,8 +163,10 @@ void Import(const std::string& file) {
 } // namespace
 
 void AddRegistryCommand(CLI::App& app) {
-    CLI::App* registry = app.add_subcommand("registry", "read the registry, export and import .reg files");
+    CLI::App* registry = app.add_subcommand(
+        "registry", "List the library's registrations, read keys, export and import .reg files.");
     registry->require_subcommand(1);
+    AddRegistryListCommand(*registry);
 
     // The options live as long as the parser that fills them.
     auto path = std::make_shared<std::string>();
