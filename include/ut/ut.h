@@ -2,8 +2,12 @@
 #pragma once
 
 #include <ut/catalog.h>
+#include <ut/compare.h>
 #include <ut/export.h>
+#include <ut/frames.h>
 #include <ut/memory.h>
+#include <ut/mifile.h>
 #include <ut/persist.h>
+#include <ut/registration.h>
 #include <ut/scene.h>
 #include <ut/time.h>

@@ -12,23 +12,29 @@
 #include <ut/sdk/content.h>
 #include <ut/sdk/database.h>
 #include <ut/sdk/dialogs.h>
+#include <ut/sdk/families.h>
 #include <ut/sdk/notify.h>
 #include <ut/sdk/objects.h>
+#include <ut/sdk/preferences.h>
 #include <ut/sdk/version.h>
+#include <ut/sdk/views.h>
 
 #include "active_database.h"
 #include "ambient_values.h"
 #include "content_container.h"
+#include "families_manager.h"
 #include "file_dialogs.h"
 #include "host_support.h"
 #include "list.h"
 #include "notification_service.h"
+#include "preferences.h"
 #include "property_set.h"
 #include "scene_manager.h"
 #include "scene_object.h"
 #include "scene_services.h"
 #include "time_manager.h"
 #include "version_info.h"
+#include "view_manager.h"
 
 namespace ut::host {
 namespace {
@@ -58,6 +64,9 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallScene(settings);
     if (settings.currentContainer)
         OpenContainer();
+    InstallService(CLSID_GWFamiliesManager, NewService<FamiliesManager>(settings).Get());
+    InstallService(CLSID_GWViewManager, NewService<ViewManager>(settings).Get());
+    InstallService(CLSID_GWPreferences, NewService<Preferences>(settings).Get());
 }
 
 ReferenceHost::~ReferenceHost() {
@@ -84,7 +93,6 @@ HRESULT ReferenceHost::InstallScene(const Settings& settings) {
     InstallService(CLSID_3DSceneManagerFactory, asUnknown(sceneManager_));
     InstallService(CLSID_GWUndoManager, asUnknown(undoManager_));
     InstallService(CLSID_GWDeleteAllBracket, asUnknown(Make<DeleteAllBracket>()));
-    InstallService(CLSID_GWViewManager, asUnknown(Make<ViewManager>()));
     InstallService(CLSID_GWViewerControllerFactory, asUnknown(Make<ViewerControllerFactory>()));
     InstallService(CLSID_GWSetValueProxy, asUnknown(Make<SetValueProxy>()));
     ut::ComPtr<IClassFactory> lists;

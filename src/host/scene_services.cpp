@@ -79,11 +79,6 @@ HRESULT DeleteAllBracket::End() {
     return S_OK;
 }
 
-std::span<const CGWCOMObject::InterfaceEntry> ViewManager::GetInterfaceMap() const {
-    static const InterfaceEntry map[] = {ut::sdk::Entry<ViewManager, IGWViewManager>(IID_IGWViewManager)};
-    return map;
-}
-
 std::span<const CGWCOMObject::InterfaceEntry> ViewerControllerFactory::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
         ut::sdk::Entry<ViewerControllerFactory, IGWViewerControllerFactory>(IID_IGWViewerControllerFactory)};

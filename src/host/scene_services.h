@@ -43,11 +43,6 @@ private:
     ULONG open_ = 0;
 };
 
-class ViewManager final : public ut::sdk::ComObject<IGWViewManager> {
-public:
-    std::span<const InterfaceEntry> GetInterfaceMap() const override;
-};
-
 class ViewerControllerFactory final : public ut::sdk::ComObject<IGWViewerControllerFactory> {
 public:
     std::span<const InterfaceEntry> GetInterfaceMap() const override;

@@ -173,6 +173,11 @@ struct MockViewerControllerFactory : ComMock<IGWViewerControllerFactory> {
     UT_MOCK(HRESULT, CreateController, (REFIID, void**));
 };
 
+struct MockViewManager : ComMock<IGWViewManager> {
+    UT_MOCK(HRESULT, GetViewName, (REFCLSID, wchar_t*, ULONG));
+    UT_MOCK(HRESULT, GetViewClass, (const wchar_t*, CLSID*));
+};
+
 struct MockClassFactory : ComMock<IClassFactory> {
     UT_MOCK(HRESULT, CreateInstance, (IUnknown*, REFIID, void**));
     UT_MOCK(HRESULT, LockServer, (BOOL));
@@ -188,7 +193,6 @@ using MockGroup = ComMock<I3DGroup>;
 using MockPrimitive = ComMock<I3DPrimitive>;
 using MockExecContext = ComMock<IGWExecContext>;
 using MockPreset = ComMock<IGWPreset>;
-using MockViewManager = ComMock<IGWViewManager>;
 using MockViewerController = ComMock<IGWViewerController>;
 
 } // namespace ut::test

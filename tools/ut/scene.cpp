@@ -23,8 +23,6 @@
 namespace ut::tool {
 namespace {
 
-constexpr int kBadInput = 2;
-
 struct ShowOptions {
     std::string file;
     bool json = false;
@@ -57,12 +55,12 @@ ut::host::SceneDescription SampleScene() {
 ut::host::SceneDescription ReadScene(const std::string& file) {
     std::ifstream in(file, std::ios::binary);
     if (!in)
-        throw CLI::RuntimeError("ut scene: cannot read " + file, kBadInput);
+        Fail(kExitUsage, "cannot read " + file);
     std::string text((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
     ut::host::SceneDescription scene;
     std::string error;
     if (FAILED(ut::host::ParseSceneDescription(text, scene, error)))
-        throw CLI::RuntimeError("ut scene: " + file + ": " + error, kBadInput);
+        Fail(kExitUsage, file + ": " + error);
     return scene;
 }
 
@@ -129,14 +127,14 @@ void Show(const ShowOptions& options) {
     settings.scene = options.file.empty() ? SampleScene() : ReadScene(options.file);
     ut::host::ReferenceHost host(settings);
     if (FAILED(host.Status()))
-        throw CLI::RuntimeError("ut scene: the reference host did not start", 1);
+        Fail(kExitUsage, "the reference host did not start");
     if (options.json) {
         std::printf("%s", ut::host::FormatSceneDescription(host.DescribeScene()).c_str());
         return;
     }
     ut::ComPtr<I3DObject> root;
     if (FAILED(KXGetCurrentSceneModel(IID_I3DObject, root.PutVoid())) || !root)
-        throw CLI::RuntimeError("ut scene: the scene has no root model", 1);
+        Fail(kExitUsage, "the scene has no root model");
     ut::ComPtr<I3DList> cameras;
     (void)KXGetListOfSceneCameras(cameras.Put()); // a scene without cameras lists none
     PrintTree(*root, 0, Objects(cameras.Get()));
@@ -145,13 +143,16 @@ void Show(const ShowOptions& options) {
 } // namespace
 
 void AddSceneCommand(CLI::App& app) {
-    CLI::App* scene = app.add_subcommand("scene", "set up a scene on the reference host and look at it");
+    CLI::App* scene = app.add_subcommand("scene", "Set up a scene on the reference host and look at it.");
     scene->require_subcommand(1);
     auto options = std::make_shared<ShowOptions>();
     CLI::App* show =
-        scene->add_subcommand("show", "print the scene tree of a scene description (or of a sample)");
+        scene->add_subcommand("show", "Print the scene tree of a scene description (or of a sample scene).");
     show->add_option("file", options->file, "a scene description in JSON");
     show->add_flag("--json", options->json, "print the scene as a description instead");
+    show->footer("One line per object, indented by depth: its name, then model, camera, selected and its "
+                 "property sets.\nExample:\n  ut scene show shot.json\n  Shot  model\n    Robot  model\n"
+                 "      Arm  selected  [Transform]");
     show->callback([options] { Show(*options); });
 }
 

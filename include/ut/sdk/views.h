@@ -1,7 +1,16 @@
-// The application's views: the view manager and the factory of viewer controllers.
+// Views: the host's view manager, which knows every view class by its identifier and its name,
+// and the factory of the controllers that drive a viewer.
+//
+// The reference host's views are the classes that modules registered in their "View" category:
+// the keys HKEY_LOCAL_MACHINE "Software\ut\Modules\<module>\View\<identifier text>", each with
+// the view's name as its "Name" value. When two modules register one class, the first module in
+// the registry's order names it. Names compare without regard to case.
+//
+// Every operation asks ut::sdk::CheckHostFault first, under "IGWViewManager::<method>".
 #pragma once
 
 #include <ut/platform/com.h>
+#include <ut/sdk/export.h>
 
 // {1E9E95BB-B8CE-11CF-AE56-00A02411DF1A}
 inline constexpr CLSID CLSID_GWViewManager = {
@@ -19,8 +28,16 @@ inline constexpr IID IID_IGWViewerControllerFactory = {
 inline constexpr IID IID_IGWViewerController = {
     0x1F123812, 0xA557, 0x4438, {0x94, 0xAD, 0xCF, 0xB9, 0x8B, 0x0B, 0x59, 0x5D}};
 
-// The manager of the application's views; handed out as it is.
 struct IGWViewManager : IUnknown {
+    // Writes the name of the view class `view` into `name` (`capacity` characters, terminator
+    // included). HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND) for a class that is not a view, and
+    // HRESULT_FROM_WIN32(ERROR_INSUFFICIENT_BUFFER) when the name does not fit; the buffer is then
+    // empty. E_POINTER for a null buffer, E_INVALIDARG for a zero capacity.
+    virtual HRESULT STDMETHODCALLTYPE GetViewName(REFCLSID view, wchar_t* name, ULONG capacity) = 0;
+    // The class of the view named `name`; HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND) with GUID_NULL
+    // for a name no view has. E_POINTER for a null argument.
+    virtual HRESULT STDMETHODCALLTYPE GetViewClass(const wchar_t* name, CLSID* view) = 0;
+
 protected:
     ~IGWViewManager() = default;
 };
@@ -45,3 +62,10 @@ template <>
 struct ut::InterfaceId<IGWViewerController> : ut::Iid<IID_IGWViewerController> {};
 template <>
 struct ut::InterfaceId<IGWViewerControllerFactory> : ut::Iid<IID_IGWViewerControllerFactory> {};
+
+// The application's view manager (found through GWQueryGenericObject).
+UT_SDK_API HRESULT GWGetViewMgr(IGWViewManager** manager);
+
+// The view manager's GetViewName: the name of view class `clsid` into `name` of `capacity`
+// characters. A manager that cannot be had answers its failure.
+UT_SDK_API HRESULT GWFindViewNameFromCLSID(REFCLSID clsid, wchar_t* name, int capacity);
