@@ -31,7 +31,8 @@ std::function<std::string()> Handing(Call call) {
     return [call] {
         Interface* out = nullptr;
         HRESULT hr = call(&out);
-        return Result(hr) + " " + Held(reinterpret_cast<IUnknown*&>(out));
+        auto* held = static_cast<IUnknown*>(out);
+        return Result(hr) + " " + Held(held);
     };
 }
 
