@@ -30,3 +30,34 @@ function(ut_add_program_test name target)
     add_test(NAME ${name} COMMAND ${target} ${ARGN})
   endif()
 endfunction()
+
+# ut_use_header_library(target folder...): libraries of headers only, found on the build machine
+# under /usr/include/<folder>, as private include folders (nothing of them reaches the installed
+# package). Natively through their CMake packages; when cross-compiling through a build-tree
+# folder of links to them that holds nothing else, so that no other header of the build machine
+# reaches the cross compiler.
+set(UT_HEADER_LIBRARY_nlohmann nlohmann_json nlohmann_json::nlohmann_json)
+set(UT_HEADER_LIBRARY_CLI CLI11 CLI11::CLI11)
+function(ut_use_header_library target)
+  if(CMAKE_CROSSCOMPILING)
+    set(links ${CMAKE_BINARY_DIR}/header-libraries)
+    file(MAKE_DIRECTORY ${links})
+    foreach(folder ${ARGN})
+      if(NOT EXISTS /usr/include/${folder})
+        message(FATAL_ERROR "/usr/include/${folder} is missing: ./run deps installs it")
+      endif()
+      if(NOT EXISTS ${links}/${folder})
+        file(CREATE_LINK /usr/include/${folder} ${links}/${folder} SYMBOLIC)
+      endif()
+    endforeach()
+    target_include_directories(${target} SYSTEM PRIVATE ${links})
+  else()
+    foreach(folder ${ARGN})
+      list(GET UT_HEADER_LIBRARY_${folder} 0 package)
+      list(GET UT_HEADER_LIBRARY_${folder} 1 imported)
+      find_package(${package} REQUIRED)
+      target_include_directories(${target} SYSTEM PRIVATE
+                                 $<TARGET_PROPERTY:${imported},INTERFACE_INCLUDE_DIRECTORIES>)
+    endforeach()
+  endif()
+endfunction()

@@ -9,4 +9,5 @@
 #include <ut/mifile.h>
 #include <ut/persist.h>
 #include <ut/registration.h>
+#include <ut/scene.h>
 #include <ut/time.h>

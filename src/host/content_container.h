@@ -1,61 +1,65 @@
-// The reference host's content container: a scene root that holds one property, the key time,
-// whose value parameter is a frame count. Containers are made by a class factory that starts
-// their key time at the settings' key frame.
+// The reference host's content container: a scene root that keeps, under their keys, the key
+// time (a property set whose value parameter is a frame count), the transient object container,
+// the scene defaults, and the reference-plane, device and cache folders.
 #pragma once
 
+#include <map>
+#include <utility>
+#include <vector>
+
 #include <ut/host/reference_host.h>
+#include <ut/platform/stream.h>
 #include <ut/sdk/comobject.h>
 #include <ut/sdk/content.h>
+#include <ut/sdk/scene_defaults.h>
+#include <ut/sdk/transient.h>
 
 namespace ut::host {
 
-class KeyTimeProperty final : public ut::sdk::ComObject<IGWProperty, IGWParameter> {
+// Holds objects by identity (their IUnknown), with the flags they were added with.
+class TransientObjectContainer final : public ut::sdk::ComObject<I3DTransientObjectContainer> {
 public:
-    explicit KeyTimeProperty(double frames) : frames_(frames) {}
-
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
 
-    HRESULT STDMETHODCALLTYPE GetParameterValue(REFGUID id, GWVARIANT* value) override;
-    HRESULT STDMETHODCALLTYPE SetValue(const tagGWREQUEST* request, const GWVARIANT* value) override;
-    // Nothing is shown, so nothing is redrawn; the request is checked and dropped.
-    HRESULT STDMETHODCALLTYPE Refresh(const tagGWREQUEST* request, BOOL redraw, LONG reserved1,
-                                      LONG reserved2) override;
-
-    HRESULT STDMETHODCALLTYPE GetParamValue(GWVARIANT* value) override;
-    HRESULT STDMETHODCALLTYPE SetParamValue(const tagGWREQUEST* request, const GWVARIANT* value) override;
+    HRESULT STDMETHODCALLTYPE Add(IGWComponentHierarchy* object, ULONG flags) override;
+    HRESULT STDMETHODCALLTYPE Remove(IGWComponentHierarchy* object) override;
+    HRESULT STDMETHODCALLTYPE Contains(IGWComponentHierarchy* object) override;
+    HRESULT STDMETHODCALLTYPE Reset() override;
 
 private:
-    HRESULT Read(GWVARIANT* value);
-    HRESULT Write(const tagGWREQUEST* request, const GWVARIANT* value);
+    std::map<IUnknown*, std::pair<ut::ComPtr<IUnknown>, ULONG>> held_;
+};
 
-    double frames_;
+// Per class, a default object (an empty property set of the class) and a default stream (empty),
+// both made on first request and kept.
+class SceneDefaults final : public ut::sdk::ComObject<I3DSceneDefaults> {
+public:
+    std::span<const InterfaceEntry> GetInterfaceMap() const override;
+
+    HRESULT STDMETHODCALLTYPE GetObjectForClass(GUID clsid, IUnknown** object) override;
+    HRESULT STDMETHODCALLTYPE GetStreamForClass(GUID clsid, IStream** stream) override;
+    // Creates through the installed classes; the preset is not applied.
+    HRESULT STDMETHODCALLTYPE CreateDefaultInstance(REFCLSID clsid, REFIID iid, void** object,
+                                                    IGWPreset* preset) override;
+
+private:
+    std::map<GUID, ut::ComPtr<IUnknown>, ut::GuidLess> objects_;
+    std::map<GUID, ut::ComPtr<IStream>, ut::GuidLess> streams_;
 };
 
 class ContentContainer final : public ut::sdk::ComObject<IGWContentContainer> {
 public:
-    explicit ContentContainer(double keyFrame) : keyFrame_(keyFrame) {}
-
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
-    HRESULT Construct() override;
+    // Makes the members as the settings say.
+    HRESULT Build(const Settings& settings);
 
-    HRESULT STDMETHODCALLTYPE FindProperty(REFGUID id, REFIID iid, void** property) override;
+    HRESULT STDMETHODCALLTYPE FindObject(REFGUID key, REFIID iid, void** object) override;
 
 private:
-    double keyFrame_;
-    ut::ComPtr<IGWProperty> keyTime_;
+    std::vector<std::pair<GUID, ut::ComPtr<IUnknown>>> members_;
 };
 
-class ContentContainerFactory final : public ut::sdk::ComObject<IClassFactory> {
-public:
-    explicit ContentContainerFactory(const Settings& settings) : keyFrame_(settings.keyFrame) {}
-
-    std::span<const InterfaceEntry> GetInterfaceMap() const override;
-
-    HRESULT STDMETHODCALLTYPE CreateInstance(IUnknown* outer, REFIID iid, void** object) override;
-    HRESULT STDMETHODCALLTYPE LockServer(BOOL) override { return S_OK; }
-
-private:
-    double keyFrame_;
-};
+// A content container started from `settings`, for the class factory of content containers.
+HRESULT MakeContentContainer(const Settings& settings, IUnknown** made);
 
 } // namespace ut::host

@@ -3,6 +3,11 @@
 
 #include <new>
 
+#include <ut/platform/detail/boundary.h>
+#include <ut/sdk/components.h>
+#include <ut/sdk/undo.h>
+#include <ut/sdk/views.h>
+
 #include <ut/sdk/ambient.h>
 #include <ut/sdk/content.h>
 #include <ut/sdk/database.h>
@@ -19,8 +24,14 @@
 #include "content_container.h"
 #include "families_manager.h"
 #include "file_dialogs.h"
+#include "host_support.h"
+#include "list.h"
 #include "notification_service.h"
 #include "preferences.h"
+#include "property_set.h"
+#include "scene_manager.h"
+#include "scene_object.h"
+#include "scene_services.h"
 #include "time_manager.h"
 #include "version_info.h"
 #include "view_manager.h"
@@ -46,9 +57,11 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWTimeManager, NewService<TimeManager>(settings).Get());
     InstallService(CLSID_GWPlayControl, NewService<PlayControl>(settings).Get());
     InstallService(CLSID_GWFileDialogs, NewService<FileDialogs>(settings).Get());
-    ut::ComPtr<IClassFactory> containers =
-        ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) ContentContainerFactory(settings));
-    InstallClass(CLSID_GWContentContainer, containers.Get());
+    // The containers it makes start from a copy of the settings.
+    InstallClass(CLSID_GWContentContainer, Make<ClassFactory>([settings](IUnknown** made) {
+                                               return MakeContentContainer(settings, made);
+                                           }).Get());
+    InstallScene(settings);
     if (settings.currentContainer)
         OpenContainer();
     InstallService(CLSID_GWFamiliesManager, NewService<FamiliesManager>(settings).Get());
@@ -63,6 +76,51 @@ ReferenceHost::~ReferenceHost() {
         (void)GWRevokeClassFactory(clsid); // S_FALSE when another host revoked it first
     for (const CLSID& clsid : services_)
         GWRevokeGenericObject(clsid);
+}
+
+HRESULT ReferenceHost::InstallScene(const Settings& settings) {
+    HRESULT built = ut::ExportBoundary([&] {
+        containerFolders_ = settings.scene.containers;
+        ut::ComPtr<Scene> scene = Scene::Build(settings.scene);
+        sceneManager_ = scene ? Make<SceneManager>(std::move(scene)) : nullptr;
+        return sceneManager_ ? S_OK : E_OUTOFMEMORY;
+    });
+    if (FAILED(Record(built)))
+        return built;
+    undoManager_ = Make<UndoManager>();
+    // Services go in as their CGWCOMObject, the IUnknown of their identity.
+    auto asUnknown = [](const auto& object) -> IUnknown* { return static_cast<CGWCOMObject*>(object.Get()); };
+    InstallService(CLSID_3DSceneManagerFactory, asUnknown(sceneManager_));
+    InstallService(CLSID_GWUndoManager, asUnknown(undoManager_));
+    InstallService(CLSID_GWDeleteAllBracket, asUnknown(Make<DeleteAllBracket>()));
+    InstallService(CLSID_GWViewerControllerFactory, asUnknown(Make<ViewerControllerFactory>()));
+    InstallService(CLSID_GWSetValueProxy, asUnknown(Make<SetValueProxy>()));
+    ut::ComPtr<IClassFactory> lists;
+    Record(ut::sdk::CreateClassFactory(&ut::sdk::NewObject<List>, lists.Put()));
+    InstallClass(CLSID_3DList, lists.Get());
+    for (const CLSID& clsid : settings.propertyClasses)
+        InstallClass(clsid, Make<ClassFactory>([clsid](IUnknown** made) {
+                                return MakePropertySet(clsid, made);
+                            }).Get());
+    return status_;
+}
+
+SceneDescription ReferenceHost::DescribeScene() const {
+    if (!sceneManager_)
+        return {};
+    SceneDescription description = sceneManager_->CurrentScene()->Describe();
+    description.containers.referencePlanes = containerFolders_.referencePlanes;
+    description.containers.devices = containerFolders_.devices;
+    description.containers.caches = containerFolders_.caches;
+    return description;
+}
+
+std::vector<std::wstring> ReferenceHost::UndoSteps() const {
+    return undoManager_ ? undoManager_->Steps() : std::vector<std::wstring>();
+}
+
+LONG ReferenceHost::SceneNotificationMode() const {
+    return sceneManager_ ? sceneManager_->NotificationMode() : GW3DNOTIFY_NORMAL;
 }
 
 HRESULT ReferenceHost::Record(HRESULT hr) {

@@ -46,9 +46,19 @@ HRESULT TimeManager::GetDisplayFormat(GWTIMEDISPLAYFORMAT* display, tagGWTIMEFOR
     return S_OK;
 }
 
-PlayControl::PlayControl(const Settings& settings)
-    : position_(SceneTime(settings, settings.playFrame)),
-      span_(SceneTime(settings, settings.firstFrame), SceneTime(settings, settings.lastFrame)) {}
+PlayControl::PlayControl(const Settings& settings) : position_(SceneTime(settings, settings.playFrame)) {
+    settings_.size = sizeof settings_;
+    settings_.mask = GWPLAYSET_ALL;
+    settings_.span =
+        CGWTimeSpan(SceneTime(settings, settings.firstFrame), SceneTime(settings, settings.lastFrame))
+            .ToRecord();
+    settings_.position = position_.GetTime();
+    settings_.mode = GWPLAYMODE_REALTIME;
+    settings_.format = settings.timeFormat;
+    settings_.speed = 1.0;
+    settings_.realTime = 1;
+    settings_.step = 1;
+}
 
 std::span<const CGWCOMObject::InterfaceEntry> PlayControl::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {ut::sdk::Entry<PlayControl, IGWPlayControl>(IID_IGWPlayControl)};
@@ -69,7 +79,44 @@ HRESULT PlayControl::GetTimeSpan(tagGWTIMESPAN* span) {
         return hr;
     if (!span)
         return E_POINTER;
-    *span = span_.ToRecord();
+    *span = settings_.span;
+    return S_OK;
+}
+
+HRESULT PlayControl::SetSettings(const tagGWPLAYCONTROLSETTINGS* settings) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWPlayControl::SetSettings"); FAILED(hr))
+        return hr;
+    if (!settings)
+        return E_POINTER;
+    if (settings->size != sizeof *settings || (settings->mask & ~GWPLAYSET_ALL))
+        return E_INVALIDARG;
+    const ULONG mask = settings->mask;
+    auto take = [&](ULONG bit, auto member) {
+        if (mask & bit)
+            settings_.*member = settings->*member;
+    };
+    take(GWPLAYSET_SPAN, &tagGWPLAYCONTROLSETTINGS::span);
+    take(GWPLAYSET_POSITION, &tagGWPLAYCONTROLSETTINGS::position);
+    take(GWPLAYSET_LOOP, &tagGWPLAYCONTROLSETTINGS::loop);
+    take(GWPLAYSET_PREROLL, &tagGWPLAYCONTROLSETTINGS::preroll);
+    take(GWPLAYSET_MODE, &tagGWPLAYCONTROLSETTINGS::mode);
+    take(GWPLAYSET_FORMAT, &tagGWPLAYCONTROLSETTINGS::format);
+    take(GWPLAYSET_SPEED, &tagGWPLAYCONTROLSETTINGS::speed);
+    take(GWPLAYSET_REALTIME, &tagGWPLAYCONTROLSETTINGS::realTime);
+    take(GWPLAYSET_STEP, &tagGWPLAYCONTROLSETTINGS::step);
+    take(GWPLAYSET_SCRUB, &tagGWPLAYCONTROLSETTINGS::scrub);
+    take(GWPLAYSET_AUDIOOFFSET, &tagGWPLAYCONTROLSETTINGS::audioOffset);
+    if (mask & GWPLAYSET_POSITION)
+        position_.SetTime(settings->position);
+    return S_OK;
+}
+
+HRESULT PlayControl::GetSettings(tagGWPLAYCONTROLSETTINGS* settings) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWPlayControl::GetSettings"); FAILED(hr))
+        return hr;
+    if (!settings)
+        return E_POINTER;
+    *settings = settings_;
     return S_OK;
 }
 

@@ -26,7 +26,8 @@ private:
     GWTIMEDISPLAYFORMAT display_;
 };
 
-// Times are handed out in seconds, in the scene's format and rate.
+// Times are handed out in seconds, in the scene's format and rate. The settings record is kept
+// whole; the position a record sets is taken in the scene's format and rate.
 class PlayControl final : public ut::sdk::ComObject<IGWPlayControl> {
 public:
     explicit PlayControl(const Settings& settings);
@@ -35,10 +36,12 @@ public:
 
     HRESULT STDMETHODCALLTYPE GetTime(tagGWTIME* time) override;
     HRESULT STDMETHODCALLTYPE GetTimeSpan(tagGWTIMESPAN* span) override;
+    HRESULT STDMETHODCALLTYPE SetSettings(const tagGWPLAYCONTROLSETTINGS* settings) override;
+    HRESULT STDMETHODCALLTYPE GetSettings(tagGWPLAYCONTROLSETTINGS* settings) override;
 
 private:
     CGWTime position_;
-    CGWTimeSpan span_;
+    tagGWPLAYCONTROLSETTINGS settings_{};
 };
 
 } // namespace ut::host

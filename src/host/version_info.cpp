@@ -1,10 +1,10 @@
 // The reference host's version-information object.
 #include "version_info.h"
 
-#include <cwchar>
-
 #include <ut/sdk/objects.h>
 #include <ut/sdk/testing.h>
+
+#include "host_support.h"
 
 namespace ut::host {
 
@@ -24,13 +24,7 @@ HRESULT VersionInfo::GetVersionString(ULONG index, wchar_t** text) {
         return hr;
     if (index >= strings_.size() || strings_[index].empty())
         return S_FALSE;
-    const std::wstring& source = strings_[index];
-    auto* copy = static_cast<wchar_t*>(CoTaskMemAlloc((source.size() + 1) * sizeof(wchar_t)));
-    if (!copy)
-        return E_OUTOFMEMORY;
-    std::wmemcpy(copy, source.c_str(), source.size() + 1);
-    *text = copy;
-    return S_OK;
+    return CopyToTaskMemory(strings_[index], text);
 }
 
 } // namespace ut::host

@@ -101,6 +101,19 @@ private:
     CGWCOMObject* (*create_)();
 };
 
+// Creates through an installed factory, else through the platform, after the fault hook let
+// `operation` through.
+HRESULT Create(std::string_view operation, REFCLSID clsid, DWORD context, REFIID iid, void** object) {
+    if (!object)
+        return E_POINTER;
+    *object = nullptr;
+    if (HRESULT hr = ut::sdk::CheckHostFault(operation); FAILED(hr))
+        return hr;
+    if (ut::ComPtr<IClassFactory> factory = ClassFactories().Find(clsid))
+        return factory->CreateInstance(nullptr, iid, object);
+    return CoCreateInstance(clsid, nullptr, context, iid, object);
+}
+
 } // namespace
 
 HRESULT GWQueryGenericObject(REFCLSID clsid, REFIID iid, void** object) {
@@ -120,14 +133,7 @@ HRESULT GWQueryGenericObject(REFCLSID clsid, void** object) {
 }
 
 HRESULT KXCreateInstance(REFCLSID clsid, REFIID iid, void** object) {
-    if (!object)
-        return E_POINTER;
-    *object = nullptr;
-    if (HRESULT hr = ut::sdk::CheckHostFault("KXCreateInstance"); FAILED(hr))
-        return hr;
-    if (ut::ComPtr<IClassFactory> factory = ClassFactories().Find(clsid))
-        return factory->CreateInstance(nullptr, iid, object);
-    return CoCreateInstance(clsid, nullptr, CLSCTX_INPROC_SERVER, iid, object);
+    return Create("KXCreateInstance", clsid, CLSCTX_INPROC_SERVER, iid, object);
 }
 
 HRESULT GWRegisterGenericObject(REFCLSID clsid, IUnknown* object) {
@@ -166,6 +172,10 @@ HRESULT CheckHostFault(std::string_view operation) {
         }
         return hook(operation);
     });
+}
+
+HRESULT CreateInstance(REFCLSID clsid, DWORD context, REFIID iid, void** object) {
+    return Create("CoCreateInstance", clsid, context, iid, object);
 }
 
 HRESULT CreateClassFactory(CGWCOMObject* (*create)(), IClassFactory** factory) {

@@ -32,6 +32,7 @@ ut::ComPtr<IGWTimeManager> FindTimeManager(HRESULT& hr) {
 } // namespace
 
 const CGWTime CGWTime::Undefined(GWTIMEFORMAT_SECONDS, std::numeric_limits<double>::quiet_NaN(), 1.0);
+const CGWTimeSpan CGWTimeSpan::Undefined(CGWTime::Undefined, CGWTime::Undefined);
 
 double CGWTime::GetTicksPerSecond() const {
     for (const FixedRate& fixed : kFixedRates)

@@ -1,9 +1,9 @@
 // The time family: the scene's format, frame and second conversions, and the current, render and
 // key times.
 #include <cmath>
-#include <cstring>
 #include <limits>
 
+#include <ut/scene.h>
 #include <ut/sdk/content.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/play.h>
@@ -11,6 +11,7 @@
 #include <ut/time.h>
 
 #include "module/state.h"
+#include "util/host_variant.h"
 
 namespace ut::util {
 namespace {
@@ -84,24 +85,6 @@ CGWTime ConversionTime() {
     return time;
 }
 
-// A variant zeroed for the host to fill, cleared afterwards only when its type can own something:
-// the string and object types from VT_BSTR up, except the boolean.
-class HostVariant {
-public:
-    HostVariant() noexcept { std::memset(&value_, 0, sizeof value_); }
-    ~HostVariant() {
-        if (value_.vt >= VT_BSTR && value_.vt != VT_BOOL)
-            (void)GWVariantClear(&value_); // nothing to report from a destructor
-    }
-    HostVariant(const HostVariant&) = delete;
-    HostVariant& operator=(const HostVariant&) = delete;
-
-    GWVARIANT* Get() noexcept { return &value_; }
-
-private:
-    GWVARIANT value_;
-};
-
 ut::ComPtr<IGWPlayControl> FindPlayControl(HRESULT& hr) {
     ut::ComPtr<IGWPlayControl> play;
     hr = GWQueryGenericObject(CLSID_GWPlayControl, IID_IGWPlayControl, play.PutVoid());
@@ -121,29 +104,22 @@ CGWTime PlayPosition(IGWPlayControl& play) {
     return position;
 }
 
-// The current content container, or a new one when none is current.
-HRESULT CurrentOrNewContainer(ut::ComPtr<IGWContentContainer>& container) {
-    if (SUCCEEDED(GWContentGetCurrentContainer(IID_IGWContentContainer, container.PutVoid())) && container)
-        return S_OK;
-    return KXCreateInstance(CLSID_GWContentContainer, IID_IGWContentContainer, container.PutVoid());
-}
-
 // The key-time property of the current (or a new) content container. The result is the failure
 // to reach a container (or a library that did not load); `found` is the property's lookup, which
 // fails when the container has none.
-HRESULT OpenKeyTime(ut::ComPtr<IGWProperty>& keyTime, HRESULT& found) {
+HRESULT OpenKeyTime(ut::ComPtr<IGWProperties>& keyTime, HRESULT& found) {
     if (!ut::module::Loaded())
         return E_UNEXPECTED;
     ut::ComPtr<IGWContentContainer> container;
-    if (HRESULT hr = CurrentOrNewContainer(container); FAILED(hr))
+    if (HRESULT hr = KXGet3DContentContainer(IID_IGWContentContainer, container.PutVoid(), 1); FAILED(hr))
         return hr;
-    found = container->FindProperty(GUID_GWKeyTimeProperty, IID_IGWProperty, keyTime.PutVoid());
+    found = container->FindObject(GUID_GWKeyTimeProperty, IID_IGWProperties, keyTime.PutVoid());
     if (SUCCEEDED(found) && !keyTime)
         found = E_NOINTERFACE;
     return S_OK;
 }
 
-HRESULT SetKeyTimeValue(IGWProperty& keyTime, const tagGWREQUEST& request, const GWVARIANT& frames,
+HRESULT SetKeyTimeValue(IGWProperties& keyTime, const tagGWREQUEST& request, const GWVARIANT& frames,
                         bool throughParameter) {
     if (!throughParameter)
         return keyTime.SetValue(&request, &frames);
@@ -225,7 +201,7 @@ HRESULT KXGetCurrentTimeSpan(tagGWTIMESPAN* span) {
 HRESULT KXGetKeyTime(double* seconds) {
     if (!seconds)
         return E_POINTER;
-    ut::ComPtr<IGWProperty> keyTime;
+    ut::ComPtr<IGWProperties> keyTime;
     HRESULT found = S_OK;
     if (HRESULT hr = ut::util::OpenKeyTime(keyTime, found); FAILED(hr))
         return hr;
@@ -244,7 +220,7 @@ HRESULT KXGetKeyTime(double* seconds) {
 }
 
 HRESULT KXSetKeyTime(double seconds, int refresh, int throughParameter) {
-    ut::ComPtr<IGWProperty> keyTime;
+    ut::ComPtr<IGWProperties> keyTime;
     HRESULT found = S_OK;
     if (HRESULT hr = ut::util::OpenKeyTime(keyTime, found); FAILED(hr))
         return hr;

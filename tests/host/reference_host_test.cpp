@@ -7,12 +7,16 @@
 
 #include <ut/host/reference_host.h>
 #include <ut/sdk/ambient.h>
+#include <ut/sdk/components.h>
 #include <ut/sdk/content.h>
 #include <ut/sdk/database.h>
 #include <ut/sdk/dialogs.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/play.h>
+#include <ut/sdk/scene.h>
+#include <ut/sdk/undo.h>
 #include <ut/sdk/version.h>
+#include <ut/sdk/views.h>
 
 #include "support/ref_tracker.h"
 
@@ -31,8 +35,18 @@ std::wstring VersionString(ULONG index) {
 }
 
 TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
-    const CLSID services[] = {CLSID_GWVersionInfo, CLSID_GWAmbientValues, CLSID_GWActiveDatabase,
-                              CLSID_GWTimeManager, CLSID_GWPlayControl,   CLSID_GWFileDialogs};
+    const CLSID services[] = {CLSID_GWVersionInfo,
+                              CLSID_GWAmbientValues,
+                              CLSID_GWActiveDatabase,
+                              CLSID_GWTimeManager,
+                              CLSID_GWPlayControl,
+                              CLSID_GWFileDialogs,
+                              CLSID_3DSceneManagerFactory,
+                              CLSID_GWUndoManager,
+                              CLSID_GWDeleteAllBracket,
+                              CLSID_GWViewManager,
+                              CLSID_GWViewerControllerFactory,
+                              CLSID_GWSetValueProxy};
     ut::test::LiveObjectCheck live;
     {
         ut::host::ReferenceHost host;
@@ -46,9 +60,10 @@ TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
         void* out = nullptr;
         EXPECT_EQ(GWQueryGenericObject(clsid, &out), REGDB_E_CLASSNOTREG);
     }
-    // Its container class and its current container are gone too.
+    // Its classes and its current container are gone too.
     void* out = nullptr;
-    EXPECT_EQ(KXCreateInstance(CLSID_GWContentContainer, IID_IUnknown, &out), REGDB_E_CLASSNOTREG);
+    for (const CLSID& clsid : {CLSID_GWContentContainer, CLSID_3DList, GUID_GWTimeMappingProperty})
+        EXPECT_EQ(KXCreateInstance(clsid, IID_IUnknown, &out), REGDB_E_CLASSNOTREG);
     EXPECT_EQ(GWContentGetCurrentContainer(IID_IUnknown, &out), E_FAIL);
 }
 
@@ -119,11 +134,11 @@ TEST(ContentContainer, KeepsOneCurrentContainerWhoseKeyTimeTakesOnlyFrameCounts)
     EXPECT_TRUE(current == again);
     EXPECT_FALSE(current == made);
     void* none = &none;
-    EXPECT_EQ(current->FindProperty(GUID_GWValueParameter, IID_IGWProperty, &none), DISP_E_MEMBERNOTFOUND);
+    EXPECT_EQ(current->FindObject(GUID_GWValueParameter, IID_IGWProperties, &none), DISP_E_MEMBERNOTFOUND);
     EXPECT_EQ(none, nullptr);
 
-    ut::ComPtr<IGWProperty> keyTime;
-    ASSERT_EQ(current->FindProperty(GUID_GWKeyTimeProperty, IID_IGWProperty, keyTime.PutVoid()), S_OK);
+    ut::ComPtr<IGWProperties> keyTime;
+    ASSERT_EQ(current->FindObject(GUID_GWKeyTimeProperty, IID_IGWProperties, keyTime.PutVoid()), S_OK);
     const tagGWREQUEST request = {GWREQUEST_PLUGIN};
     CGWVariant text, frames(9.0), other;
     text.vt = VT_BSTR;

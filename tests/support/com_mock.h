@@ -8,10 +8,14 @@
 //       MOCK_METHOD(HRESULT, DoIt, (int), (override, Calltype(STDMETHODCALLTYPE)));
 //   };
 //
+// An interface with a ut::InterfaceId needs no constructor. An object with several interfaces is
+// made of one mock each, joined with Also.
+//
 // ScopedGenericObject installs a mock (or any object) as an application service for one scope,
 // putting back whatever was installed before.
 #pragma once
 
+#include <utility>
 #include <vector>
 
 #include <ut/platform/com.h>
@@ -22,13 +26,26 @@ namespace ut::test {
 template <class Interface>
 class ComMock : public Interface {
 public:
-    explicit ComMock(const IID& iid, std::vector<IID> more = {}) : iids_(std::move(more)) { iids_.push_back(iid); }
+    explicit ComMock(const IID& iid, std::vector<IID> more = {}) : iids_(std::move(more)) {
+        iids_.push_back(iid);
+    }
+    ComMock() requires HasInterfaceId<Interface> : ComMock(InterfaceId<Interface>::Get()) {}
     virtual ~ComMock() = default;
+
+    // Answers `iid` with `other`, another mock of the same test object.
+    void Also(const IID& iid, IUnknown* other) { others_.push_back({iid, other}); }
 
     HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override {
         if (!object)
             return E_POINTER;
         *object = nullptr;
+        for (const auto& [own, other] : others_) {
+            if (IsEqualGUID(iid, own)) {
+                other->AddRef();
+                *object = other;
+                return S_OK;
+            }
+        }
         bool known = IsEqualGUID(iid, IID_IUnknown);
         for (const IID& own : iids_)
             known = known || IsEqualGUID(iid, own);
@@ -46,6 +63,7 @@ public:
 
 private:
     std::vector<IID> iids_;
+    std::vector<std::pair<IID, IUnknown*>> others_;
     ULONG references_ = 1;
 };
 

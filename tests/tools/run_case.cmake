@@ -4,7 +4,8 @@
 #   STDIN            lines for its standard input, separated by "|" (optional)
 #   STATUS           the expected exit status
 #   OUT / MATCH      the expected standard output, lines separated by "|", or a regular expression
-#   JSON             key=value pairs that the printed JSON object must hold ("null" for null)
+#   JSON             key=value pairs that the printed JSON object must hold ("null" for null); a
+#                    key walks members and indexes separated by "." (objects.0.name)
 #   WORK             a folder of the case's own
 string(REPLACE "|" ";" arguments "${ARGS}")
 set(input)
@@ -42,6 +43,7 @@ string(REPLACE "|" ";" pairs "${JSON}")
 foreach(pair IN LISTS pairs)
   string(REGEX MATCH "^([^=]+)=(.*)$" ignored "${pair}")
   set(key ${CMAKE_MATCH_1})
+  string(REPLACE "." ";" key "${key}")
   set(expected "${CMAKE_MATCH_2}")
   string(JSON type ERROR_VARIABLE error TYPE "${out}" ${key})
   if(error)
@@ -53,6 +55,6 @@ foreach(pair IN LISTS pairs)
     string(JSON value GET "${out}" ${key})
   endif()
   if(NOT value STREQUAL expected)
-    message(FATAL_ERROR "JSON ${key} is ${value}, expected ${expected}\n${report}")
+    message(FATAL_ERROR "JSON ${CMAKE_MATCH_1} is ${value}, expected ${expected}\n${report}")
   endif()
 endforeach()

@@ -163,8 +163,8 @@ TEST_F(TimeTest, TheKeyTimeIsTheContainersKeyFrameInSecondsSetEitherWay) {
             ut::test::FaultPlan plan(1000);
             EXPECT_EQ(KXSetKeyTime(1.25, refresh, throughParameter), S_OK);
             EXPECT_TRUE(
-                Saw(plan, throughParameter ? "IGWParameter::SetParamValue" : "IGWProperty::SetValue"));
-            EXPECT_EQ(Saw(plan, "IGWProperty::Refresh"), refresh != 0);
+                Saw(plan, throughParameter ? "IGWParameter::SetParamValue" : "IGWProperties::SetValue"));
+            EXPECT_EQ(Saw(plan, "IGWProperties::Refresh"), refresh != 0);
             EXPECT_EQ(KeyTime(), 1.25);
             ASSERT_EQ(KXSetKeyTime(0.0, 0, 0), S_OK);
         }

@@ -8,10 +8,6 @@ namespace CLI {
 class App;
 }
 
-namespace CLI {
-class App;
-}
-
 namespace ut::tool {
 
 // Exit statuses of every command.
@@ -35,6 +31,7 @@ void AddFramesCommand(CLI::App& app);
 void AddSortCommand(CLI::App& app);
 void AddHeaderCommand(CLI::App& app);
 void AddTimeCommand(CLI::App& app);
+void AddSceneCommand(CLI::App& app);
 
 // ut registry list | get | export | import; list lives in registry_list.cpp.
 void AddRegistryCommand(CLI::App& app);

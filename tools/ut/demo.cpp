@@ -2,6 +2,7 @@
 #include <cstdio>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include <CLI/CLI.hpp>
 
@@ -184,6 +185,52 @@ int ShowPersistence() {
     return found == kSceneObjects ? 0 : 1;
 }
 
+// Counts the objects at and below `object`.
+int CountObjects(I3DObject* object) {
+    int count = 1;
+    ut::ComPtr<I3DList> children;
+    ULONG size = 0;
+    if (object->GetChildren(children.Put()) != S_OK || FAILED(children->GetCount(&size)))
+        return count;
+    for (ULONG i = 0; i < size; ++i) {
+        ut::ComPtr<I3DElemRef> element;
+        ut::ComPtr<I3DObject> child;
+        if (SUCCEEDED(children->GetItem(i, element.Put())) &&
+            element->GetTarget(IID_I3DObject, child.PutVoid(), 1) == S_OK)
+            count += CountObjects(child.Get());
+    }
+    return count;
+}
+
+// Builds a robot of three parts in one undo step, as a plug-in would, then finds a part by name
+// and walks the scene from its root model.
+int ShowScene(const ut::host::ReferenceHost& host) {
+    {
+        C3DComplexUndo step(L"Build the robot");
+        ut::ComPtr<I3DObject> robot;
+        if (FAILED(KXCreate3DModelObject(L"Robot", IID_I3DObject, robot.PutVoid())) ||
+            FAILED(F3DAdd3DObjectToScene(robot.Get(), nullptr, 0)))
+            return 1;
+        for (const wchar_t* name : {L"Arm", L"Leg", L"Head"}) {
+            ut::ComPtr<I3DObject> part;
+            if (FAILED(KXCreate3DModelObject(name, IID_I3DObject, part.PutVoid())) ||
+                FAILED(F3DAdd3DObjectToScene(part.Get(), robot.Get(), name[0] == L'A')))
+                return 1;
+        }
+    }
+    wchar_t arm[] = L"Arm";
+    ut::ComPtr<I3DObject> found, root;
+    bool selected = F3DGet3DObjectFromName(arm, found.Put()) == S_OK && KXIsActiveDataSelected(found.Get());
+    if (FAILED(KXGetCurrentSceneModel(IID_I3DObject, root.PutVoid())))
+        return 1;
+    std::vector<std::wstring> steps = host.UndoSteps();
+    std::printf("scene       built a robot of 3 parts in the undo step \"%s\"; Arm found by name%s; "
+                "%d objects from the root\n",
+                steps.empty() ? "" : Narrow(steps.back()).c_str(), selected ? " and selected" : "",
+                CountObjects(root.Get()));
+    return selected && steps.size() == 1 ? 0 : 1;
+}
+
 // The names a category holds, in the registry's order, joined with ", ".
 std::string NamesIn(const wchar_t* category) {
     DWORD count = 0;
@@ -225,7 +272,7 @@ void RunDemo() {
     if (FAILED(host.Status()))
         Fail(kExitNo, "the reference host did not start");
     int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowPersistence() +
-                   ShowVersions() + ShowMemoryPool() + ShowRegistration();
+                   ShowVersions() + ShowMemoryPool() + ShowRegistration() + ShowScene(host);
     if (failures)
         Fail(kExitNo, "the tour found " + std::to_string(failures) + " part(s) not working");
 }
@@ -235,7 +282,7 @@ void RunDemo() {
 void AddDemoCommand(CLI::App& app) {
     CLI::App* demo = app.add_subcommand(
         "demo", "Load the library on the reference host and show what it does (module, GUIDs, streams, "
-                "persistence, versions, memory pool).");
+                "persistence, versions, memory pool, registration, a scene).");
     demo->footer("Example:\n  ut demo");
     demo->callback(RunDemo);
 }

@@ -47,6 +47,7 @@ int main(int argc, char** argv) {
     ut::tool::AddHeaderCommand(app);
     ut::tool::AddTimeCommand(app);
     ut::tool::AddRegistryCommand(app);
+    ut::tool::AddSceneCommand(app);
 
     try {
         std::vector<std::string> arguments = ut::platform::Utf8Arguments(argc, argv);

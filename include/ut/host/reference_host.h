@@ -6,7 +6,9 @@
 #include <string>
 #include <vector>
 
+#include <ut/host/reference_scene.h>
 #include <ut/platform/com.h>
+#include <ut/sdk/scene.h>
 #include <ut/sdk/time.h>
 
 namespace ut::host {
@@ -37,7 +39,15 @@ struct Settings {
     // is current from the start (otherwise the library makes its own when it needs one).
     double keyFrame = 1.0;
     bool currentContainer = true;
+    // The current scene, and the folders of every content container the host makes.
+    SceneDescription scene = {};
+    // The property classes the host can create (empty property sets of the class), as the scene
+    // does when a scene property is asked for that it lacks.
+    std::vector<CLSID> propertyClasses = {GUID_GWTimeMappingProperty};
 };
+
+class SceneManager;
+class UndoManager;
 
 // Installs the reference services for its lifetime and revokes exactly what it installed.
 // One at a time: installing a second one replaces the first one's services.
@@ -51,6 +61,13 @@ public:
     // S_OK when every service was installed.
     HRESULT Status() const { return status_; }
 
+    // The current scene as it stands now, in the form it was set up from.
+    SceneDescription DescribeScene() const;
+    // The names of the complex-undo steps closed so far, in order.
+    std::vector<std::wstring> UndoSteps() const;
+    // GW3DNOTIFY_QUIET while the scene holds its notifications back, else GW3DNOTIFY_NORMAL.
+    LONG SceneNotificationMode() const;
+
 private:
     HRESULT InstallService(REFCLSID clsid, IUnknown* service);
     HRESULT InstallClass(REFCLSID clsid, IClassFactory* factory);
@@ -58,10 +75,15 @@ private:
     // Makes a content container of the installed class current.
     HRESULT OpenContainer();
 
+    HRESULT InstallScene(const Settings& settings);
+
     std::vector<CLSID> services_;
     std::vector<CLSID> classes_;
     bool containerOpened_ = false;
     HRESULT status_ = S_OK;
+    ContainersDescription containerFolders_;
+    ut::ComPtr<SceneManager> sceneManager_;
+    ut::ComPtr<UndoManager> undoManager_;
 };
 
 } // namespace ut::host

@@ -29,6 +29,11 @@ UT_SDK_API HRESULT GWRevokeClassFactory(REFCLSID clsid);
 
 namespace ut::sdk {
 
+// CoCreateInstance with the installed class factories first: an application's creatable
+// classes are found in `context` as the system's would be, and other classes go to the platform's
+// CoCreateInstance with `context`.
+UT_SDK_API HRESULT CreateInstance(REFCLSID clsid, DWORD context, REFIID iid, void** object);
+
 // A class factory that creates `Object` (a CGWCOMObject) with `new` and Construct.
 UT_SDK_API HRESULT CreateClassFactory(CGWCOMObject* (*create)(), IClassFactory** factory);
 

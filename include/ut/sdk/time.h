@@ -94,6 +94,9 @@ private:
 // A range of time as two CGWTime values.
 class UT_SDK_API CGWTimeSpan {
 public:
+    // A span whose ends are both CGWTime::Undefined: "no range".
+    static const CGWTimeSpan Undefined;
+
     CGWTimeSpan() = default;
     CGWTimeSpan(const tagGWTIMESPAN& record) : start_(record.start), end_(record.end) {}
     CGWTimeSpan(const CGWTime& start, const CGWTime& end) : start_(start), end_(end) {}

@@ -1,4 +1,5 @@
-// Views: the host's view manager, which knows every view class by its identifier and its name.
+// Views: the host's view manager, which knows every view class by its identifier and its name,
+// and the factory of the controllers that drive a viewer.
 //
 // The reference host's views are the classes that modules registered in their "View" category:
 // the keys HKEY_LOCAL_MACHINE "Software\ut\Modules\<module>\View\<identifier text>", each with
@@ -11,13 +12,21 @@
 #include <ut/platform/com.h>
 #include <ut/sdk/export.h>
 
-// {33676D80-F4E9-4106-8C5D-35FAF7178ED4} (the reference host's; an application installs its own
-// manager under this class)
+// {1E9E95BB-B8CE-11CF-AE56-00A02411DF1A}
 inline constexpr CLSID CLSID_GWViewManager = {
-    0x33676D80, 0xF4E9, 0x4106, {0x8C, 0x5D, 0x35, 0xFA, 0xF7, 0x17, 0x8E, 0xD4}};
-// {33676D81-F4E9-4106-8C5D-35FAF7178ED4}
+    0x1E9E95BB, 0xB8CE, 0x11CF, {0xAE, 0x56, 0x00, 0xA0, 0x24, 0x11, 0xDF, 0x1A}};
+// {739FED21-C2E2-11CF-AE66-83AAE74B4CCC}
 inline constexpr IID IID_IGWViewManager = {
-    0x33676D81, 0xF4E9, 0x4106, {0x8C, 0x5D, 0x35, 0xFA, 0xF7, 0x17, 0x8E, 0xD4}};
+    0x739FED21, 0xC2E2, 0x11CF, {0xAE, 0x66, 0x83, 0xAA, 0xE7, 0x4B, 0x4C, 0xCC}};
+// {62338901-BA7C-11D0-B182-0800360BFF02}
+inline constexpr CLSID CLSID_GWViewerControllerFactory = {
+    0x62338901, 0xBA7C, 0x11D0, {0xB1, 0x82, 0x08, 0x00, 0x36, 0x0B, 0xFF, 0x02}};
+// {5A338503-BA7C-11D0-B182-0800360BFF02}
+inline constexpr IID IID_IGWViewerControllerFactory = {
+    0x5A338503, 0xBA7C, 0x11D0, {0xB1, 0x82, 0x08, 0x00, 0x36, 0x0B, 0xFF, 0x02}};
+// {1F123812-A557-4438-94AD-CFB98B0B595D} (not fixed by the application; the one this SDK declares)
+inline constexpr IID IID_IGWViewerController = {
+    0x1F123812, 0xA557, 0x4438, {0x94, 0xAD, 0xCF, 0xB9, 0x8B, 0x0B, 0x59, 0x5D}};
 
 struct IGWViewManager : IUnknown {
     // Writes the name of the view class `view` into `name` (`capacity` characters, terminator
@@ -33,8 +42,26 @@ protected:
     ~IGWViewManager() = default;
 };
 
+// What drives a viewer (its camera and navigation); handed out as it is.
+struct IGWViewerController : IUnknown {
+protected:
+    ~IGWViewerController() = default;
+};
+
+struct IGWViewerControllerFactory : IUnknown {
+    // A new viewer controller, through `iid`.
+    virtual HRESULT STDMETHODCALLTYPE CreateController(REFIID iid, void** controller) = 0;
+
+protected:
+    ~IGWViewerControllerFactory() = default;
+};
+
 template <>
 struct ut::InterfaceId<IGWViewManager> : ut::Iid<IID_IGWViewManager> {};
+template <>
+struct ut::InterfaceId<IGWViewerController> : ut::Iid<IID_IGWViewerController> {};
+template <>
+struct ut::InterfaceId<IGWViewerControllerFactory> : ut::Iid<IID_IGWViewerControllerFactory> {};
 
 // The application's view manager (found through GWQueryGenericObject).
 UT_SDK_API HRESULT GWGetViewMgr(IGWViewManager** manager);

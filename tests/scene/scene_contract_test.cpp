@@ -1,0 +1,602 @@
+// Scene access against GoogleMock host objects: which host operation each function calls, with
+// which arguments and in which order, how its answer is mapped, and that no reference is left.
+#include <functional>
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+
+#include <ut/scene.h>
+#include <ut/sdk/objects.h>
+
+#include "support/scene_mocks.h"
+
+namespace {
+
+using ::testing::_;
+using ::testing::DoAll;
+using ::testing::InSequence;
+using ::testing::Return;
+using ::testing::SetArgPointee;
+using ::testing::StrEq;
+using ::testing::StrictMock;
+using ut::test::GiveOut;
+
+constexpr GUID kSomeId = {0x1, 0x2, 0x3, {4, 5, 6, 7, 8, 9, 10, 11}};
+constexpr GUID kOtherId = {0xA, 0xB, 0xC, {1, 1, 1, 1, 1, 1, 1, 1}};
+constexpr HRESULT kRefused = E_ACCESSDENIED;
+
+// Installs a class factory for one scope.
+class ScopedClass {
+public:
+    ScopedClass(REFCLSID clsid, IClassFactory* factory) : clsid_(clsid) {
+        GWRegisterClassFactory(clsid, factory);
+    }
+    ~ScopedClass() { GWRevokeClassFactory(clsid_); }
+
+private:
+    CLSID clsid_;
+};
+
+// One host object of each kind; the scene-manager factory, undo manager, play control and
+// current content container are installed. Every test ends with no reference left behind.
+class SceneContract : public ::testing::Test {
+protected:
+    SceneContract() {
+        factory.Also(IID_IGWManagerRegistry, &registry);
+        scene.Also(IID_IGWProperties, &sceneProperties);
+        object.Also(IID_IGWPropertyOwner, &owner);
+        component.Also(IID_IGWComponentHierarchy, &hierarchy);
+        GWContentSetCurrentContainer(&content);
+    }
+    void TearDown() override {
+        GWContentSetCurrentContainer(nullptr);
+        ExpectLeft(1, factory, undo, play);
+        ExpectLeft(0, registry, scene, sceneProperties, content, defaults, transient, model, object, owner,
+                   component, hierarchy, proxy, list, element, group, primitive, context, preset, cache);
+    }
+    template <class... Mocks>
+    static void ExpectLeft(ULONG installed, const Mocks&... mocks) {
+        ([&] { EXPECT_EQ(mocks.Extra(), installed); }(), ...);
+    }
+    void SceneIsCurrent() {
+        EXPECT_CALL(factory, GetCurrentScene(_))
+            .WillOnce(GiveOut<0>(static_cast<IUnknown*>(&scene)))
+            .RetiresOnSaturation();
+    }
+    void ContentHolds(REFGUID key, REFIID iid, IUnknown* member) {
+        EXPECT_CALL(content, FindObject(key, iid, _)).WillOnce(GiveOut<2>(member)).RetiresOnSaturation();
+    }
+
+    StrictMock<ut::test::MockSceneManager> factory;
+    StrictMock<ut::test::MockManagerRegistry> registry;
+    StrictMock<ut::test::MockScene> scene;
+    StrictMock<ut::test::MockProperties> sceneProperties;
+    StrictMock<ut::test::MockContentContainer> content;
+    StrictMock<ut::test::MockSceneDefaults> defaults;
+    StrictMock<ut::test::MockTransientContainer> transient;
+    StrictMock<ut::test::MockModel> model;
+    StrictMock<ut::test::MockObject> object;
+    StrictMock<ut::test::MockPropertyOwner> owner;
+    StrictMock<ut::test::MockActiveData> component;
+    StrictMock<ut::test::MockComponentHierarchy> hierarchy;
+    StrictMock<ut::test::MockSetValueProxy> proxy;
+    StrictMock<ut::test::MockUndoManager> undo;
+    StrictMock<ut::test::MockPlayControl> play;
+    StrictMock<ut::test::MockList> list;
+    StrictMock<ut::test::MockElemRef> element;
+    ut::test::MockGroup group;
+    ut::test::MockPrimitive primitive;
+    ut::test::MockExecContext context;
+    ut::test::MockPreset preset;
+    ut::test::MockCacheMgr cache;
+    ut::test::ScopedGenericObject installedFactory{CLSID_3DSceneManagerFactory, &factory};
+    ut::test::ScopedGenericObject installedUndo{CLSID_GWUndoManager, &undo};
+    ut::test::ScopedGenericObject installedPlay{CLSID_GWPlayControl, &play};
+};
+
+// How a function maps the one host answer it passes on.
+enum Mapping {
+    kAsIs,
+    kOk,        // any success becomes S_OK
+    kOkOrFalse, // S_OK stays, everything else becomes S_FALSE
+    kFalseOrOk, // S_FALSE stays, any other success becomes S_OK
+};
+
+HRESULT Mapped(Mapping mapping, HRESULT answer) {
+    switch (mapping) {
+    case kAsIs:
+        return answer;
+    case kOk:
+        return FAILED(answer) ? answer : S_OK;
+    case kOkOrFalse:
+        return answer == S_OK ? S_OK : S_FALSE;
+    case kFalseOrOk:
+        return FAILED(answer) || answer == S_FALSE ? answer : S_OK;
+    }
+    return E_UNEXPECTED;
+}
+
+TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMapsTheAnswer) {
+    // Each row runs once for each answer; every operation is expected as often as its rows run
+    // and gives the answer of the moment, so a row that called another operation, or another's
+    // arguments, fails the count.
+    const HRESULT answers[] = {S_FALSE, 2, kRefused};
+    const int runs = static_cast<int>(std::size(answers));
+    HRESULT answer = S_OK;
+    void* out = nullptr;
+    I3DObject* found = nullptr;
+    wchar_t cube[] = L"Cube";
+    auto each = [&](auto& expectation, int rows = 1) {
+        expectation.Times(runs * rows).WillRepeatedly(::testing::ReturnPointee(&answer));
+    };
+    each(EXPECT_CALL(factory, StoreCommand(kSomeId, kOtherId, &context)));
+    each(EXPECT_CALL(factory, PostCommand()));
+    each(EXPECT_CALL(factory, FindObjectByName(StrEq(L"Cube"), &found)));
+    each(EXPECT_CALL(factory, SetNotificationMode(1, 0)));
+    each(EXPECT_CALL(factory, SetNotificationMode(3, 0)));
+    each(EXPECT_CALL(factory, CreateObjectFromPrimitive(&primitive, StrEq(L"Cube"), &found)));
+    each(EXPECT_CALL(factory, CreateModelObject(StrEq(L"Robot"), kSomeId, &out)));
+    each(EXPECT_CALL(factory, AddObject(&object, nullptr, 7)));
+    each(EXPECT_CALL(factory, RemoveObject(&object)));
+    each(EXPECT_CALL(registry, FindManager(kSomeId, kOtherId, &out)));
+    EXPECT_CALL(factory, GetCurrentScene(_))
+        .Times(runs * 6)
+        .WillRepeatedly(GiveOut<0>(static_cast<IUnknown*>(&scene)));
+    each(EXPECT_CALL(scene, GetContainer(GUID_3DLayerContainer, IID_IKXLayerContainer, _)));
+    each(EXPECT_CALL(scene, GetContainer(GUID_3DPassContainer, IID_IKXLayerContainer, _)));
+    each(EXPECT_CALL(scene, GetContainer(GUID_3DParTypeContainer, kSomeId, &out)));
+    each(EXPECT_CALL(scene, GetContainer(GUID_3DEnvironmentContainer, kSomeId, &out)));
+    each(EXPECT_CALL(scene, GetSceneProperty(kSomeId, kOtherId, &out)));
+    each(EXPECT_CALL(scene, ListObjects(GUID_3DCameraFamily, 2, _)));
+    each(EXPECT_CALL(content, FindObject(GUID_3DCacheManagerKey, kSomeId, &out)));
+    each(EXPECT_CALL(content, FindObject(GUID_3DCacheManagerKey, IID_I3DCacheMgr, _)));
+    each(EXPECT_CALL(content, FindObject(GUID_3DRefPlaneFolderKey, IID_I3DRefPlaneFolder, _)));
+    each(EXPECT_CALL(content, FindObject(GUID_3DDeviceManagerKey, kSomeId, &out)));
+    each(EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, kSomeId, &out)));
+    EXPECT_CALL(content, FindObject(GUID_3DSceneDefaultsKey, IID_I3DSceneDefaults, _))
+        .Times(runs * 3)
+        .WillRepeatedly(GiveOut<2>(&defaults));
+    each(EXPECT_CALL(defaults, GetObjectForClass(kSomeId, _)));
+    each(EXPECT_CALL(defaults, GetStreamForClass(kSomeId, _)));
+    each(EXPECT_CALL(defaults, CreateDefaultInstance(kSomeId, kOtherId, &out, &preset)));
+    EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, IID_I3DTransientObjectContainer, _))
+        .Times(runs * 5)
+        .WillRepeatedly(GiveOut<2>(&transient));
+    each(EXPECT_CALL(transient, Add(&hierarchy, 5)));
+    each(EXPECT_CALL(transient, Add(&hierarchy, 1)));
+    each(EXPECT_CALL(transient, Remove(&hierarchy)));
+    each(EXPECT_CALL(transient, Contains(&hierarchy))); // it does not declare itself not transient
+    each(EXPECT_CALL(transient, Reset()));
+    struct Row {
+        const char* name;
+        Mapping mapping;
+        std::function<HRESULT()> call;
+    };
+    IUnknown* asUnknown = &component;
+    const Row rows[] = {
+        {"KXStoreCommand", kAsIs, [&] { return KXStoreCommand(kSomeId, kOtherId, &context); }},
+        {"KXPostCommand", kAsIs, [] { return KXPostCommand(); }},
+        {"F3DGet3DObjectFromName", kAsIs, [&] { return F3DGet3DObjectFromName(cube, &found); }},
+        {"F3DSceneNotificationQuietOn", kAsIs, [] { return F3DSceneNotificationQuietOn(); }},
+        {"F3DSceneNotificationQuietOff", kAsIs, [] { return F3DSceneNotificationQuietOff(); }},
+        {"F3DCreate3DObjectFromPrimitive", kAsIs,
+         [&] { return F3DCreate3DObjectFromPrimitive(&primitive, cube, &found); }},
+        {"KXCreate3DModelObject", kAsIs, [&] { return KXCreate3DModelObject(L"Robot", kSomeId, &out); }},
+        {"F3DAdd3DObjectToScene", kAsIs, [&] { return F3DAdd3DObjectToScene(&object, nullptr, 7); }},
+        {"F3DRemove3DObjectFromScene", kAsIs, [&] { return F3DRemove3DObjectFromScene(&object); }},
+        {"KXGetGenericManager", kAsIs, [&] { return KXGetGenericManager(kSomeId, kOtherId, &out); }},
+        {"F3DGetLayerContainer", kOk,
+         [&] { return F3DGetLayerContainer(reinterpret_cast<IKXLayerContainer**>(&out)); }},
+        {"F3DGetPassContainer", kOk,
+         [&] { return F3DGetPassContainer(reinterpret_cast<IKXLayerContainer**>(&out)); }},
+        {"F3DGetParTypeContainer", kOk, [&] { return F3DGetParTypeContainer(kSomeId, &out); }},
+        {"F3DGetEnvironmentContainer", kAsIs, [&] { return F3DGetEnvironmentContainer(kSomeId, &out); }},
+        {"KXGetSceneProperty", kOk, [&] { return KXGetSceneProperty(kSomeId, kOtherId, &out); }},
+        {"KXGetListOfSceneCameras", kAsIs,
+         [&] { return KXGetListOfSceneCameras(reinterpret_cast<I3DList**>(&out)); }},
+        {"KXGetCacheManager", kOk, [&] { return KXGetCacheManager(kSomeId, &out); }},
+        {"KXGetCacheManager(I3DCacheMgr**)", kOk,
+         [&] { return KXGetCacheManager(reinterpret_cast<I3DCacheMgr**>(&out)); }},
+        {"F3DGetRefPlaneFolder", kAsIs,
+         [&] { return F3DGetRefPlaneFolder(reinterpret_cast<I3DRefPlaneFolder**>(&out)); }},
+        {"F3DGetDeviceManager", kAsIs, [&] { return F3DGetDeviceManager(kSomeId, &out); }},
+        {"F3DGetTransientObjectContainer", kAsIs,
+         [&] { return F3DGetTransientObjectContainer(kSomeId, &out); }},
+        {"KXGetSceneDefaultsObject", kAsIs,
+         [&] { return KXGetSceneDefaultsObject(kSomeId, reinterpret_cast<IUnknown**>(&out)); }},
+        {"KXGetStreamFromSceneDefaults", kOkOrFalse,
+         [&] { return KXGetStreamFromSceneDefaults(kSomeId, reinterpret_cast<IStream**>(&out)); }},
+        {"KXCreateDefaultInstance", kOkOrFalse,
+         [&] { return KXCreateDefaultInstance(kSomeId, kOtherId, &out, &preset); }},
+        {"F3DAddObjectToTransientObjectContainer", kOk,
+         [&] { return F3DAddObjectToTransientObjectContainer(&hierarchy, 5); }},
+        {"F3DAddObjectToTransientObjectContainer(IUnknown*)", kOk,
+         [&] { return F3DAddObjectToTransientObjectContainer(asUnknown); }},
+        {"F3DRemoveObjectFromTransientObjectContainer", kFalseOrOk,
+         [&] { return F3DRemoveObjectFromTransientObjectContainer(asUnknown); }},
+        {"F3DIsObjectInTransientObjectContainer", kFalseOrOk,
+         [&] { return F3DIsObjectInTransientObjectContainer(&hierarchy); }},
+        {"F3DTransientObjectContainerReset", kOk, [] { return F3DTransientObjectContainerReset(); }},
+    };
+    for (HRESULT given : answers) {
+        answer = given;
+        for (const Row& row : rows)
+            EXPECT_EQ(row.call(), Mapped(row.mapping, given)) << row.name << " answered " << given;
+    }
+}
+
+TEST_F(SceneContract, ANullOutParameterIsRefusedBeforeAnyHostCall) {
+    wchar_t name[] = L"x";
+    const std::pair<HRESULT, HRESULT> refusals[] = {
+        {KXGetSceneManager(kSomeId, nullptr, 1), E_UNEXPECTED},
+        {KXGet3DContentContainer(kSomeId, nullptr, 1), E_UNEXPECTED},
+        {KXGetViewManager(kSomeId, nullptr), E_UNEXPECTED},
+        {KXGetViewerControler(kSomeId, nullptr), E_UNEXPECTED},
+        {KXGetCurrentScene(kSomeId, nullptr), E_POINTER},
+        {KXGetCacheManager(kSomeId, nullptr), E_POINTER},
+        {KXGetGenericManager(kSomeId, kSomeId, nullptr), E_POINTER},
+        {F3DGet3DObjectFromName(name, nullptr), E_POINTER},
+        {F3DGet3DObjectFromName(nullptr, reinterpret_cast<I3DObject**>(&name)), E_POINTER},
+        {F3DCreate3DObjectFromPrimitive(&primitive, name, nullptr), E_POINTER},
+        {KXCreate3DModelObject(name, kSomeId, nullptr), E_POINTER},
+        {F3DSetAs3DGroup(&group, nullptr, nullptr), E_POINTER},
+        {F3DGetLayerContainer(nullptr), E_POINTER},
+        {F3DGetPassContainer(nullptr), E_POINTER},
+        {F3DGetParTypeContainer(kSomeId, nullptr), E_POINTER},
+        {F3DGetEnvironmentContainer(kSomeId, nullptr), E_POINTER},
+        {F3DGetRefPlaneFolder(nullptr), E_POINTER},
+        {F3DGetDeviceManager(kSomeId, nullptr), E_POINTER},
+        {KXGetSceneDefaultsObject(kSomeId, nullptr), E_POINTER},
+        {KXGetStreamFromSceneDefaults(kSomeId, nullptr), E_POINTER},
+        {KXCreateDefaultInstance(kSomeId, kSomeId, nullptr, nullptr), E_POINTER},
+        {KXGetSceneProperty(kSomeId, kSomeId, nullptr), E_POINTER},
+        {KXGetListOfSceneCameras(nullptr), E_POINTER},
+        {KXGetCurrentSceneModel(kSomeId, nullptr), E_POINTER},
+        {KXGetCurrentSceneTimeMapping(nullptr), E_POINTER},
+        {KXGetSceneRootProperty(kSomeId, kSomeId, nullptr), E_POINTER},
+        {F3DGetPropsList(&object, kSomeId, nullptr), E_POINTER},
+        {F3DGetPropsList(nullptr, kSomeId, reinterpret_cast<I3DList**>(&name)), E_POINTER},
+        {F3DAddObjectToTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr), 1), E_POINTER},
+        {F3DAddObjectToTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
+        {F3DRemoveObjectFromTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr)),
+         E_POINTER},
+        {F3DRemoveObjectFromTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
+        {F3DIsObjectInTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr)), E_POINTER},
+        {F3DIsObjectInTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
+        {F3DSetComponentValueCmd(nullptr, kSomeId, nullptr), E_POINTER},
+        // Either identifier null: E_FAIL before the scene is asked.
+        {KXGetSceneRootProperty(GUID_NULL, kSomeId, reinterpret_cast<void**>(&name)), E_FAIL},
+        {KXGetSceneRootProperty(kSomeId, GUID_NULL, reinterpret_cast<void**>(&name)), E_FAIL},
+    };
+    for (size_t i = 0; i < std::size(refusals); ++i)
+        EXPECT_EQ(refusals[i].first, refusals[i].second) << "row " << i;
+    EXPECT_FALSE(KXIsActiveDataSelected(nullptr));
+    // The transient container's lookup is handed the caller's out-parameter, null or not.
+    EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, kSomeId, nullptr))
+        .WillOnce(Return(E_POINTER));
+    EXPECT_EQ(F3DGetTransientObjectContainer(kSomeId, nullptr), E_POINTER);
+}
+
+TEST_F(SceneContract, TheRootsHandOutWhatTheirQueryAnswersAndNothingElse) {
+    void* out = &out;
+    EXPECT_EQ(KXGetSceneManager(IID_IGWManagerRegistry, &out, 0), S_OK);
+    EXPECT_EQ(out, static_cast<IGWManagerRegistry*>(&registry));
+    registry.Release();
+    EXPECT_EQ(KXGetSceneManager(IID_I3DObject, &out, 1), E_NOINTERFACE);
+    EXPECT_EQ(out, nullptr);
+    // The current scene: asked for the interface, normalised; or the manager's failure.
+    EXPECT_CALL(factory, GetCurrentScene(_)).WillOnce(Return(kRefused));
+    EXPECT_EQ(KXGetCurrentScene(IID_I3DScene, &out), kRefused);
+    SceneIsCurrent();
+    EXPECT_EQ(KXGetCurrentScene(IID_I3DObject, &out), E_NOINTERFACE);
+    SceneIsCurrent();
+    EXPECT_EQ(KXGetCurrentScene(IID_IGWProperties, &out), S_OK);
+    EXPECT_EQ(out, static_cast<IGWProperties*>(&sceneProperties));
+    sceneProperties.Release();
+    // Without a current container, one is made only when asked to.
+    GWContentSetCurrentContainer(nullptr);
+    EXPECT_EQ(KXGet3DContentContainer(IID_IGWContentContainer, &out, 0), E_FAIL);
+    StrictMock<ut::test::MockClassFactory> containers;
+    ScopedClass installed(CLSID_GWContentContainer, &containers);
+    EXPECT_CALL(containers, CreateInstance(nullptr, IID_IGWContentContainer, &out))
+        .WillOnce(GiveOut<2>(&content));
+    EXPECT_EQ(KXGet3DContentContainer(IID_IGWContentContainer, &out, 1), S_OK);
+    EXPECT_EQ(out, &content);
+    content.Release();
+    // A missing service is the query's failure.
+    GWRevokeGenericObject(CLSID_3DSceneManagerFactory);
+    EXPECT_EQ(KXGetSceneManager(IID_I3DSceneManager, &out, 1), REGDB_E_CLASSNOTREG);
+    GWRegisterGenericObject(CLSID_3DSceneManagerFactory, &factory);
+}
+
+TEST_F(SceneContract, ViewsComeFromTheirServices) {
+    ut::test::MockViewManager views;
+    StrictMock<ut::test::MockViewerControllerFactory> controllers;
+    ut::test::MockViewerController controller;
+    ut::test::ScopedGenericObject a(CLSID_GWViewManager, &views),
+        b(CLSID_GWViewerControllerFactory, &controllers);
+    void* out = nullptr;
+    // The view manager comes as itself whatever interface is asked for.
+    EXPECT_EQ(KXGetViewManager(IID_I3DObject, &out), S_OK);
+    EXPECT_EQ(out, &views);
+    views.Release();
+    EXPECT_CALL(controllers, CreateController(kSomeId, &out)).WillOnce(GiveOut<1>(&controller, S_FALSE));
+    EXPECT_EQ(KXGetViewerControler(kSomeId, &out), S_FALSE);
+    controller.Release();
+    EXPECT_EQ(controllers.Extra() + controller.Extra() + views.Extra(), 2u); // the two installations
+}
+
+TEST_F(SceneContract, SetAsGroupSetsThenUpdatesWithTheCurrentScene) {
+    for (HRESULT setAnswer : {S_OK, kRefused}) {
+        InSequence order;
+        SceneIsCurrent();
+        EXPECT_CALL(element, SetAsGroup(static_cast<IUnknown*>(&scene), &group)).WillOnce(Return(setAnswer));
+        if (setAnswer == S_OK)
+            EXPECT_CALL(element, Update(1)).WillOnce(Return(S_FALSE));
+        EXPECT_EQ(F3DSetAs3DGroup(&group, &element, &object), setAnswer);
+    }
+}
+
+TEST_F(SceneContract, DeleteAllRunsInsideTheBracketWhenThereIsOne) {
+    StrictMock<ut::test::MockDeleteAllBracket> bracket;
+    {
+        ut::test::ScopedGenericObject installed(CLSID_GWDeleteAllBracket, &bracket);
+        InSequence order;
+        EXPECT_CALL(bracket, Begin()).WillOnce(Return(kRefused));
+        EXPECT_CALL(factory, DeleteAll(6)).WillOnce(Return(S_FALSE));
+        EXPECT_CALL(bracket, End()).WillOnce(Return(kRefused));
+        EXPECT_EQ(KXDeleteAll(6), S_FALSE);
+        // Without a scene manager: E_FAIL, still bracketed.
+        EXPECT_CALL(bracket, Begin());
+        EXPECT_CALL(bracket, End());
+        GWRevokeGenericObject(CLSID_3DSceneManagerFactory);
+        EXPECT_EQ(KXDeleteAll(0), E_FAIL);
+        GWRegisterGenericObject(CLSID_3DSceneManagerFactory, &factory);
+    }
+    EXPECT_CALL(factory, DeleteAll(1)).WillOnce(Return(kRefused));
+    EXPECT_EQ(KXDeleteAll(1), kRefused);
+    EXPECT_EQ(bracket.Extra(), 0u);
+}
+
+TEST_F(SceneContract, TimeControlResetWritesTheWholeRecordOrOnlyAnUndefinedSpan) {
+    std::vector<tagGWPLAYCONTROLSETTINGS> written;
+    EXPECT_CALL(play, SetSettings(_)).Times(3).WillRepeatedly([&](const tagGWPLAYCONTROLSETTINGS* settings) {
+        written.push_back(*settings);
+        return written.size() == 3 ? kRefused : S_FALSE;
+    });
+    EXPECT_EQ(KXTimeControlReset(0), S_OK);
+    EXPECT_EQ(KXTimeControlReset(-1), S_OK);
+    EXPECT_EQ(KXTimeControlReset(1), kRefused);
+    const tagGWPLAYCONTROLSETTINGS& partial = written[0];
+    EXPECT_EQ(partial.size, 448u);
+    EXPECT_EQ(partial.mask, 1u);
+    EXPECT_TRUE(std::isnan(partial.span.start.time) && std::isnan(partial.span.end.time));
+    const tagGWPLAYCONTROLSETTINGS& full = written[1];
+    EXPECT_EQ(full.mask, 0x77Fu);
+    EXPECT_EQ(full.span.start.format, GWTIMEFORMAT_SECONDS);
+    EXPECT_EQ(full.span.end.format, GWTIMEFORMAT_SECONDS);
+    EXPECT_EQ(std::vector<double>({full.span.start.time, full.span.end.time, full.position, full.speed}),
+              std::vector<double>({1.0, 100.0, 1.0, 1.0}));
+    EXPECT_EQ(std::vector<LONG>({full.loop, full.preroll, full.mode, full.format, full.realTime, full.step,
+                                 full.scrub, full.audioOffset}),
+              std::vector<LONG>({0, 15, 2, 10, 0, 5, 0, 0}));
+    for (BYTE reserved : full.reserved)
+        ASSERT_EQ(reserved, 0);
+}
+
+TEST_F(SceneContract, SetComponentValueAsksForTheParameterAndProxyAndReportsOkWhateverTheSetAnswers) {
+    tagGWComponent parameter{3, 8, 0, 2, {1}};
+    tagGWTIME now = {GWTIMEFORMAT_PAL, 25.0, 2.5};
+    CGWVariant value(4.0);
+    {
+        ut::test::ScopedGenericObject installedProxy(CLSID_GWSetValueProxy, &proxy);
+        EXPECT_CALL(component, FindParameter(kSomeId, _))
+            .WillOnce(DoAll(SetArgPointee<1>(parameter), Return(S_OK)));
+        EXPECT_CALL(play, GetTime(_)).WillOnce(DoAll(SetArgPointee<0>(now), Return(S_OK)));
+        EXPECT_CALL(proxy, SetValue(0, &hierarchy, _, 0, &value, 2.5))
+            .WillOnce([&](ULONG, IGWComponentHierarchy*, const tagGWComponent& given, ULONG, const GWVARIANT*,
+                          double) {
+                EXPECT_EQ(given.id, 2u);
+                return kRefused;
+            });
+        EXPECT_EQ(F3DSetComponentValueCmd(&component, kSomeId, &value), S_OK);
+        // A parameter the object lacks, or an object without a hierarchy, ends it before the proxy.
+        EXPECT_CALL(component, FindParameter(kOtherId, _)).WillOnce(Return(DISP_E_MEMBERNOTFOUND));
+        EXPECT_EQ(F3DSetComponentValueCmd(&component, kOtherId, &value), DISP_E_MEMBERNOTFOUND);
+        EXPECT_EQ(F3DSetComponentValueCmd(&hierarchy, kOtherId, &value), E_NOINTERFACE);
+    }
+    EXPECT_CALL(component, FindParameter(kSomeId, _)).WillOnce(Return(S_OK));
+    EXPECT_EQ(F3DSetComponentValueCmd(&component, kSomeId, &value), REGDB_E_CLASSNOTREG);
+}
+
+TEST_F(SceneContract, SelectionIsBitZeroOfTheActiveDataFlags) {
+    const std::pair<ULONG, bool> flags[] = {
+        {0, false}, {1, true}, {2, false}, {0x8, false}, {0xFFFFFFFF, true}};
+    for (auto [word, selected] : flags) {
+        EXPECT_CALL(component, GetFlags(_)).WillOnce(DoAll(SetArgPointee<0>(word), Return(S_OK)));
+        EXPECT_EQ(KXIsActiveDataSelected(&component), selected) << word;
+    }
+    EXPECT_CALL(component, GetFlags(_)).WillOnce(DoAll(SetArgPointee<0>(1), Return(kRefused)));
+    EXPECT_FALSE(KXIsActiveDataSelected(&component));
+    EXPECT_FALSE(KXIsActiveDataSelected(&hierarchy));
+}
+
+TEST_F(SceneContract, TheModelIsAskedForTheRootPropertyThenToMakeIt) {
+    void* out = nullptr;
+    auto modelIsCurrent = [&](HRESULT answer) {
+        SceneIsCurrent();
+        EXPECT_CALL(scene, GetModel(_)).WillOnce(GiveOut<0>(static_cast<IUnknown*>(&model), answer));
+    };
+    {
+        InSequence order;
+        modelIsCurrent(S_OK);
+        EXPECT_CALL(model, GetRootProperty(kSomeId, kOtherId, &out, 1)).WillOnce(Return(S_FALSE));
+        EXPECT_CALL(model, GetRootProperty(kSomeId, kOtherId, &out, 0)).WillOnce(GiveOut<2>(&cache, S_FALSE));
+    }
+    EXPECT_EQ(KXGetSceneRootProperty(kSomeId, kOtherId, &out), S_OK);
+    EXPECT_EQ(out, &cache);
+    cache.Release();
+    modelIsCurrent(S_OK);
+    EXPECT_CALL(model, GetRootProperty(kSomeId, kOtherId, &out, 1)).WillOnce(Return(kRefused));
+    EXPECT_EQ(KXGetSceneRootProperty(kSomeId, kOtherId, &out), kRefused);
+    // A scene without a model: S_OK and nothing, from the model accessor S_FALSE.
+    SceneIsCurrent();
+    EXPECT_CALL(scene, GetModel(_)).WillOnce(Return(S_FALSE));
+    EXPECT_EQ(KXGetSceneRootProperty(kSomeId, kOtherId, &out), S_OK);
+    SceneIsCurrent();
+    EXPECT_CALL(scene, GetModel(_)).WillOnce(Return(S_FALSE));
+    EXPECT_EQ(KXGetCurrentSceneModel(IID_I3DModel, &out), S_FALSE);
+    EXPECT_EQ(out, nullptr);
+}
+
+TEST_F(SceneContract, TheTimeMappingIsTheSetHeldByTheScenesTimeMappingProperty) {
+    ut::test::MockProperties mapping;
+    IGWProperties* out = nullptr;
+    struct Case {
+        VARTYPE type;
+        HRESULT read;
+        HRESULT expected;
+    };
+    const Case cases[] = {{VT_UNKNOWN, S_OK, S_OK},
+                          {VT_UNKNOWN, S_FALSE, S_OK},
+                          {VT_I4, S_OK, E_NOINTERFACE},
+                          {VT_EMPTY, kRefused, S_FALSE}};
+    for (const Case& c : cases) {
+        SceneIsCurrent();
+        EXPECT_CALL(sceneProperties, GetProperty(GUID_GWTimeMappingProperty, _, 0))
+            .WillOnce([&](REFGUID, GWVARIANT* value, LONG) {
+                value->vt = c.type;
+                value->punkVal = c.type == VT_UNKNOWN ? static_cast<IUnknown*>(&mapping) : nullptr;
+                if (value->punkVal)
+                    mapping.AddRef();
+                return c.read;
+            });
+        EXPECT_EQ(KXGetCurrentSceneTimeMapping(&out), c.expected);
+        EXPECT_EQ(out, c.expected == S_OK ? &mapping : nullptr);
+        if (out)
+            out->Release();
+        EXPECT_EQ(mapping.Extra(), 0u) << "the variant is cleared";
+    }
+}
+
+TEST_F(SceneContract, AScenePropertyIsMadeAndAddedOnlyWhenMissingAndAskedFor) {
+    StrictMock<ut::test::MockClassFactory> classes;
+    ut::test::MockProperties made;
+    ScopedClass installed(kSomeId, &classes);
+    struct Case {
+        HRESULT read;
+        int create;
+        HRESULT expected;
+        VARTYPE type;
+    };
+    const Case cases[] = {{S_OK, 1, S_OK, VT_R8},
+                          {S_FALSE, 0, S_OK, VT_R8},
+                          {kRefused, 0, S_OK, VT_R8},
+                          {S_FALSE, 1, S_OK, VT_UNKNOWN},
+                          {kRefused, 1, kRefused, VT_R8}};
+    for (const Case& c : cases) {
+        CGWVariant value;
+        SceneIsCurrent();
+        EXPECT_CALL(sceneProperties, GetProperty(kSomeId, &value, 0))
+            .WillOnce([&](REFGUID, GWVARIANT* read, LONG) {
+                read->vt = VT_R8;
+                return c.read;
+            });
+        if (c.read != S_OK && c.create) {
+            SceneIsCurrent();
+            EXPECT_CALL(classes, CreateInstance(nullptr, IID_IGWProperties, _)).WillOnce(GiveOut<2>(&made));
+            EXPECT_CALL(scene, AddProperty(kSomeId, &made, 4, 0x8000u)).WillOnce(Return(c.expected));
+        }
+        EXPECT_EQ(KXGetCurrentSceneProperty(kSomeId, value, c.create), c.expected);
+        EXPECT_EQ(value.vt, c.type);
+        if (c.type == VT_UNKNOWN) {
+            EXPECT_EQ(value.punkVal, static_cast<IUnknown*>(&made));
+        }
+    }
+    EXPECT_EQ(made.Extra(), 0u);
+}
+
+TEST_F(SceneContract, PropsListWalksTheSetsOfKindPropertySetAndListsTheirPropertiesOfTheClass) {
+    StrictMock<ut::test::MockClassFactory> lists;
+    StrictMock<ut::test::MockProperties> sets, first, second, property;
+    ScopedClass installed(CLSID_3DList, &lists);
+    I3DList* out = nullptr;
+    {
+        InSequence order;
+        EXPECT_CALL(lists, CreateInstance(nullptr, IID_I3DList, _)).WillOnce(GiveOut<2>(&list));
+        EXPECT_CALL(owner, GetPropertySets(_)).WillOnce(GiveOut<0>(&sets));
+        EXPECT_CALL(sets, CountMembers(GUID_GWPropertySetKind, _))
+            .WillOnce(DoAll(SetArgPointee<1>(2), Return(S_OK)));
+        EXPECT_CALL(sets, GetMembers(GUID_GWPropertySetKind, 0, 2, _))
+            .WillOnce([&](REFGUID, ULONG, ULONG, IGWProperties** items) {
+                items[0] = &first, items[1] = &second;
+                first.AddRef(), second.AddRef();
+                return S_OK;
+            });
+        EXPECT_CALL(first, CountMembers(kSomeId, _)).WillOnce(DoAll(SetArgPointee<1>(0), Return(S_OK)));
+        EXPECT_CALL(second, CountMembers(kSomeId, _)).WillOnce(DoAll(SetArgPointee<1>(1), Return(S_OK)));
+        EXPECT_CALL(second, GetMembers(kSomeId, 0, 1, _)).WillOnce(GiveOut<3>(&property));
+        EXPECT_CALL(list, NewElement(IID_I3DElemRef, _)).WillOnce(GiveOut<1>(&element));
+        EXPECT_CALL(element, SetTarget(static_cast<IUnknown*>(&property), nullptr)).WillOnce(Return(S_OK));
+        EXPECT_CALL(list, Append(&element)).WillOnce(Return(S_OK));
+    }
+    EXPECT_EQ(F3DGetPropsList(&object, kSomeId, &out), S_OK);
+    EXPECT_EQ(out, &list);
+    list.Release();
+    // Any failure on the way is E_FAIL with nothing handed out; no sets at all is S_FALSE.
+    EXPECT_CALL(lists, CreateInstance(nullptr, IID_I3DList, _)).WillRepeatedly(GiveOut<2>(&list));
+    EXPECT_CALL(owner, GetPropertySets(_)).WillOnce(GiveOut<0>(&sets)).WillOnce(Return(S_OK));
+    EXPECT_CALL(sets, CountMembers(GUID_GWPropertySetKind, _)).WillOnce(Return(kRefused));
+    EXPECT_EQ(F3DGetPropsList(&object, kSomeId, &out), E_FAIL);
+    EXPECT_EQ(F3DGetPropsList(&object, kSomeId, &out), S_FALSE);
+    EXPECT_EQ(out, nullptr);
+    ExpectLeft(0, sets, first, second, property);
+}
+
+TEST_F(SceneContract, AnObjectThatDeclaresItselfNotTransientIsNotInTheContainer) {
+    StrictMock<ut::test::MockComponentHierarchy> marked;
+    ut::test::MockGroup marker;
+    marked.Also(IID_GWNotTransient, &marker);
+    ContentHolds(GUID_3DTransientObjectContainerKey, IID_I3DTransientObjectContainer, &transient);
+    EXPECT_CALL(transient, Contains(&marked)).WillOnce(Return(S_OK));
+    EXPECT_EQ(F3DIsObjectInTransientObjectContainer(&marked), S_FALSE);
+    EXPECT_EQ(marker.Extra(), 0u);
+}
+
+TEST_F(SceneContract, TheComplexUndoBracketOpensOnlyOutsideAnotherAndClosesOncePerInstance) {
+    auto outside = [&](BOOL inside) {
+        EXPECT_CALL(undo, IsInComplexUndo(_)).WillOnce(DoAll(SetArgPointee<0>(inside), Return(S_OK)));
+    };
+    {
+        InSequence order;
+        outside(FALSE);
+        EXPECT_CALL(undo, OpenComplexUndo(StrEq(L"Move"), 0)).WillOnce(Return(S_OK));
+        outside(TRUE); // the nested one stays inert
+        EXPECT_CALL(undo, CloseComplexUndo())
+            .Times(2)
+            .WillRepeatedly(Return(kRefused)); // the copy closes again
+    }
+    {
+        C3DComplexUndo bracket(L"Move");
+        C3DComplexUndo nested(L"Nested");
+        C3DComplexUndo copy(bracket);
+        C3DComplexUndo inert(false, L"Never");
+        inert = nested; // takes nothing to close
+        EXPECT_EQ(undo.Extra(), 3u);
+    }
+    outside(FALSE);
+    EXPECT_CALL(undo, OpenComplexUndo(StrEq(L"Refused"), 0)).WillOnce(Return(kRefused));
+    { C3DComplexUndo refused(L"Refused"); }
+    GWRevokeGenericObject(CLSID_GWUndoManager);
+    { C3DComplexUndo withoutManager(L"Alone"); }
+    GWRegisterGenericObject(CLSID_GWUndoManager, &undo);
+}
+
+TEST(MaterialCategory, OnlyTheMaterialCategoryIsTranslatedAndEveryOtherIdComesBackAsItIs) {
+    EXPECT_TRUE(IsEqualGUID(F3DGetMaterialCatID(), CATID_3DMaterial));
+    for (const GUID& id : {CATID_3DMaterial, GUID_NULL, kSomeId, IID_I3DList})
+        EXPECT_TRUE(IsEqualGUID(F3DTranslateMaterialCATID(id), id));
+}
+
+} // namespace
