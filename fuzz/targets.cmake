@@ -9,3 +9,5 @@ ut_fuzz_target(compare compare_fuzz.cpp)
 if(NOT WIN32)
   ut_fuzz_target(regfile regfile_fuzz.cpp)
 endif()
+# What `ut stream dump` shows of any bytes.
+ut_fuzz_target(stream_dump stream_dump_fuzz.cpp ../tools/ut/stream_decoder.cpp)

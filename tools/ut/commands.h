@@ -32,6 +32,7 @@ void AddSortCommand(CLI::App& app);
 void AddHeaderCommand(CLI::App& app);
 void AddTimeCommand(CLI::App& app);
 void AddSceneCommand(CLI::App& app);
+void AddStreamCommand(CLI::App& app);
 
 // ut registry list | get | export | import; list lives in registry_list.cpp.
 void AddRegistryCommand(CLI::App& app);

@@ -48,6 +48,7 @@ int main(int argc, char** argv) {
     ut::tool::AddTimeCommand(app);
     ut::tool::AddRegistryCommand(app);
     ut::tool::AddSceneCommand(app);
+    ut::tool::AddStreamCommand(app);
 
     try {
         std::vector<std::string> arguments = ut::platform::Utf8Arguments(argc, argv);
