@@ -41,12 +41,14 @@ HRESULT ReadExactly(ILockBytes* bytes, ULONGLONG offset, void* buffer, ULONG cou
     return read == count ? S_OK : STG_E_DOCFILECORRUPT;
 }
 
-// Decodes an entry's name: UTF-16 units up to the first terminator. False for a lone surrogate,
-// which no tool could name.
+// Decodes an entry's name: UTF-16 units up to the first terminator. False for an empty name or
+// a lone surrogate, which no call could name.
 bool DecodeName(const std::uint8_t* units, std::uint32_t count, DirectoryEntry& entry) {
     std::uint32_t length = 0;
     while (length < count && Le16(units + 2 * length) != 0)
         ++length;
+    if (length == 0)
+        return false;
     std::wstring name;
     for (std::uint32_t i = 0; i < length; ++i) {
         std::uint32_t unit = Le16(units + 2 * i);
@@ -273,7 +275,10 @@ HRESULT CompoundFile::ReadDirectory() {
             entry.size = version3 ? Le32(raw + 120) : Le64(raw + 120);
         }
     }
-    return entries_[0].type == EntryType::Root ? S_OK : STG_E_DOCFILECORRUPT;
+    // The root has no siblings; libgsf would follow them as if it had.
+    const DirectoryEntry& root = entries_[0];
+    bool rootAlone = root.left == kNoEntry && root.right == kNoEntry;
+    return root.type == EntryType::Root && rootAlone ? S_OK : STG_E_DOCFILECORRUPT;
 }
 
 // Walks every storage's tree: each entry is reached once, from one parent, as a stream or a

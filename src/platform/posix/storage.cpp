@@ -54,11 +54,11 @@ HRESULT CheckElementMode(DWORD mode, bool stream) {
     return stream && (mode & STGM_TRANSACTED) ? STG_E_INVALIDFUNCTION : S_OK;
 }
 
-wchar_t* TaskCopy(const std::wstring& text) {
-    std::size_t bytes = (text.size() + 1) * sizeof(wchar_t);
+wchar_t* TaskCopy(const wchar_t* text) {
+    std::size_t bytes = (std::wcslen(text) + 1) * sizeof(wchar_t);
     auto* copy = static_cast<wchar_t*>(CoTaskMemAlloc(bytes));
     if (copy)
-        std::memcpy(copy, text.c_str(), bytes);
+        std::memcpy(copy, text, bytes);
     return copy;
 }
 
