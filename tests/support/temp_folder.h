@@ -2,8 +2,8 @@
 // the test ends; and the compound-file helpers that the storage tests share.
 #pragma once
 
-#include <atomic>
 #include <filesystem>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -16,10 +16,11 @@ namespace ut::test {
 class TempFolder {
 public:
     TempFolder() {
-        static std::atomic<int> counter{0};
+        // Unique across processes too: a run that was killed leaves its folder behind.
+        static std::random_device random;
         const auto* test = ::testing::UnitTest::GetInstance()->current_test_info();
         std::string name = std::string("ut_") + (test ? test->name() : "test") + "_" +
-                           std::to_string(counter++) + "_" + std::to_string(std::rand());
+                           std::to_string(random()) + std::to_string(random());
         for (char& c : name)
             if (c == '/')
                 c = '_';

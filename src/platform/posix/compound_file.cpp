@@ -3,9 +3,10 @@
 
 #include <algorithm>
 #include <cstring>
-#include <cwctype>
 
 #include <ut/platform/text.h>
+
+#include "posix/letters.h"
 
 namespace ut::platform::posix {
 namespace {
@@ -15,6 +16,7 @@ constexpr std::uint32_t kHeaderSize = 512;
 constexpr std::uint32_t kHeaderFatEntries = 109;
 constexpr std::uint32_t kEndOfChain = 0xFFFFFFFE;
 constexpr std::uint32_t kMiniSectorSize = 64;
+constexpr ULONG kWindowSize = 64 * 1024;
 
 std::uint16_t Le16(const std::uint8_t* p) {
     return static_cast<std::uint16_t>(p[0] | p[1] << 8);
@@ -71,8 +73,15 @@ bool DecodeName(const std::uint8_t* units, std::uint32_t count, DirectoryEntry& 
         name.push_back(static_cast<wchar_t>(unit));
     }
     entry.utf8Name = Utf8FromWide(name);
+    entry.key = KeyOf(name);
     entry.name = std::move(name);
     return true;
+}
+
+// A chain visits each sector once: one that comes back to a sector is a loop.
+bool Repeats(std::vector<std::uint32_t>& sectors) {
+    std::sort(sectors.begin(), sectors.end());
+    return std::adjacent_find(sectors.begin(), sectors.end()) != sectors.end();
 }
 
 wchar_t Upper(wchar_t c) {
@@ -81,13 +90,15 @@ wchar_t Upper(wchar_t c) {
 
 } // namespace
 
-bool NameLess(const std::wstring& a, const std::wstring& b) {
-    std::size_t lengthA = Utf16Length(a);
-    std::size_t lengthB = Utf16Length(b);
-    if (lengthA != lengthB)
-        return lengthA < lengthB;
-    return std::lexicographical_compare(a.begin(), a.end(), b.begin(), b.end(),
-                                        [](wchar_t x, wchar_t y) { return Upper(x) < Upper(y); });
+NameKey KeyOf(const std::wstring& name) {
+    NameKey key;
+    key.units = name.size();
+    key.upper.reserve(name.size());
+    for (wchar_t c : name) {
+        key.units += static_cast<std::uint32_t>(c) > 0xFFFF; // two units in UTF-16
+        key.upper.push_back(UpperLetter(c));
+    }
+    return key;
 }
 
 bool NameEqual(const std::wstring& a, const std::wstring& b) {
@@ -160,10 +171,26 @@ bool CompoundFile::SectorInFile(std::uint32_t sector) const {
     return sector < sectorCount_;
 }
 
+// Tables and the directory are read a sector at a time, through a window of the file.
 HRESULT CompoundFile::ReadSector(std::uint32_t sector, std::uint8_t* buffer) {
     if (!SectorInFile(sector))
         return STG_E_DOCFILECORRUPT;
-    return ReadExactly(bytes_, (static_cast<ULONGLONG>(sector) + 1) << sectorShift_, buffer, sectorSize_);
+    ULONGLONG offset = (static_cast<ULONGLONG>(sector) + 1) << sectorShift_;
+    if (offset < windowStart_ || offset + sectorSize_ > windowStart_ + window_.size()) {
+        window_.resize(kWindowSize);
+        windowStart_ = offset;
+        ULARGE_INTEGER at{};
+        at.QuadPart = offset;
+        ULONG read = 0;
+        HRESULT hr = bytes_->ReadAt(at, window_.data(), kWindowSize, &read);
+        window_.resize(SUCCEEDED(hr) ? read : 0);
+        if (FAILED(hr))
+            return hr;
+        if (read < sectorSize_)
+            return STG_E_DOCFILECORRUPT;
+    }
+    std::memcpy(buffer, window_.data() + (offset - windowStart_), sectorSize_);
+    return S_OK;
 }
 
 HRESULT CompoundFile::ReadFatLocations() {
@@ -187,7 +214,7 @@ HRESULT CompoundFile::ReadFatLocations() {
         if (!SectorInFile(sector))
             return STG_E_DOCFILECORRUPT;
     fat_.assign(static_cast<std::size_t>(wanted) * (sectorSize_ / 4), 0);
-    fatLoaded_.assign(wanted, false);
+    fatLoaded_.assign(wanted, 0);
     return S_OK;
 }
 
@@ -195,14 +222,14 @@ HRESULT CompoundFile::NextSector(std::uint32_t sector, std::uint32_t& next) {
     if (sector >= fat_.size())
         return STG_E_DOCFILECORRUPT;
     std::uint32_t perSector = sectorSize_ / 4;
-    std::uint32_t table = sector / perSector;
-    if (!fatLoaded_[table]) {
+    std::uint32_t table = sector >> (sectorShift_ - 2);
+    if (!fatLoaded_[table]) [[unlikely]] {
         std::vector<std::uint8_t> bytes(sectorSize_);
         if (HRESULT hr = ReadSector(fatSectors_[table], bytes.data()); FAILED(hr))
             return hr;
         for (std::uint32_t i = 0; i < perSector; ++i)
             fat_[static_cast<std::size_t>(table) * perSector + i] = Le32(bytes.data() + 4 * i);
-        fatLoaded_[table] = true;
+        fatLoaded_[table] = 1;
     }
     next = fat_[sector];
     return S_OK;
@@ -222,23 +249,43 @@ HRESULT CompoundFile::CollectChain(std::uint32_t start, std::vector<std::uint32_
 
 HRESULT CompoundFile::CheckChain(std::uint32_t start, std::uint64_t bytes) {
     std::uint64_t needed = SectorsFor(bytes, sectorSize_);
-    std::vector<bool> visited(needed > 1 ? sectorCount_ : 0, false);
+    if (needed == 0)
+        return S_OK;
+    if (needed > sectorCount_)
+        return STG_E_DOCFILECORRUPT;
+    // Chains written in one go run forward, and a chain that only runs forward has no loop.
+    bool forward = true;
     std::uint32_t sector = start;
-    for (std::uint64_t k = 0; k < needed; ++k) {
-        if (!SectorInFile(sector) || (needed > 1 && visited[sector]))
+    for (std::uint64_t k = 1;; ++k) {
+        if (!SectorInFile(sector))
             return STG_E_DOCFILECORRUPT;
-        if (needed > 1)
-            visited[sector] = true;
-        if (k + 1 == needed) {
-            // The last sector may end the file early, but not before the stream's last byte.
-            ULONGLONG end =
-                ((static_cast<ULONGLONG>(sector) + 1) << sectorShift_) + (bytes - k * sectorSize_);
-            return end <= fileSize_ ? S_OK : STG_E_DOCFILECORRUPT;
-        }
-        if (HRESULT hr = NextSector(sector, sector); FAILED(hr))
+        if (k == needed)
+            break;
+        std::uint32_t next = 0;
+        if (HRESULT hr = NextSector(sector, next); FAILED(hr))
+            return hr;
+        forward = forward && next > sector;
+        sector = next;
+    }
+    // The last sector may end the file early, but not before the stream's last byte.
+    ULONGLONG end =
+        ((static_cast<ULONGLONG>(sector) + 1) << sectorShift_) + (bytes - (needed - 1) * sectorSize_);
+    if (end > fileSize_)
+        return STG_E_DOCFILECORRUPT;
+    return forward ? S_OK : CheckRevisits(start, needed);
+}
+
+// Walks a chain that the first walk found whole but not always running forward: it may not
+// come back to a sector it has been at.
+HRESULT CompoundFile::CheckRevisits(std::uint32_t start, std::uint64_t count) {
+    std::vector<std::uint32_t> sectors;
+    sectors.reserve(count);
+    for (std::uint32_t sector = start; sectors.size() < count;) {
+        sectors.push_back(sector);
+        if (HRESULT hr = NextSector(sector, sector); FAILED(hr) && sectors.size() < count)
             return hr;
     }
-    return S_OK;
+    return Repeats(sectors) ? STG_E_DOCFILECORRUPT : S_OK;
 }
 
 HRESULT CompoundFile::ReadDirectory() {
@@ -286,6 +333,7 @@ HRESULT CompoundFile::ReadDirectory() {
 HRESULT CompoundFile::BuildTree() {
     std::uint32_t count = static_cast<std::uint32_t>(entries_.size());
     children_.assign(count, {});
+    checked_.assign(count, false);
     std::vector<bool> reached(count, false);
     reached[0] = true;
     struct Visit {
@@ -315,11 +363,10 @@ HRESULT CompoundFile::BuildTree() {
             return STG_E_DOCFILECORRUPT;
     }
     for (std::vector<std::uint32_t>& elements : children_) {
-        std::sort(elements.begin(), elements.end(), [&](std::uint32_t a, std::uint32_t b) {
-            return NameLess(entries_[a].name, entries_[b].name);
-        });
+        std::sort(elements.begin(), elements.end(),
+                  [&](std::uint32_t a, std::uint32_t b) { return entries_[a].key < entries_[b].key; });
         for (std::size_t i = 1; i < elements.size(); ++i)
-            if (NameEqual(entries_[elements[i - 1]].name, entries_[elements[i]].name))
+            if (entries_[elements[i - 1]].key == entries_[elements[i]].key)
                 return STG_E_DOCFILECORRUPT;
     }
     return S_OK;
@@ -347,32 +394,35 @@ HRESULT CompoundFile::ReadMiniFat() {
 HRESULT CompoundFile::CheckMiniChain(std::uint32_t start, std::uint64_t bytes) {
     std::uint64_t container = entries_[0].size;
     std::uint64_t needed = SectorsFor(bytes, kMiniSectorSize);
-    std::vector<bool> visited(miniFat_.size(), false);
-    std::uint32_t sector = start;
-    for (std::uint64_t k = 0; k < needed; ++k) {
-        std::uint64_t used = std::min<std::uint64_t>(kMiniSectorSize, bytes - k * kMiniSectorSize);
-        if (sector >= miniFat_.size() || visited[sector] ||
+    std::vector<std::uint32_t> sectors;
+    sectors.reserve(needed);
+    for (std::uint32_t sector = start; sectors.size() < needed; sector = miniFat_[sector]) {
+        std::uint64_t used =
+            std::min<std::uint64_t>(kMiniSectorSize, bytes - sectors.size() * kMiniSectorSize);
+        if (sector >= miniFat_.size() ||
             static_cast<std::uint64_t>(sector) * kMiniSectorSize + used > container)
             return STG_E_DOCFILECORRUPT;
-        visited[sector] = true;
-        sector = miniFat_[sector];
+        sectors.push_back(sector);
     }
-    return S_OK;
+    return Repeats(sectors) ? STG_E_DOCFILECORRUPT : S_OK;
 }
 
 HRESULT CompoundFile::CheckStream(std::uint32_t index) {
     const DirectoryEntry& entry = entries_[index];
-    if (entry.size == 0)
+    if (entry.size == 0 || checked_[index])
         return S_OK;
-    return entry.size < kMiniStreamCutoff ? CheckMiniChain(entry.start, entry.size)
-                                          : CheckChain(entry.start, entry.size);
+    HRESULT hr = entry.size < kMiniStreamCutoff ? CheckMiniChain(entry.start, entry.size)
+                                                : CheckChain(entry.start, entry.size);
+    checked_[index] = SUCCEEDED(hr);
+    return hr;
 }
 
-std::uint32_t CompoundFile::Find(std::uint32_t parent, const std::wstring& name) const {
-    for (std::uint32_t element : children_[parent])
-        if (NameEqual(entries_[element].name, name))
-            return element;
-    return kNoEntry;
+std::uint32_t CompoundFile::Find(std::uint32_t parent, const NameKey& key) const {
+    const std::vector<std::uint32_t>& elements = children_[parent];
+    auto found = std::lower_bound(
+        elements.begin(), elements.end(), key,
+        [&](std::uint32_t element, const NameKey& wanted) { return entries_[element].key < wanted; });
+    return found != elements.end() && entries_[*found].key == key ? *found : kNoEntry;
 }
 
 ULONGLONG CompoundFile::EntryOffset(std::uint32_t index) const {

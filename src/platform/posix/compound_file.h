@@ -23,8 +23,18 @@ inline constexpr std::uint32_t kMaxTreeDepth = 4096;
 
 enum class EntryType : std::uint8_t { Unused = 0, Storage = 1, Stream = 2, Root = 5 };
 
+// The form in which element names compare, as the format orders them: by length in UTF-16
+// units, then by upper-case letters.
+struct NameKey {
+    std::size_t units = 0;
+    std::wstring upper;
+    auto operator<=>(const NameKey&) const = default;
+};
+NameKey KeyOf(const std::wstring& name);
+
 struct DirectoryEntry {
     std::wstring name;
+    NameKey key;
     // The name as libgsf reports it, by which it finds the element.
     std::string utf8Name;
     EntryType type = EntryType::Unused;
@@ -39,8 +49,6 @@ struct DirectoryEntry {
     std::uint64_t size = 0;
 };
 
-// Orders element names as the format does: shorter names first, then by upper-case units.
-bool NameLess(const std::wstring& a, const std::wstring& b);
 bool NameEqual(const std::wstring& a, const std::wstring& b);
 
 class CompoundFile {
@@ -54,8 +62,8 @@ public:
     const DirectoryEntry& Entry(std::uint32_t index) const { return entries_[index]; }
     // The elements of a storage (or of the root), in the order of its directory tree.
     const std::vector<std::uint32_t>& Children(std::uint32_t index) const { return children_[index]; }
-    // The element of the storage `parent` called `name`, or kNoEntry.
-    std::uint32_t Find(std::uint32_t parent, const std::wstring& name) const;
+    // The element of the storage `parent` whose name has `key`, or kNoEntry.
+    std::uint32_t Find(std::uint32_t parent, const NameKey& key) const;
     // Checks that the sector chain of a stream holds all of its bytes.
     HRESULT CheckStream(std::uint32_t index);
     // Where a directory entry lies in the bytes.
@@ -80,6 +88,7 @@ private:
     HRESULT NextSector(std::uint32_t sector, std::uint32_t& next);
     // Walks a chain of `bytes` bytes from `start`; each sector must lie in the file.
     HRESULT CheckChain(std::uint32_t start, std::uint64_t bytes);
+    HRESULT CheckRevisits(std::uint32_t start, std::uint64_t count);
     HRESULT CheckMiniChain(std::uint32_t start, std::uint64_t bytes);
     // Collects a chain whose length the header does not give, refusing a cycle.
     HRESULT CollectChain(std::uint32_t start, std::vector<std::uint32_t>& sectors);
@@ -96,11 +105,15 @@ private:
     std::vector<std::uint32_t> fatSectors_;
     // The FAT, read one sector at a time as chains need it.
     std::vector<std::uint32_t> fat_;
-    std::vector<bool> fatLoaded_;
+    std::vector<std::uint8_t> fatLoaded_;
     std::vector<std::uint32_t> miniFat_;
     std::vector<std::uint32_t> directorySectors_;
     std::vector<DirectoryEntry> entries_;
     std::vector<std::vector<std::uint32_t>> children_;
+    // The streams whose chains have been checked whole.
+    std::vector<bool> checked_;
+    std::vector<std::uint8_t> window_;
+    ULONGLONG windowStart_ = 0;
 };
 
 } // namespace ut::platform::posix

@@ -13,6 +13,8 @@
 #include <ut/platform/files.h>
 #include <ut/platform/text.h>
 
+#include "posix/letters.h"
+
 namespace {
 
 constexpr UINT kFirstRegisteredFormat = 0xC000;
@@ -30,9 +32,7 @@ FormatTable& Formats() {
 
 bool SameName(const std::wstring& a, const wchar_t* b) {
     std::size_t length = std::wcslen(b);
-    return a.size() == length && std::equal(a.begin(), a.end(), b, [](wchar_t x, wchar_t y) {
-               return std::towupper(static_cast<wint_t>(x)) == std::towupper(static_cast<wint_t>(y));
-           });
+    return a.size() == length && std::equal(a.begin(), a.end(), b, ut::platform::posix::SameLetter);
 }
 
 // The names of a DROPFILES block, read within the block's bounds.

@@ -20,11 +20,13 @@
 #include <ut/platform/detail/boundary.h>
 #include <ut/platform/files.h>
 
+#include "posix/letters.h"
 #include "posix/path.h"
 
 namespace {
 
 using ut::platform::WideFromUtf8;
+using ut::platform::posix::SameLetter;
 using ut::platform::posix::SystemPath;
 
 constexpr DWORD ERROR_BUFFER_OVERFLOW = 111;
@@ -67,10 +69,6 @@ void CopyCut(std::wstring_view text, wchar_t* buffer, std::size_t capacity) {
     std::size_t length = std::min(text.size(), capacity - 1);
     std::wmemcpy(buffer, text.data(), length);
     buffer[length] = L'\0';
-}
-
-bool SameLetter(wchar_t a, wchar_t b) {
-    return std::towupper(static_cast<wint_t>(a)) == std::towupper(static_cast<wint_t>(b));
 }
 
 // Windows patterns: '*' any run, '?' one character, letters without case; "*.*" is everything.

@@ -109,10 +109,10 @@ public:
                               mode_);
     }
 
-    HRESULT ReplaceContent(const ContentWriter& write) override {
+    HRESULT ReplaceContent(const ContentWriter& write, bool durable) override {
         if (!CanWrite(mode_))
             return STG_E_ACCESSDENIED;
-        return ut::ExportBoundary([&] { return Replace(write); });
+        return ut::ExportBoundary([&] { return Replace(write, durable); });
     }
 
     const std::wstring& Path() const override { return shownPath_; }
@@ -127,12 +127,12 @@ private:
             (void)::unlink(path_.c_str()); // nothing to report to at the last release
     }
 
-    HRESULT Replace(const ContentWriter& write) {
+    HRESULT Replace(const ContentWriter& write, bool durable) {
         std::string temporary = path_ + ".XXXXXX";
         int fd = ::mkostemp(temporary.data(), O_CLOEXEC);
         if (fd < 0)
             return StorageError(errno, STG_E_WRITEFAULT);
-        HRESULT hr = WriteAndSync(fd, write);
+        HRESULT hr = WriteAndSync(fd, write, durable);
         if (SUCCEEDED(hr) && ::rename(temporary.c_str(), path_.c_str()) != 0)
             hr = StorageError(errno, STG_E_WRITEFAULT);
         if (FAILED(hr)) {
@@ -140,15 +140,16 @@ private:
             ::close(fd);
             return hr;
         }
-        SyncFolderOf(path_);
+        if (durable)
+            SyncFolderOf(path_);
         ::close(fd_);
         fd_ = fd;
         return S_OK;
     }
 
     // Writes the content through a stdio stream on a duplicate of `fd`, gives it the file's
-    // permissions and flushes it to the disk.
-    HRESULT WriteAndSync(int fd, const ContentWriter& write) {
+    // permissions and, when asked, flushes it to the disk.
+    HRESULT WriteAndSync(int fd, const ContentWriter& write, bool durable) {
         int duplicate = ::dup(fd);
         std::FILE* file = duplicate >= 0 ? ::fdopen(duplicate, "w+b") : nullptr;
         if (!file) {
@@ -165,7 +166,7 @@ private:
         struct stat info {};
         if (::fstat(fd_, &info) == 0)
             (void)::fchmod(fd, info.st_mode & 07777); // the owner's default is only less open
-        if (::fdatasync(fd) != 0)
+        if (durable && ::fdatasync(fd) != 0)
             return StorageError(errno, STG_E_WRITEFAULT);
         return S_OK;
     }

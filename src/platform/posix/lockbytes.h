@@ -16,10 +16,11 @@ using ContentWriter = std::function<HRESULT(std::FILE* file)>;
 // What a byte array over a file offers beyond ILockBytes.
 class FileBytes {
 public:
-    // Writes a new content into a temporary file beside the file, flushes it to the disk and
-    // renames it over the file, so that a crash at any moment leaves the old content or the new
-    // one. The byte array then reads the new file.
-    virtual HRESULT ReplaceContent(const ContentWriter& write) = 0;
+    // Writes a new content into a temporary file beside the file and renames it over the file,
+    // so that a crash at any moment leaves the old content or the new one; `durable` flushes
+    // both to the disk first, so that a power loss does too. The byte array then reads the new
+    // file.
+    virtual HRESULT ReplaceContent(const ContentWriter& write, bool durable) = 0;
     // The file's absolute path.
     virtual const std::wstring& Path() const = 0;
 

@@ -151,13 +151,18 @@ public:
             return STG_E_ACCESSDENIED;
         if (count == 0)
             return S_OK;
-        ULONGLONG end = position_ + count;
-        if (end > kMaxStreamSize)
+        if (position_ + count > kMaxStreamSize)
             return STG_E_MEDIUMFULL;
-        if (HRESULT hr = Resize(std::max(end, node_->size)); FAILED(hr))
+        if (HRESULT hr = document_->Materialize(*node_); FAILED(hr))
             return hr;
-        std::memcpy(node_->bytes->data() + position_, buffer, count);
-        position_ = end;
+        HRESULT hr = ut::ExportBoundary(
+            [&] {
+                Put(static_cast<const std::uint8_t*>(buffer), count);
+                return S_OK;
+            },
+            HRESULT{STG_E_INSUFFICIENTMEMORY});
+        if (FAILED(hr))
+            return hr;
         if (written)
             *written = count;
         return S_OK;
@@ -210,6 +215,21 @@ private:
     ~StorageStream() override { --node_->holders; }
 
     HRESULT Usable() const { return document_->Closed() || node_->gone ? STG_E_REVERTED : S_OK; }
+
+    // Writes over what is at the position and appends the rest, with zeros for a gap before it:
+    // appended bytes are copied once, never cleared first.
+    void Put(const std::uint8_t* data, ULONG count) {
+        std::vector<std::uint8_t>& bytes = *node_->bytes;
+        if (position_ > bytes.size())
+            bytes.resize(position_);
+        std::size_t over = std::min<std::size_t>(count, bytes.size() - position_);
+        if (over)
+            std::memcpy(bytes.data() + position_, data, over);
+        bytes.insert(bytes.end(), data + over, data + count);
+        node_->size = bytes.size();
+        position_ += count;
+        document_->Touch();
+    }
 
     HRESULT Resize(ULONGLONG size) {
         if (HRESULT hr = document_->Materialize(*node_); FAILED(hr))
@@ -429,11 +449,8 @@ public:
         if (HRESULT hr = Usable(); FAILED(hr))
             return hr;
         return ut::ExportBoundary([&] {
-            std::vector<std::shared_ptr<Node>> sorted = node_->children;
-            std::sort(sorted.begin(), sorted.end(),
-                      [](const auto& a, const auto& b) { return NameLess(a->name, b->name); });
             std::shared_ptr<ElementList::Elements> list(new ElementList::Elements, FreeElements);
-            for (const std::shared_ptr<Node>& child : sorted) {
+            for (const std::shared_ptr<Node>& child : node_->children) {
                 if (HRESULT hr =
                         FillElementStat(*child, child->name, 0, STATFLAG_DEFAULT, &list->emplace_back());
                     FAILED(hr))
@@ -466,7 +483,9 @@ public:
         if (node->holders > 0)
             return STG_E_ACCESSDENIED;
         return ut::ExportBoundary([&] {
-            node->name = newName;
+            node_->Remove(node.get());
+            node->Name(newName);
+            node_->Insert(node);
             document_->Touch();
             return S_OK;
         });
@@ -559,12 +578,12 @@ private:
                 node_->Remove(existing.get());
             }
             node = std::make_shared<Node>();
-            node->name = name;
+            node->Name(name);
             node->type = type;
             node->parent = node_.get();
             if (type == STGTY_STREAM)
                 node->bytes = std::make_unique<std::vector<std::uint8_t>>();
-            node_->children.push_back(node);
+            node_->Insert(node);
             document_->Touch();
             return S_OK;
         });

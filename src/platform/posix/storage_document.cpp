@@ -23,10 +23,6 @@ HRESULT WriteFailure() {
     return errno == ENOSPC || errno == EFBIG ? STG_E_MEDIUMFULL : STG_E_WRITEFAULT;
 }
 
-bool NodeLess(const std::shared_ptr<Node>& a, const std::shared_ptr<Node>& b) {
-    return NameLess(a->name, b->name);
-}
-
 void PutLe32(std::uint8_t* p, std::uint32_t value) {
     for (int i = 0; i < 4; ++i)
         p[i] = static_cast<std::uint8_t>(value >> (8 * i));
@@ -85,7 +81,7 @@ HRESULT PlanStorage(const CompoundFile& layout, std::uint32_t entry, const Node&
     const std::vector<std::uint32_t>& elements = layout.Children(entry);
     patches[entry].child = BalancedTree(elements, patches);
     for (std::uint32_t element : elements) {
-        std::shared_ptr<Node> node = storage.Find(layout.Entry(element).name);
+        std::shared_ptr<Node> node = storage.Find(layout.Entry(element).key);
         if (!node)
             return STG_E_DOCFILECORRUPT;
         if (!node->IsStorage()) {
@@ -126,11 +122,24 @@ HRESULT WriteFull(int fd, ULONGLONG offset, const std::uint8_t* buffer, std::siz
 
 } // namespace
 
-std::shared_ptr<Node> Node::Find(const std::wstring& wanted) const {
-    for (const std::shared_ptr<Node>& child : children)
-        if (NameEqual(child->name, wanted))
-            return child;
-    return nullptr;
+namespace {
+
+auto Place(const std::vector<std::shared_ptr<Node>>& children, const NameKey& key) {
+    return std::lower_bound(
+        children.begin(), children.end(), key,
+        [](const std::shared_ptr<Node>& child, const NameKey& wanted) { return child->key < wanted; });
+}
+
+} // namespace
+
+std::shared_ptr<Node> Node::Find(const NameKey& wanted) const {
+    auto found = Place(children, wanted);
+    return found != children.end() && (*found)->key == wanted ? *found : nullptr;
+}
+
+void Node::Insert(std::shared_ptr<Node> child) {
+    auto at = Place(children, child->key);
+    children.insert(at, std::move(child));
 }
 
 void Node::Remove(const Node* child) {
@@ -160,8 +169,7 @@ HRESULT Document::Open(ILockBytes* bytes, DWORD mode, std::wstring name, SNB exc
         std::shared_ptr<Document> opened(new Document(bytes, mode, std::move(name)));
         if (HRESULT hr = opened->Load(); FAILED(hr))
             return hr;
-        if (HRESULT hr = opened->Resource(opened->Root(), 0); FAILED(hr))
-            return hr;
+        opened->Adopt(opened->Root(), 0);
         opened->BuildChildren(opened->Root());
         opened->Exclude(opened->Root(), exclude);
         document = std::move(opened);
@@ -173,7 +181,8 @@ HRESULT Document::Create(ILockBytes* bytes, DWORD mode, std::wstring name,
                          std::shared_ptr<Document>& document) {
     return ut::ExportBoundary([&] {
         std::shared_ptr<Document> created(new Document(bytes, mode, std::move(name)));
-        if (HRESULT hr = created->Commit(); FAILED(hr))
+        // An empty storage needs no flush: what it replaces was given up by creating it.
+        if (HRESULT hr = created->Commit(false); FAILED(hr))
             return hr;
         document = std::move(created);
         return S_OK;
@@ -192,31 +201,19 @@ HRESULT Document::Load() {
     return OpenGsfReader(bytes_.Get(), stat.cbSize.QuadPart, reader_);
 }
 
-// Points a node and everything below it at the entries of the file just read. Streams that no
-// interface holds drop their bytes: the file has them now.
-HRESULT Document::Resource(Node& node, std::uint32_t entry) {
+// Takes a node's place and attributes from its entry in the file just read.
+void Document::Adopt(Node& node, std::uint32_t entry) {
     const DirectoryEntry& found = layout_->Entry(entry);
     node.entry = entry;
     node.sourceName = found.utf8Name;
-    node.reader.reset();
+    node.sourceKey = found.key;
+    node.inFile = true;
     node.clsid = found.clsid;
     node.stateBits = found.stateBits;
     node.created = found.created;
     node.modified = found.modified;
-    if (!node.IsStorage()) {
-        if (node.holders == 0)
-            node.bytes.reset();
-        node.size = node.bytes ? node.bytes->size() : found.size;
-        return S_OK;
-    }
-    for (std::shared_ptr<Node>& child : node.children) {
-        std::uint32_t element = layout_->Find(entry, child->name);
-        if (element == kNoEntry)
-            return STG_E_DOCFILECORRUPT;
-        if (HRESULT hr = Resource(*child, element); FAILED(hr))
-            return hr;
-    }
-    return S_OK;
+    if (!node.IsStorage())
+        node.size = found.size;
 }
 
 void Document::BuildChildren(Node& storage) {
@@ -224,13 +221,51 @@ void Document::BuildChildren(Node& storage) {
         const DirectoryEntry& found = layout_->Entry(element);
         auto node = std::make_shared<Node>();
         node->name = found.name;
+        node->key = found.key;
         node->type = found.type == EntryType::Storage ? STGTY_STORAGE : STGTY_STREAM;
         node->parent = &storage;
-        (void)Resource(*node, element); // a node without children cannot miss one
+        Adopt(*node, element);
         if (node->IsStorage())
             BuildChildren(*node);
         storage.children.push_back(std::move(node));
     }
+}
+
+// After a commit the file holds the tree as it stands: streams that no interface holds drop
+// their bytes, and each node is found again in the file by its present name when it is read.
+void Document::Rebase(Node& node) {
+    node.entry = kNoEntry;
+    node.sourceName = Utf8FromWide(node.name);
+    node.sourceKey = node.key;
+    node.inFile = true;
+    node.reader.reset();
+    if (!node.IsStorage()) {
+        if (node.holders == 0)
+            node.bytes.reset();
+        return;
+    }
+    for (std::shared_ptr<Node>& child : node.children)
+        Rebase(*child);
+}
+
+// Finds the entries of the nodes the file holds; nodes made since the commit have none.
+void Document::Locate(Node& node, std::uint32_t entry) {
+    node.entry = entry;
+    for (std::shared_ptr<Node>& child : node.children) {
+        std::uint32_t element = child->inFile ? layout_->Find(entry, child->sourceKey) : kNoEntry;
+        if (element != kNoEntry)
+            Locate(*child, element);
+    }
+}
+
+// The file is read again only when something is read from it after a commit.
+HRESULT Document::EnsureLoaded() {
+    if (layout_)
+        return S_OK;
+    if (HRESULT hr = Load(); FAILED(hr))
+        return hr;
+    Locate(*root_, 0);
+    return S_OK;
 }
 
 void Document::Exclude(Node& storage, SNB names) {
@@ -260,7 +295,9 @@ GsfInfile* Document::ReaderOf(Node& storage) {
 }
 
 HRESULT Document::CheckSource(const Node& stream) {
-    if (stream.entry == kNoEntry || !layout_)
+    if (HRESULT hr = EnsureLoaded(); FAILED(hr))
+        return hr;
+    if (stream.entry == kNoEntry)
         return STG_E_DOCFILECORRUPT;
     return layout_->CheckStream(stream.entry);
 }
@@ -289,21 +326,24 @@ HRESULT Document::Materialize(Node& stream) {
     });
 }
 
-HRESULT Document::Commit() {
+HRESULT Document::Commit(bool durable) {
     if (closed_)
         return STG_E_REVERTED;
     if (!Writable())
         return STG_E_ACCESSDENIED;
     return ut::ExportBoundary([&] {
         FileBytes* file = FileBehind(bytes_.Get());
-        HRESULT hr = file ? file->ReplaceContent([this](std::FILE* target) { return WriteImage(target); })
-                          : WriteThroughScratch();
+        HRESULT hr =
+            file ? file->ReplaceContent([this](std::FILE* target) { return WriteImage(target); }, durable)
+                 : WriteThroughScratch(durable);
         if (FAILED(hr))
             return hr;
-        if (FAILED(hr = Load()))
-            return hr;
+        Rebase(*root_);
+        reader_.reset();
+        layout_.reset();
+        ++generation_;
         dirty_ = false;
-        return Resource(*root_, 0);
+        return S_OK;
     });
 }
 
@@ -313,11 +353,12 @@ HRESULT Document::Revert() {
     if (!(mode_ & STGM_TRANSACTED))
         return S_OK;
     return ut::ExportBoundary([&] {
+        if (HRESULT hr = EnsureLoaded(); FAILED(hr))
+            return hr;
         for (std::shared_ptr<Node>& child : root_->children)
             MarkGone(*child);
         root_->children.clear();
-        root_->reader.reset();
-        (void)Resource(*root_, 0); // a root without children cannot miss one
+        Adopt(*root_, 0);
         BuildChildren(*root_);
         dirty_ = false;
         return S_OK;
@@ -339,7 +380,7 @@ void Document::Close() {
     bytes_.Reset();
 }
 
-HRESULT Document::WriteThroughScratch() {
+HRESULT Document::WriteThroughScratch(bool durable) {
     std::FILE* scratch = nullptr;
     if (HRESULT hr = CreateScratchFile(&scratch); FAILED(hr))
         return hr;
@@ -365,7 +406,7 @@ HRESULT Document::WriteThroughScratch() {
     total.QuadPart = static_cast<ULONGLONG>(size);
     if (HRESULT hr = bytes_->SetSize(total); FAILED(hr))
         return hr;
-    return bytes_->Flush();
+    return durable ? bytes_->Flush() : S_OK;
 }
 
 HRESULT Document::WriteImage(std::FILE* file) {
@@ -385,9 +426,7 @@ HRESULT Document::WriteImage(std::FILE* file) {
 }
 
 HRESULT Document::WriteElements(Node& storage, GsfOutfile* target) {
-    std::vector<std::shared_ptr<Node>> elements = storage.children;
-    std::sort(elements.begin(), elements.end(), NodeLess);
-    for (std::shared_ptr<Node>& element : elements) {
+    for (std::shared_ptr<Node>& element : storage.children) {
         std::string name = Utf8FromWide(element->name);
         GsfOwner<GsfOutput> child(gsf_outfile_new_child(target, name.c_str(), element->IsStorage()));
         if (!child)
@@ -436,17 +475,25 @@ HRESULT Document::PatchDirectory(int fd) {
     std::vector<EntryPatch> patches(layout->EntryCount());
     if (HRESULT hr = PlanStorage(*layout, 0, *root_, patches); FAILED(hr))
         return hr;
+    // Sectors that follow each other in the file are read, patched and written as one run.
     std::uint32_t perSector = layout->SectorSize() / kDirectoryEntrySize;
-    std::vector<std::uint8_t> sector(layout->SectorSize());
-    for (std::uint32_t first = 0; first < layout->EntryCount(); first += perSector) {
+    std::vector<std::uint8_t> run;
+    for (std::uint32_t first = 0; first < layout->EntryCount();) {
         ULONGLONG offset = layout->EntryOffset(first);
-        if (HRESULT hr = ReadFull(fd, offset, sector.data(), sector.size()); FAILED(hr))
+        std::uint32_t last = first + perSector;
+        while (last < layout->EntryCount() && last - first < kCopyChunk / kDirectoryEntrySize &&
+               layout->EntryOffset(last) == offset + (last - first) * kDirectoryEntrySize)
+            last += perSector;
+        run.resize(static_cast<std::size_t>(last - first) * kDirectoryEntrySize);
+        if (HRESULT hr = ReadFull(fd, offset, run.data(), run.size()); FAILED(hr))
             return hr;
-        for (std::uint32_t i = 0; i < perSector; ++i)
-            if (patches[first + i].node)
-                ApplyPatch(patches[first + i], sector.data() + i * kDirectoryEntrySize);
-        if (HRESULT hr = WriteFull(fd, offset, sector.data(), sector.size()); FAILED(hr))
+        for (std::uint32_t i = first; i < last; ++i)
+            if (patches[i].node)
+                ApplyPatch(patches[i],
+                           run.data() + static_cast<std::size_t>(i - first) * kDirectoryEntrySize);
+        if (HRESULT hr = WriteFull(fd, offset, run.data(), run.size()); FAILED(hr))
             return hr;
+        first = last;
     }
     return S_OK;
 }

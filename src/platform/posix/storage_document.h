@@ -19,17 +19,22 @@ class Document;
 // A storage or a stream of the document.
 struct Node {
     std::wstring name;
+    NameKey key; // of the name, kept with it
     DWORD type = STGTY_STREAM;
     CLSID clsid{};
     DWORD stateBits = 0;
     FILETIME created{};
     FILETIME modified{};
     Node* parent = nullptr;
+    // A storage's elements, kept in name order (NameLess).
     std::vector<std::shared_ptr<Node>> children;
 
-    // Where the element is in the file the document last read, by libgsf's name and by entry.
+    // Where the element is in the file: its entry once the file is read, and the name it has
+    // there (for libgsf, and for finding the entry).
     std::uint32_t entry = kNoEntry;
     std::string sourceName;
+    NameKey sourceKey;
+    bool inFile = false;
     // A storage's reader, opened when one of its elements is first read.
     GsfOwner<GsfInfile> reader;
 
@@ -43,7 +48,15 @@ struct Node {
     bool gone = false;
 
     bool IsStorage() const { return type == STGTY_STORAGE; }
-    std::shared_ptr<Node> Find(const std::wstring& name) const;
+    std::shared_ptr<Node> Find(const std::wstring& name) const { return Find(KeyOf(name)); }
+    std::shared_ptr<Node> Find(const NameKey& key) const;
+    // Names the node; its place among its siblings is the caller's to keep.
+    void Name(std::wstring text) {
+        key = KeyOf(text);
+        name = std::move(text);
+    }
+    // Adds an element where its name belongs; none of that name may be there.
+    void Insert(std::shared_ptr<Node> child);
     void Remove(const Node* child);
 };
 
@@ -70,8 +83,9 @@ public:
     std::uint64_t Generation() const { return generation_; }
     void Touch() { dirty_ = true; }
 
-    // Writes the whole tree into the file, atomically where the bytes are a file of ours.
-    HRESULT Commit();
+    // Writes the whole tree into the file, atomically where the bytes are a file of ours, and
+    // durably unless asked not to.
+    HRESULT Commit(bool durable = true);
     // Forgets the changes since the last commit; the elements open until now are reverted.
     HRESULT Revert();
     // The root's last release: a direct-mode document writes its changes first.
@@ -90,14 +104,17 @@ private:
     Document(ILockBytes* bytes, DWORD mode, std::wstring name);
 
     HRESULT Load();
+    HRESULT EnsureLoaded();
+    void Adopt(Node& node, std::uint32_t entry);
     void BuildChildren(Node& storage);
-    HRESULT Resource(Node& node, std::uint32_t entry);
+    void Rebase(Node& node);
+    void Locate(Node& node, std::uint32_t entry);
     GsfInfile* ReaderOf(Node& storage);
     HRESULT WriteImage(std::FILE* file);
     HRESULT WriteElements(Node& storage, GsfOutfile* target);
     HRESULT WriteStream(Node& stream, GsfOutput* target);
     HRESULT PatchDirectory(int fd);
-    HRESULT WriteThroughScratch();
+    HRESULT WriteThroughScratch(bool durable);
 
     ComPtr<ILockBytes> bytes_;
     DWORD mode_;
