@@ -7,7 +7,7 @@
 #include <ut/platform/dataobject.h>
 #include <ut/platform/detail/boundary.h>
 
-#include "common/object.h"
+#include "common/list_enumerator.h"
 
 namespace ut::platform {
 namespace {
@@ -69,43 +69,16 @@ HRESULT CopyMedium(const STGMEDIUM& from, STGMEDIUM& to, IUnknown* keeper) {
     }
 }
 
-class FormatList final : public Object<IEnumFORMATETC> {
+class FormatList final : public ListEnumerator<FormatList, IEnumFORMATETC, FORMATETC> {
 public:
-    FormatList(std::vector<FORMATETC> formats, ULONG next) : formats_(std::move(formats)), next_(next) {}
+    using ListEnumerator::ListEnumerator;
 
-    HRESULT STDMETHODCALLTYPE Next(ULONG count, FORMATETC* out, ULONG* fetched) override {
-        if (fetched)
-            *fetched = 0;
-        if (!out || (count > 1 && !fetched))
-            return E_INVALIDARG;
-        ULONG done = 0;
-        for (; done < count && next_ < formats_.size(); ++done)
-            out[done] = formats_[next_++];
-        if (fetched)
-            *fetched = done;
-        return done == count ? S_OK : S_FALSE;
+    static constexpr HRESULT kNullArray = E_INVALIDARG;
+    static bool CopyOut(const FORMATETC& from, FORMATETC& to) {
+        to = from;
+        return true;
     }
-    HRESULT STDMETHODCALLTYPE Skip(ULONG count) override {
-        ULONG left = static_cast<ULONG>(formats_.size()) - next_;
-        next_ += std::min(count, left);
-        return count <= left ? S_OK : S_FALSE;
-    }
-    HRESULT STDMETHODCALLTYPE Reset() override {
-        next_ = 0;
-        return S_OK;
-    }
-    HRESULT STDMETHODCALLTYPE Clone(IEnumFORMATETC** clone) override {
-        if (!clone)
-            return E_INVALIDARG;
-        return ut::ExportBoundary([&] {
-            *clone = new FormatList(formats_, next_);
-            return S_OK;
-        });
-    }
-
-private:
-    std::vector<FORMATETC> formats_;
-    ULONG next_;
+    static void Discard(FORMATETC&) {}
 };
 
 class DataObject final : public Object<IDataObject> {
@@ -164,9 +137,9 @@ public:
         if (direction != DATADIR_GET)
             return E_NOTIMPL;
         return ut::ExportBoundary([&] {
-            std::vector<FORMATETC> list;
+            auto list = std::make_shared<FormatList::Items>();
             for (const Held& held : held_)
-                list.push_back(held.format);
+                list->push_back(held.format);
             *formats = new FormatList(std::move(list), 0);
             return S_OK;
         });

@@ -14,6 +14,7 @@
 
 #include "common/lockbytes_base.h"
 #include "common/stream_base.h"
+#include "posix/descriptor.h"
 #include "posix/path.h"
 
 namespace ut::platform::posix {
@@ -40,51 +41,26 @@ public:
           ownsDescriptor_(ownsDescriptor) {}
 
     HRESULT STDMETHODCALLTYPE ReadAt(ULARGE_INTEGER offset, void* buffer, ULONG count, ULONG* read) override {
+        if (HRESULT hr = BeginTransfer(buffer, count, read); FAILED(hr))
+            return hr;
+        std::size_t done = 0;
+        HRESULT hr = PreadFully(fd_, offset.QuadPart, buffer, count, done);
         if (read)
-            *read = 0;
-        if (!buffer && count)
-            return STG_E_INVALIDPOINTER;
-        ULONG done = 0;
-        while (done < count) {
-            ssize_t got = ::pread(fd_, static_cast<char*>(buffer) + done, count - done,
-                                  static_cast<off_t>(offset.QuadPart + done));
-            if (got < 0 && errno == EINTR)
-                continue;
-            if (got < 0)
-                return StorageError(errno, STG_E_READFAULT);
-            if (got == 0)
-                break;
-            done += static_cast<ULONG>(got);
-        }
-        if (read)
-            *read = done;
-        return S_OK;
+            *read = static_cast<ULONG>(done);
+        return hr;
     }
 
     HRESULT STDMETHODCALLTYPE WriteAt(ULARGE_INTEGER offset, const void* buffer, ULONG count,
                                       ULONG* written) override {
-        if (written)
-            *written = 0;
-        if (!buffer && count)
-            return STG_E_INVALIDPOINTER;
+        if (HRESULT hr = BeginTransfer(buffer, count, written); FAILED(hr))
+            return hr;
         if (!CanWrite(mode_))
             return STG_E_ACCESSDENIED;
-        ULONG done = 0;
-        while (done < count) {
-            ssize_t put = ::pwrite(fd_, static_cast<const char*>(buffer) + done, count - done,
-                                   static_cast<off_t>(offset.QuadPart + done));
-            if (put < 0 && errno == EINTR)
-                continue;
-            if (put <= 0) {
-                if (written)
-                    *written = done;
-                return put < 0 ? StorageError(errno, STG_E_WRITEFAULT) : STG_E_WRITEFAULT;
-            }
-            done += static_cast<ULONG>(put);
-        }
+        std::size_t done = 0;
+        HRESULT hr = PwriteFully(fd_, offset.QuadPart, buffer, count, done);
         if (written)
-            *written = done;
-        return S_OK;
+            *written = static_cast<ULONG>(done);
+        return hr;
     }
 
     HRESULT STDMETHODCALLTYPE Flush() override {
@@ -186,10 +162,8 @@ public:
     GlobalLockBytes(HGLOBAL block, bool deleteOnRelease) : block_(block), deleteOnRelease_(deleteOnRelease) {}
 
     HRESULT STDMETHODCALLTYPE ReadAt(ULARGE_INTEGER offset, void* buffer, ULONG count, ULONG* read) override {
-        if (read)
-            *read = 0;
-        if (!buffer && count)
-            return STG_E_INVALIDPOINTER;
+        if (HRESULT hr = BeginTransfer(buffer, count, read); FAILED(hr))
+            return hr;
         ULONGLONG size = GlobalSize(block_);
         if (offset.QuadPart >= size || count == 0)
             return S_OK;
@@ -205,10 +179,8 @@ public:
 
     HRESULT STDMETHODCALLTYPE WriteAt(ULARGE_INTEGER offset, const void* buffer, ULONG count,
                                       ULONG* written) override {
-        if (written)
-            *written = 0;
-        if (!buffer && count)
-            return STG_E_INVALIDPOINTER;
+        if (HRESULT hr = BeginTransfer(buffer, count, written); FAILED(hr))
+            return hr;
         if (count == 0)
             return S_OK;
         ULONGLONG end = offset.QuadPart + count;

@@ -8,7 +8,7 @@
 #include <ut/platform/detail/boundary.h>
 #include <ut/platform/files.h>
 
-#include "common/object.h"
+#include "common/list_enumerator.h"
 #include "common/stream_base.h"
 #include "posix/lockbytes.h"
 #include "posix/path.h"
@@ -269,58 +269,17 @@ private:
 };
 
 // A storage's elements as they were when the list was asked for.
-class ElementList final : public Object<IEnumSTATSTG> {
+class ElementList final : public ListEnumerator<ElementList, IEnumSTATSTG, STATSTG> {
 public:
-    using Elements = std::vector<STATSTG>;
+    using ListEnumerator::ListEnumerator;
 
-    ElementList(std::shared_ptr<Elements> elements, ULONG next)
-        : elements_(std::move(elements)), next_(next) {}
-
-    HRESULT STDMETHODCALLTYPE Next(ULONG count, STATSTG* out, ULONG* fetched) override {
-        if (fetched)
-            *fetched = 0;
-        if (!out)
-            return STG_E_INVALIDPOINTER;
-        if (count > 1 && !fetched)
-            return E_INVALIDARG;
-        ULONG done = 0;
-        for (; done < count && next_ < elements_->size(); ++done, ++next_) {
-            out[done] = (*elements_)[next_];
-            out[done].pwcsName = TaskCopy((*elements_)[next_].pwcsName);
-            if (!out[done].pwcsName) {
-                for (ULONG i = 0; i < done; ++i)
-                    CoTaskMemFree(out[i].pwcsName);
-                return STG_E_INSUFFICIENTMEMORY;
-            }
-        }
-        if (fetched)
-            *fetched = done;
-        return done == count ? S_OK : S_FALSE;
+    static constexpr HRESULT kNullArray = STG_E_INVALIDPOINTER;
+    static bool CopyOut(const STATSTG& from, STATSTG& to) {
+        to = from;
+        to.pwcsName = TaskCopy(from.pwcsName);
+        return to.pwcsName != nullptr;
     }
-
-    HRESULT STDMETHODCALLTYPE Skip(ULONG count) override {
-        ULONG left = static_cast<ULONG>(elements_->size()) - next_;
-        next_ += std::min(count, left);
-        return count <= left ? S_OK : S_FALSE;
-    }
-
-    HRESULT STDMETHODCALLTYPE Reset() override {
-        next_ = 0;
-        return S_OK;
-    }
-
-    HRESULT STDMETHODCALLTYPE Clone(IEnumSTATSTG** clone) override {
-        if (!clone)
-            return STG_E_INVALIDPOINTER;
-        *clone = new (std::nothrow) ElementList(elements_, next_);
-        return *clone ? S_OK : E_OUTOFMEMORY;
-    }
-
-private:
-    ~ElementList() override = default;
-
-    std::shared_ptr<Elements> elements_;
-    ULONG next_;
+    static void Discard(STATSTG& element) { CoTaskMemFree(element.pwcsName); }
 };
 
 void FreeElements(std::vector<STATSTG>* elements) {
@@ -449,7 +408,7 @@ public:
         if (HRESULT hr = Usable(); FAILED(hr))
             return hr;
         return ut::ExportBoundary([&] {
-            std::shared_ptr<ElementList::Elements> list(new ElementList::Elements, FreeElements);
+            std::shared_ptr<ElementList::Items> list(new ElementList::Items, FreeElements);
             for (const std::shared_ptr<Node>& child : node_->children) {
                 if (HRESULT hr =
                         FillElementStat(*child, child->name, 0, STATFLAG_DEFAULT, &list->emplace_back());
@@ -698,6 +657,19 @@ HRESULT TemporaryStoragePath(std::string& path) {
     return S_OK;
 }
 
+// What every call that opens or creates a root checks first: the out-parameter, what to open
+// (`missing` is S_OK when it is there, else the answer), the reserved value and the mode.
+HRESULT BeginRoot(IStorage** storage, HRESULT missing, DWORD reserved, DWORD mode, bool create) {
+    if (!storage)
+        return STG_E_INVALIDPOINTER;
+    *storage = nullptr;
+    if (FAILED(missing))
+        return missing;
+    if (reserved)
+        return STG_E_INVALIDPARAMETER;
+    return CheckRootMode(mode, create);
+}
+
 bool HasSignature(ILockBytes* bytes, HRESULT& hr) {
     std::uint8_t start[sizeof kSignature] = {};
     ULONG read = 0;
@@ -735,14 +707,8 @@ HRESULT StgIsStorageFile(const OLECHAR* name) {
 
 HRESULT StgOpenStorageOnILockBytes(ILockBytes* bytes, IStorage*, DWORD mode, SNB exclude, DWORD reserved,
                                    IStorage** storage) {
-    if (!storage)
-        return STG_E_INVALIDPOINTER;
-    *storage = nullptr;
-    if (!bytes)
-        return STG_E_INVALIDPOINTER;
-    if (reserved)
-        return STG_E_INVALIDPARAMETER;
-    if (HRESULT hr = CheckRootMode(mode, false); FAILED(hr))
+    if (HRESULT hr = BeginRoot(storage, bytes ? S_OK : STG_E_INVALIDPOINTER, reserved, mode, false);
+        FAILED(hr))
         return hr;
     return ut::ExportBoundary([&] {
         std::shared_ptr<Document> document;
@@ -753,14 +719,8 @@ HRESULT StgOpenStorageOnILockBytes(ILockBytes* bytes, IStorage*, DWORD mode, SNB
 }
 
 HRESULT StgCreateDocfileOnILockBytes(ILockBytes* bytes, DWORD mode, DWORD reserved, IStorage** storage) {
-    if (!storage)
-        return STG_E_INVALIDPOINTER;
-    *storage = nullptr;
-    if (!bytes)
-        return STG_E_INVALIDPOINTER;
-    if (reserved)
-        return STG_E_INVALIDPARAMETER;
-    if (HRESULT hr = CheckRootMode(mode, true); FAILED(hr))
+    if (HRESULT hr = BeginRoot(storage, bytes ? S_OK : STG_E_INVALIDPOINTER, reserved, mode, true);
+        FAILED(hr))
         return hr;
     STATSTG stat{};
     if (HRESULT hr = bytes->Stat(&stat, STATFLAG_NONAME); FAILED(hr))
@@ -778,14 +738,7 @@ HRESULT StgCreateDocfileOnILockBytes(ILockBytes* bytes, DWORD mode, DWORD reserv
 
 HRESULT StgOpenStorage(const OLECHAR* name, IStorage* priority, DWORD mode, SNB exclude, DWORD reserved,
                        IStorage** storage) {
-    if (!storage)
-        return STG_E_INVALIDPOINTER;
-    *storage = nullptr;
-    if (!name)
-        return STG_E_INVALIDNAME;
-    if (reserved)
-        return STG_E_INVALIDPARAMETER;
-    if (HRESULT hr = CheckRootMode(mode, false); FAILED(hr))
+    if (HRESULT hr = BeginRoot(storage, name ? S_OK : STG_E_INVALIDNAME, reserved, mode, false); FAILED(hr))
         return hr;
     return ut::ExportBoundary([&] {
         ut::ComPtr<ILockBytes> bytes;
@@ -797,15 +750,10 @@ HRESULT StgOpenStorage(const OLECHAR* name, IStorage* priority, DWORD mode, SNB 
 }
 
 HRESULT StgCreateDocfile(const OLECHAR* name, DWORD mode, DWORD reserved, IStorage** storage) {
-    if (!storage)
-        return STG_E_INVALIDPOINTER;
-    *storage = nullptr;
-    if (reserved)
-        return STG_E_INVALIDPARAMETER;
-    if (HRESULT hr = CheckRootMode(mode, true); FAILED(hr))
+    // A null name makes a temporary file; an empty one names nothing.
+    HRESULT named = name && !*name ? STG_E_INVALIDNAME : S_OK;
+    if (HRESULT hr = BeginRoot(storage, named, reserved, mode, true); FAILED(hr))
         return hr;
-    if (name && !*name)
-        return STG_E_INVALIDNAME;
     return ut::ExportBoundary([&] {
         std::string path;
         auto disposition = (mode & STGM_CREATE) ? Disposition::OpenOrCreate : Disposition::CreateNew;

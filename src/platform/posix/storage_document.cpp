@@ -11,6 +11,7 @@
 
 #include <ut/platform/detail/boundary.h>
 
+#include "posix/descriptor.h"
 #include "posix/lockbytes.h"
 #include "posix/path.h"
 
@@ -94,30 +95,16 @@ HRESULT PlanStorage(const CompoundFile& layout, std::uint32_t entry, const Node&
     return S_OK;
 }
 
+// Reads or writes all of `count` bytes; a short read means the written file lost its end.
 HRESULT ReadFull(int fd, ULONGLONG offset, std::uint8_t* buffer, std::size_t count) {
     std::size_t done = 0;
-    while (done < count) {
-        ssize_t got = ::pread(fd, buffer + done, count - done, static_cast<off_t>(offset + done));
-        if (got < 0 && errno == EINTR)
-            continue;
-        if (got <= 0)
-            return STG_E_READFAULT;
-        done += static_cast<std::size_t>(got);
-    }
-    return S_OK;
+    HRESULT hr = PreadFully(fd, offset, buffer, count, done);
+    return FAILED(hr) || done == count ? hr : STG_E_READFAULT;
 }
 
 HRESULT WriteFull(int fd, ULONGLONG offset, const std::uint8_t* buffer, std::size_t count) {
     std::size_t done = 0;
-    while (done < count) {
-        ssize_t put = ::pwrite(fd, buffer + done, count - done, static_cast<off_t>(offset + done));
-        if (put < 0 && errno == EINTR)
-            continue;
-        if (put <= 0)
-            return WriteFailure();
-        done += static_cast<std::size_t>(put);
-    }
-    return S_OK;
+    return PwriteFully(fd, offset, buffer, count, done);
 }
 
 } // namespace

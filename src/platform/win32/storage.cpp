@@ -46,10 +46,8 @@ public:
         : file_(file), path_(std::move(path)), mode_(mode) {}
 
     HRESULT STDMETHODCALLTYPE ReadAt(ULARGE_INTEGER offset, void* buffer, ULONG count, ULONG* read) override {
-        if (read)
-            *read = 0;
-        if (!buffer && count)
-            return STG_E_INVALIDPOINTER;
+        if (HRESULT hr = BeginTransfer(buffer, count, read); FAILED(hr))
+            return hr;
         OVERLAPPED at = At(offset);
         DWORD done = 0;
         if (!ReadFile(file_, buffer, count, &done, &at) && GetLastError() != ERROR_HANDLE_EOF)
@@ -61,10 +59,8 @@ public:
 
     HRESULT STDMETHODCALLTYPE WriteAt(ULARGE_INTEGER offset, const void* buffer, ULONG count,
                                       ULONG* written) override {
-        if (written)
-            *written = 0;
-        if (!buffer && count)
-            return STG_E_INVALIDPOINTER;
+        if (HRESULT hr = BeginTransfer(buffer, count, written); FAILED(hr))
+            return hr;
         if (!CanWrite(mode_))
             return STG_E_ACCESSDENIED;
         OVERLAPPED at = At(offset);
