@@ -2,7 +2,12 @@
 # fuzz/CMakeLists.txt turns each into a libFuzzer binary; tests/CMakeLists.txt into a replay of
 # fuzz/corpus/<name>/ under CTest.
 ut_fuzz_target(stream stream_fuzz.cpp)
-# Our own compound-file reader; on Windows the reader is the system's, not ours to fuzz.
+ut_fuzz_target(mifile mifile_fuzz.cpp)
+ut_fuzz_target(compare compare_fuzz.cpp)
+# The ".reg" import writes to the registry's roots: it runs on the private store in memory that
+# only the POSIX home has. Our own compound-file reader is POSIX's too; on Windows the reader is
+# the system's, not ours to fuzz.
 if(NOT WIN32)
+  ut_fuzz_target(regfile regfile_fuzz.cpp)
   ut_fuzz_target(storage storage_fuzz.cpp)
 endif()

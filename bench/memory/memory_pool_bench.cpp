@@ -17,6 +17,8 @@
 #include <ut/host/reference_host.h>
 #include <ut/memory.h>
 
+#include "support/rate_reporter.h"
+
 namespace {
 
 struct PoolAllocator {
@@ -113,20 +115,8 @@ void RegisterSideBySide() {
 }
 
 // The console output, followed by the pool's rate against each other allocator per scenario.
-class RatioReporter : public benchmark::ConsoleReporter {
+class RatioReporter : public ut::bench::RateReporter {
 public:
-    RatioReporter() : ConsoleReporter(OO_Tabular) {}
-
-    void ReportRuns(const std::vector<Run>& runs) override {
-        ConsoleReporter::ReportRuns(runs);
-        for (const Run& run : runs) {
-            auto rate = run.counters.find("items_per_second");
-            if (run.run_type != Run::RT_Iteration || run.error_occurred || rate == run.counters.end())
-                continue;
-            Record(run.benchmark_name(), rate->second.value);
-        }
-    }
-
     void Finalize() override {
         ConsoleReporter::Finalize();
         std::ostream& out = GetOutputStream();
@@ -153,7 +143,8 @@ private:
     using Rates = std::map<std::string, Sum>;
 
     // "pair/glibc/64" is allocator "glibc" in scenario "pair/64".
-    void Record(const std::string& name, double rate) {
+    void Record(const Run& run, double rate) override {
+        const std::string name = run.benchmark_name();
         std::size_t first = name.find('/');
         std::size_t second = name.find('/', first + 1);
         std::string allocator = name.substr(first + 1, second - first - 1);

@@ -1,6 +1,12 @@
 // Everything the library exports.
 #pragma once
 
+#include <ut/catalog.h>
+#include <ut/compare.h>
 #include <ut/export.h>
+#include <ut/frames.h>
 #include <ut/memory.h>
+#include <ut/mifile.h>
 #include <ut/persist.h>
+#include <ut/registration.h>
+#include <ut/time.h>

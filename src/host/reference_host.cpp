@@ -4,15 +4,26 @@
 #include <new>
 
 #include <ut/sdk/ambient.h>
+#include <ut/sdk/content.h>
 #include <ut/sdk/database.h>
+#include <ut/sdk/dialogs.h>
+#include <ut/sdk/families.h>
 #include <ut/sdk/notify.h>
 #include <ut/sdk/objects.h>
+#include <ut/sdk/preferences.h>
 #include <ut/sdk/version.h>
+#include <ut/sdk/views.h>
 
 #include "active_database.h"
 #include "ambient_values.h"
+#include "content_container.h"
+#include "families_manager.h"
+#include "file_dialogs.h"
 #include "notification_service.h"
+#include "preferences.h"
+#include "time_manager.h"
 #include "version_info.h"
+#include "view_manager.h"
 
 namespace ut::host {
 namespace {
@@ -32,21 +43,55 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWAmbientValues, NewService<AmbientValues>(settings).Get());
     InstallService(CLSID_GWActiveDatabase, NewService<ActiveDatabase>(settings).Get());
     InstallService(CLSID_GWNotificationService, NewService<NotificationService>(settings).Get());
+    InstallService(CLSID_GWTimeManager, NewService<TimeManager>(settings).Get());
+    InstallService(CLSID_GWPlayControl, NewService<PlayControl>(settings).Get());
+    InstallService(CLSID_GWFileDialogs, NewService<FileDialogs>(settings).Get());
+    ut::ComPtr<IClassFactory> containers =
+        ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) ContentContainerFactory(settings));
+    InstallClass(CLSID_GWContentContainer, containers.Get());
+    if (settings.currentContainer)
+        OpenContainer();
+    InstallService(CLSID_GWFamiliesManager, NewService<FamiliesManager>(settings).Get());
+    InstallService(CLSID_GWViewManager, NewService<ViewManager>(settings).Get());
+    InstallService(CLSID_GWPreferences, NewService<Preferences>(settings).Get());
 }
 
 ReferenceHost::~ReferenceHost() {
+    if (containerOpened_)
+        (void)GWContentSetCurrentContainer(nullptr); // cannot fail
+    for (const CLSID& clsid : classes_)
+        (void)GWRevokeClassFactory(clsid); // S_FALSE when another host revoked it first
     for (const CLSID& clsid : services_)
         GWRevokeGenericObject(clsid);
 }
 
-HRESULT ReferenceHost::InstallService(REFCLSID clsid, IUnknown* service) {
-    HRESULT hr = GWRegisterGenericObject(clsid, service);
-    if (FAILED(hr)) {
+HRESULT ReferenceHost::Record(HRESULT hr) {
+    if (FAILED(hr))
         status_ = hr;
-        return hr;
-    }
-    services_.push_back(clsid);
     return hr;
+}
+
+HRESULT ReferenceHost::InstallService(REFCLSID clsid, IUnknown* service) {
+    HRESULT hr = Record(GWRegisterGenericObject(clsid, service));
+    if (SUCCEEDED(hr))
+        services_.push_back(clsid);
+    return hr;
+}
+
+HRESULT ReferenceHost::InstallClass(REFCLSID clsid, IClassFactory* factory) {
+    HRESULT hr = Record(GWRegisterClassFactory(clsid, factory));
+    if (SUCCEEDED(hr))
+        classes_.push_back(clsid);
+    return hr;
+}
+
+HRESULT ReferenceHost::OpenContainer() {
+    ut::ComPtr<IUnknown> container;
+    if (HRESULT hr = Record(KXCreateInstance(CLSID_GWContentContainer, IID_IUnknown, container.PutVoid()));
+        FAILED(hr))
+        return hr;
+    containerOpened_ = true;
+    return Record(GWContentSetCurrentContainer(container.Get()));
 }
 
 } // namespace ut::host

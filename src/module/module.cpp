@@ -1,4 +1,5 @@
 // The library's load and unload steps.
+#include <new>
 #include <ut/detail/names.h>
 #include <ut/platform/module_entry.h>
 #include <ut/platform/process.h>
@@ -33,13 +34,18 @@ HRESULT OnAttach(HINSTANCE self) {
         return HRESULT_FROM_WIN32(static_cast<DWORD>(error));
     state.baseKey = key;
     state.streamCompressionDisabled = ut::platform::HasEnvironmentVariable("KX_DISABLE_STREAM_COMPRESSION");
+    state.time.reset(new (std::nothrow) TimeState);
+    if (!state.time)
+        return E_OUTOFMEMORY;
     state.loaded = true;
     return S_OK;
 }
 
 void OnDetach() {
     (void)KXDictUnregisterInstance(kDictionaryName); // S_FALSE when it was never registered: nothing to undo
-    MutableState().loaded = false;
+    State& state = MutableState();
+    state.loaded = false;
+    state.time.reset();
 }
 
 } // namespace ut::module

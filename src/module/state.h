@@ -1,10 +1,20 @@
 // The process-wide state that the load step creates, read by every subsystem.
 #pragma once
 
+#include <memory>
+
 #include <ut/platform/com.h>
 #include <ut/sdk/string.h>
+#include <ut/sdk/time.h>
 
 namespace ut::module {
+
+// The time family's process-wide objects.
+struct TimeState {
+    // Starts undefined; a finite render time overrides the play position.
+    CGWTime renderTime = CGWTime::Undefined;
+    CGWTimeManagerHelper timeManager;
+};
 
 struct State {
     HINSTANCE instance = nullptr;
@@ -12,12 +22,16 @@ struct State {
     CKXString baseKey;
     // "KX_DISABLE_STREAM_COMPRESSION" was in the environment at load.
     bool streamCompressionDisabled = false;
+    // Made by the load step, gone after the unload. The render time is written through it.
+    std::unique_ptr<TimeState> time;
     // The load step completed; when false every export answers E_UNEXPECTED.
     bool loaded = false;
 };
 
 const State& Current();
 
-inline bool Loaded() { return Current().loaded; }
+inline bool Loaded() {
+    return Current().loaded;
+}
 
 } // namespace ut::module

@@ -5,7 +5,11 @@
 
 #include <bit>
 #include <cmath>
+#include <cstdint>
 #include <cstring>
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
 
 #include <ut/platform/com.h>
 
@@ -87,44 +91,75 @@ T Select(bool condition, T a, T b) {
     return b ^ ((a ^ b) & (T{0} - static_cast<T>(condition)));
 }
 
+// Bytes of each form, by the tag's distance from kDoubleInt8 (0xFA is no form).
 inline constexpr BYTE kDoubleLengths[8] = {2, 3, 0, 5, 9, 1, 1, 1};
+
+// The forms PackDouble chooses between, in the order of its index.
+struct DoubleForm {
+    BYTE tag;
+    BYTE length;
+};
+inline constexpr DoubleForm kDoubleForms[8] = {{kDoubleInt8, 2},     {kDoubleInt16, 3}, {kDoubleWhole, 9},
+                                               {kDoubleMinusOne, 1}, {kDoubleZero, 1},  {kDoubleOne, 1},
+                                               {kDoubleWhole, 9},    {kDoubleFloat, 5}};
 
 } // namespace detail
 
-// -0.0 compares equal to 0.0 and so reads back as +0.0. Large integral values skip the float
-// form on purpose. Every candidate form is computed and the tests pick one with masks, so that a
-// mix of values costs no mispredicted branches.
+namespace detail {
+
+// The value truncated toward zero when it fits 32 bits; anything else (NaN included) gives
+// INT32_MIN, as the processor's own conversion answers.
+inline LONG TruncatedInt32(double value) {
+#if defined(__SSE2__)
+    return _mm_cvttsd_si32(_mm_set_sd(value));
+#else
+    return value > -2147483649.0 && value < 2147483648.0 ? static_cast<LONG>(value) : INT32_MIN;
+#endif
+}
+
+// The value rounded to single precision and back; huge values give an infinity, never a trap.
+inline double ThroughFloat(double value, float& single) {
+#if defined(__SSE2__)
+    __m128 rounded = _mm_cvtsd_ss(_mm_setzero_ps(), _mm_set_sd(value));
+    single = _mm_cvtss_f32(rounded);
+    return _mm_cvtsd_f64(_mm_cvtss_sd(_mm_setzero_pd(), rounded));
+#else
+    single = std::fabs(value) <= 3.4e38 ? static_cast<float>(value) : 0.0f;
+    return static_cast<double>(single);
+#endif
+}
+
+} // namespace detail
+
+// The rules, in order: 0 (and -0.0, which so reads back as +0.0), 1 and -1; integral values of
+// 8 and 16 bits; other integral values whole (on purpose, even when a float would hold them);
+// float-exact values; the rest whole. One 32-bit truncation answers every integral question:
+// outside 32 bits a non-integral value cannot be float-exact and an integral one is written
+// whole, so the float form is only open below 2^31. The tests give an index into one table of
+// forms, chosen with masks, so that a mix of values costs no mispredicted branches.
 inline ULONG PackDouble(double value, BYTE* out) {
     using detail::Select;
-    double magnitude = std::fabs(value);
-    // Below 2^63 a value is integral when truncation keeps it; above, every finite value is.
-    bool convertible = magnitude < 9.2e18;
-    auto truncated = static_cast<LONGLONG>(convertible ? value : 0.0);
-    bool integral = (static_cast<double>(truncated) == value) | (!convertible & (value == value));
-    bool floatRange = magnitude <= 3.4e38;
-    auto single = static_cast<float>(floatRange ? value : 0.0);
-    bool exactFloat = floatRange & (static_cast<double>(single) == value);
+    const LONG whole = detail::TruncatedInt32(value);
+    const bool integral = static_cast<double>(whole) == value;
+    float single = 0;
+    const bool exactFloat = detail::ThroughFloat(value, single) == value;
+    const auto bits = static_cast<ULONG>(whole);
 
-    ULONGLONG singleBits = 0, payload = 0;
-    std::memcpy(&singleBits, &single, 4);
+    // Integral: 0 int8, 1 int16, 2 whole, or 3, 4, 5 for -1, 0 and 1. Otherwise 6 whole, 7 float.
+    const unsigned size = 2u - (bits + 127u <= 254u) - (bits + 32767u <= 65534u);
+    const unsigned special = bits + 1u;
+    const unsigned integralIndex = Select(special <= 2u, 3u + special, size);
+    const unsigned otherIndex = 6u + (exactFloat & (whole != INT32_MIN));
+    const unsigned index = Select(integral, integralIndex, otherIndex);
+
+    ULONGLONG payload = 0, singleBits = 0;
     std::memcpy(&payload, &value, 8);
-    auto integer = static_cast<ULONGLONG>(truncated);
-    unsigned form = kDoubleWhole - kDoubleInt8;
-    payload = Select<ULONGLONG>(exactFloat & !integral, singleBits, payload);
-    form = Select(exactFloat & !integral, unsigned{kDoubleFloat - kDoubleInt8}, form);
-    bool medium = integral & (magnitude <= 32767);
-    payload = Select<ULONGLONG>(medium, integer & 0xFFFF, payload);
-    form = Select(medium, unsigned{kDoubleInt16 - kDoubleInt8}, form);
-    bool small = integral & (magnitude <= 127);
-    payload = Select<ULONGLONG>(small, integer & 0xFF, payload);
-    form = Select(small, 0u, form);
-    form = Select(value == -1.0, unsigned{kDoubleMinusOne - kDoubleInt8}, form);
-    form = Select(value == 1.0, unsigned{kDoubleOne - kDoubleInt8}, form);
-    form = Select(value == 0.0, unsigned{kDoubleZero - kDoubleInt8}, form);
-
-    out[0] = static_cast<BYTE>(kDoubleInt8 + form);
+    std::memcpy(&singleBits, &single, 4);
+    payload = Select<ULONGLONG>(index == 7, singleBits, payload);
+    payload = Select<ULONGLONG>(index <= 1, bits, payload);
+    out[0] = detail::kDoubleForms[index].tag;
     std::memcpy(out + 1, &payload, 8);
-    return detail::kDoubleLengths[form];
+    return detail::kDoubleForms[index].length;
 }
 
 // Room a decoder wants in front of it to decode any form from memory.

@@ -1,13 +1,17 @@
 // The reference host installs and revokes its services and answers as its settings say.
 #include <memory>
 #include <string>
+#include <utility>
 
 #include <gtest/gtest.h>
 
 #include <ut/host/reference_host.h>
 #include <ut/sdk/ambient.h>
+#include <ut/sdk/content.h>
 #include <ut/sdk/database.h>
+#include <ut/sdk/dialogs.h>
 #include <ut/sdk/objects.h>
+#include <ut/sdk/play.h>
 #include <ut/sdk/version.h>
 
 #include "support/ref_tracker.h"
@@ -27,7 +31,8 @@ std::wstring VersionString(ULONG index) {
 }
 
 TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
-    const CLSID services[] = {CLSID_GWVersionInfo, CLSID_GWAmbientValues, CLSID_GWActiveDatabase};
+    const CLSID services[] = {CLSID_GWVersionInfo, CLSID_GWAmbientValues, CLSID_GWActiveDatabase,
+                              CLSID_GWTimeManager, CLSID_GWPlayControl,   CLSID_GWFileDialogs};
     ut::test::LiveObjectCheck live;
     {
         ut::host::ReferenceHost host;
@@ -41,6 +46,10 @@ TEST(ReferenceHost, InstallsItsServicesAndRevokesThemAtTheEnd) {
         void* out = nullptr;
         EXPECT_EQ(GWQueryGenericObject(clsid, &out), REGDB_E_CLASSNOTREG);
     }
+    // Its container class and its current container are gone too.
+    void* out = nullptr;
+    EXPECT_EQ(KXCreateInstance(CLSID_GWContentContainer, IID_IUnknown, &out), REGDB_E_CLASSNOTREG);
+    EXPECT_EQ(GWContentGetCurrentContainer(IID_IUnknown, &out), E_FAIL);
 }
 
 TEST(VersionInfo, DefaultsDescribeARecentHost) {
@@ -82,6 +91,74 @@ TEST(AmbientValues, StartFromTheSettingsAndConvertBetweenKinds) {
     EXPECT_EQ(values->SetInt(L"rendering.samples", 0), S_OK);
     EXPECT_EQ(values->GetBool(L"rendering.samples", &flag), S_OK);
     EXPECT_EQ(flag, FALSE);
+}
+
+// What the library reads through these services is tested with the library; here is what it
+// does not reach.
+TEST(TimeServices, RefuseUnknownFormatTypesAndNullOutputs) {
+    ut::host::ReferenceHost host;
+    ut::ComPtr<IGWTimeManager> manager;
+    ut::ComPtr<IGWPlayControl> play;
+    ASSERT_EQ(GWQueryGenericObject(CLSID_GWTimeManager, IID_IGWTimeManager, manager.PutVoid()), S_OK);
+    ASSERT_EQ(GWQueryGenericObject(CLSID_GWPlayControl, IID_IGWPlayControl, play.PutVoid()), S_OK);
+    tagGWTIMEFORMAT format = GWTIMEFORMAT_PAL;
+    EXPECT_EQ(manager->GetFormat(static_cast<GWTIMEFORMATTYPE>(1), &format, nullptr), E_INVALIDARG);
+    EXPECT_EQ(format, GWTIMEFORMAT_PAL);
+    EXPECT_EQ(manager->GetDisplayFormat(nullptr, nullptr, nullptr), S_OK);
+    EXPECT_EQ(play->GetTime(nullptr), E_POINTER);
+    EXPECT_EQ(play->GetTimeSpan(nullptr), E_POINTER);
+}
+
+TEST(ContentContainer, KeepsOneCurrentContainerWhoseKeyTimeTakesOnlyFrameCounts) {
+    ut::test::LiveObjectCheck live;
+    ut::host::ReferenceHost host({.keyFrame = 4.0});
+    ut::ComPtr<IGWContentContainer> current, again, made;
+    ASSERT_EQ(GWContentGetCurrentContainer(IID_IGWContentContainer, current.PutVoid()), S_OK);
+    ASSERT_EQ(GWContentGetCurrentContainer(IID_IGWContentContainer, again.PutVoid()), S_OK);
+    ASSERT_EQ(KXCreateInstance(CLSID_GWContentContainer, IID_IGWContentContainer, made.PutVoid()), S_OK);
+    EXPECT_TRUE(current == again);
+    EXPECT_FALSE(current == made);
+    void* none = &none;
+    EXPECT_EQ(current->FindProperty(GUID_GWValueParameter, IID_IGWProperty, &none), DISP_E_MEMBERNOTFOUND);
+    EXPECT_EQ(none, nullptr);
+
+    ut::ComPtr<IGWProperty> keyTime;
+    ASSERT_EQ(current->FindProperty(GUID_GWKeyTimeProperty, IID_IGWProperty, keyTime.PutVoid()), S_OK);
+    const tagGWREQUEST request = {GWREQUEST_PLUGIN};
+    CGWVariant text, frames(9.0), other;
+    text.vt = VT_BSTR;
+    text.bstrVal = SysAllocString(L"12");
+    const std::pair<HRESULT, HRESULT> refusals[] = {
+        {keyTime->SetValue(&request, &text), DISP_E_TYPEMISMATCH},
+        {keyTime->SetValue(nullptr, &frames), E_POINTER},
+        {keyTime->SetValue(&request, nullptr), E_POINTER},
+        {keyTime->Refresh(nullptr, TRUE, 0, 0), E_POINTER},
+        {keyTime->GetParameterValue(GUID_GWKeyTimeProperty, &other), DISP_E_MEMBERNOTFOUND}};
+    for (auto [actual, expected] : refusals)
+        EXPECT_EQ(actual, expected);
+    CGWVariant read;
+    EXPECT_EQ(keyTime->GetParameterValue(GUID_GWValueParameter, &read), S_OK);
+    EXPECT_EQ(read.vt, VT_R8);
+    EXPECT_EQ(read.dblVal, 4.0);
+}
+
+TEST(FileDialogs, AnswerCancelledForThereIsNoDesktop) {
+    ut::host::ReferenceHost host;
+    ut::ComPtr<IGWFileDialogs> dialogs;
+    ASSERT_EQ(KXGetFileDialogs(dialogs.Put()), S_OK);
+    // A record of another size than the platform's is refused as such.
+    for (DWORD size : {DWORD{sizeof(OPENFILENAMEW)}, DWORD{76}}) {
+        for (bool save : {false, true}) {
+            OPENFILENAMEW record{};
+            record.lStructSize = size;
+            EXPECT_EQ(save ? dialogs->ShowSaveDialog(&record) : dialogs->ShowOpenDialog(&record), S_FALSE);
+            DWORD error = 0;
+            EXPECT_EQ(dialogs->GetExtendedError(&error), S_OK);
+            EXPECT_EQ(error, size == 76 ? DWORD{CDERR_STRUCTSIZE} : DWORD{CDERR_DIALOGFAILURE});
+        }
+    }
+    EXPECT_EQ(dialogs->ShowOpenDialog(nullptr), E_POINTER);
+    EXPECT_EQ(dialogs->GetExtendedError(nullptr), E_POINTER);
 }
 
 } // namespace

@@ -38,8 +38,11 @@ TEST_F(AttachTest, AKnownModuleLoadsWithItsKey) {
     EXPECT_TRUE(ut::module::Loaded());
     EXPECT_EQ(ut::module::Current().baseKey, L"Software\\ut\\Modules\\ut_module_tests\\");
     EXPECT_EQ(KXDictFindInstance(ut::kDictionaryName), ThisExecutable());
+    ASSERT_NE(ut::module::Current().time, nullptr);
+    EXPECT_FALSE(ut::module::Current().time->renderTime.IsDefined());
     ut::module::OnDetach();
     EXPECT_FALSE(ut::module::Loaded());
+    EXPECT_EQ(ut::module::Current().time, nullptr);
 }
 
 } // namespace

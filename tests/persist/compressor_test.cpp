@@ -98,7 +98,16 @@ TEST_F(Compact, PacksDoublesByTheirShortestExactForm) {
                              {40000.0, whole(40000.0)},
                              {0.5, {0xFB, 0x00, 0x00, 0x00, 0x3F}},
                              {0.1, whole(0.1)},
-                             {1e300, whole(1e300)}},
+                             {1e300, whole(1e300)},
+                             // Around the 32-bit truncation the classification rests on.
+                             {40000.5, {0xFB, 0x80, 0x40, 0x1C, 0x47}},
+                             {16777216.0, whole(16777216.0)},
+                             {2147483648.0, whole(2147483648.0)},
+                             {-2147483648.0, whole(-2147483648.0)},
+                             {-2147483648.5, whole(-2147483648.5)},
+                             {1099511627776.0, whole(1099511627776.0)},
+                             {0x1p-140, {0xFB, 0x00, 0x02, 0x00, 0x00}},
+                             {3.4028234663852886e38, whole(3.4028234663852886e38)}},
                             &C3DStreamHelper::PutDouble, &C3DStreamHelper::GetDouble);
 
     ut::test::Saved saved = Save(Form::Compact, [](C3DStreamHelper& h) {

@@ -16,6 +16,7 @@
 
 #include <ut/platform/storage.h>
 
+#include "support/compound.h"
 #include "support/temp_folder.h"
 
 namespace {
@@ -95,7 +96,7 @@ std::string SampleBytes(const TempFolder& folder) {
         EXPECT_EQ(root->CreateStorage(L"sub", kElementMode, 0, 0, sub.Put()), S_OK);
         EXPECT_EQ(PutStream(sub.Get(), L"in", "x"), S_OK);
     }
-    return ReadAll(folder.Path() / "good.cfb");
+    return ReadAll(folder.Root() / "good.cfb");
 }
 
 struct Damage {
@@ -251,7 +252,7 @@ TEST(StoragePosix, CommitsKeepPermissionsAndLeaveNothingBeside) {
         ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
     }
     EXPECT_EQ(std::filesystem::status(file).permissions(), std::filesystem::perms(0640));
-    auto entries = std::distance(std::filesystem::directory_iterator(folder.Path()), {});
+    auto entries = std::distance(std::filesystem::directory_iterator(folder.Root()), {});
     EXPECT_EQ(entries, 1);
 }
 
@@ -304,7 +305,7 @@ TEST(StoragePosix, AWriterKilledDuringACommitLeavesTheOldFileIntact) {
     bool caught = false;
     for (auto start = std::chrono::steady_clock::now();
          !caught && std::chrono::steady_clock::now() - start < std::chrono::seconds(120);) {
-        for (const auto& entry : std::filesystem::directory_iterator(folder.Path())) {
+        for (const auto& entry : std::filesystem::directory_iterator(folder.Root())) {
             std::error_code error;
             auto size = entry.file_size(error);
             if (entry.path().filename() != "crash.cfb" && !error && size > (1u << 20)) {

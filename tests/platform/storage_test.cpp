@@ -8,6 +8,7 @@
 
 #include <ut/platform/storage.h>
 
+#include "support/compound.h"
 #include "support/temp_folder.h"
 #include "support/wine.h"
 
@@ -125,7 +126,7 @@ TEST(Storage, RefusesBadArgumentsAndFilesThatAreNotCompoundFiles) {
               STG_E_INVALIDPARAMETER);
     EXPECT_EQ(StgOpenStorage(path.c_str(), nullptr, kReadMode, nullptr, 0, nullptr), STG_E_INVALIDPOINTER);
     EXPECT_EQ(StgOpenStorage(nullptr, nullptr, kReadMode, nullptr, 0, storage.Put()), STG_E_INVALIDNAME);
-    std::wstring folderPath = folder.Path().wstring();
+    std::wstring folderPath = folder.Root().wstring();
     EXPECT_EQ(StgOpenStorage(folderPath.c_str(), nullptr, kReadMode, nullptr, 0, storage.Put()),
               STG_E_ACCESSDENIED);
 

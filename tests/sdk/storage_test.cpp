@@ -6,6 +6,7 @@
 
 #include <ut/sdk/storage.h>
 
+#include "support/compound.h"
 #include "support/temp_folder.h"
 
 namespace {

@@ -14,6 +14,8 @@
 
 #include <ut/platform/com.h>
 
+#include "support/ref_tracker.h"
+
 namespace ut::test {
 
 class FaultPlan {
@@ -36,5 +38,26 @@ private:
     int calls_ = 0;
     std::vector<std::string> seen_;
 };
+
+// Walks every failure path of `run`: runs it with host call n failing (with `code`) for
+// n = 1, 2, ... and hands `check` the row n and what `run` returned, until a run makes fewer than
+// n host calls; that clean run is handed over as row 0 and ends the walk. `check` runs after the
+// fault is lifted. No run may leave a COM object alive.
+template <class Run, class Check>
+void WalkHostFaults(Run run, Check check, HRESULT code = E_FAIL) {
+    for (int n = 1;; ++n) {
+        bool fired = false;
+        auto result = [&] {
+            LiveObjectCheck live;
+            FaultPlan plan(n, code);
+            auto answer = run();
+            fired = plan.Fired();
+            return answer;
+        }();
+        check(fired ? n : 0, result);
+        if (!fired)
+            return;
+    }
+}
 
 } // namespace ut::test

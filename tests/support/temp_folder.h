@@ -1,103 +1,59 @@
-// A folder of the test's own under the temporary folder, removed with everything in it when
-// the test ends; and the compound-file helpers that the storage tests share.
+// A folder of the test's own under the system's temporary folder, removed with its content after.
 #pragma once
 
 #include <filesystem>
+#include <fstream>
 #include <random>
 #include <string>
-#include <vector>
+#include <string_view>
 
 #include <gtest/gtest.h>
-
-#include <ut/platform/storage.h>
 
 namespace ut::test {
 
 class TempFolder {
 public:
-    TempFolder() {
-        // Unique across processes too: a run that was killed leaves its folder behind.
-        static std::random_device random;
-        const auto* test = ::testing::UnitTest::GetInstance()->current_test_info();
-        std::string name = std::string("ut_") + (test ? test->name() : "test") + "_" +
-                           std::to_string(random()) + std::to_string(random());
-        for (char& c : name)
-            if (c == '/')
-                c = '_';
-        path_ = std::filesystem::temp_directory_path() / name;
-        std::filesystem::create_directories(path_);
+    TempFolder() : root_(std::filesystem::temp_directory_path() / UniqueName()) {
+        std::filesystem::remove_all(root_);
+        std::filesystem::create_directories(root_);
     }
     ~TempFolder() {
-        std::error_code ignored;
-        std::filesystem::remove_all(path_, ignored);
+        std::error_code ignored; // what cannot be removed is the system's to clean
+        std::filesystem::remove_all(root_, ignored);
     }
     TempFolder(const TempFolder&) = delete;
     TempFolder& operator=(const TempFolder&) = delete;
 
-    const std::filesystem::path& Path() const { return path_; }
-    // The wide path of `name` inside the folder.
-    std::wstring operator/(const std::wstring& name) const { return (path_ / name).wstring(); }
+    const std::filesystem::path& Root() const { return root_; }
+    // The path of `name` inside the folder, or of the folder itself.
+    std::wstring Path(std::wstring_view name = {}) const {
+        return (name.empty() ? root_ : root_ / name).wstring();
+    }
+    std::wstring operator/(std::wstring_view name) const { return Path(name); }
+    // Writes file `name` with `content` as it is; returns its path.
+    std::wstring Write(std::wstring_view name, std::string_view content) const {
+        std::ofstream(root_ / name, std::ios::binary).write(content.data(), std::streamsize(content.size()));
+        return Path(name);
+    }
+    std::wstring MakeFolder(std::wstring_view name) const {
+        std::filesystem::create_directories(root_ / name);
+        return Path(name);
+    }
 
 private:
-    std::filesystem::path path_;
-};
-
-inline constexpr DWORD kCreateMode = STGM_CREATE | STGM_READWRITE | STGM_SHARE_EXCLUSIVE;
-inline constexpr DWORD kReadMode = STGM_READ | STGM_SHARE_EXCLUSIVE;
-inline constexpr DWORD kElementMode = STGM_READWRITE | STGM_SHARE_EXCLUSIVE;
-
-// Content of `size` bytes that differs with `seed`.
-inline std::string Pattern(std::size_t size, int seed) {
-    std::string bytes(size, '\0');
-    for (std::size_t i = 0; i < size; ++i)
-        bytes[i] = static_cast<char>(i * 7 + static_cast<std::size_t>(seed));
-    return bytes;
-}
-
-inline HRESULT PutStream(IStorage* storage, const wchar_t* name, const std::string& bytes) {
-    ComPtr<IStream> stream;
-    HRESULT hr = storage->CreateStream(name, kElementMode | STGM_CREATE, 0, 0, stream.Put());
-    if (FAILED(hr))
-        return hr;
-    return bytes.empty() ? S_OK : stream->Write(bytes.data(), static_cast<ULONG>(bytes.size()), nullptr);
-}
-
-inline std::string ReadStream(IStorage* storage, const wchar_t* name) {
-    ComPtr<IStream> stream;
-    EXPECT_EQ(storage->OpenStream(name, nullptr, STGM_READ | STGM_SHARE_EXCLUSIVE, 0, stream.Put()), S_OK)
-        << name;
-    std::string bytes;
-    char chunk[4096];
-    ULONG got = 0;
-    while (stream && SUCCEEDED(stream->Read(chunk, sizeof chunk, &got)) && got > 0)
-        bytes.append(chunk, got);
-    return bytes;
-}
-
-struct Element {
-    std::wstring name;
-    DWORD type;
-    ULONGLONG size;
-    bool operator==(const Element&) const = default;
-};
-
-// The elements of a storage in the order its list gives them.
-inline std::vector<Element> ElementsOf(IStorage* storage) {
-    std::vector<Element> elements;
-    ComPtr<IEnumSTATSTG> list;
-    EXPECT_EQ(storage->EnumElements(0, nullptr, 0, list.Put()), S_OK);
-    STATSTG stat{};
-    while (list && list->Next(1, &stat, nullptr) == S_OK) {
-        elements.push_back({stat.pwcsName, stat.type, stat.cbSize.QuadPart});
-        CoTaskMemFree(stat.pwcsName);
+    // Unique across processes too: a run that was killed leaves its folder behind.
+    static std::string UniqueName() {
+        static std::random_device random;
+        const auto* test = ::testing::UnitTest::GetInstance()->current_test_info();
+        std::string name = std::string("ut_") + (test ? test->name() : "test") + "_" + std::to_string(random()) +
+                           std::to_string(random());
+        for (char& c : name)
+            if (c == '/')
+                c = '_';
+        return name;
     }
-    return elements;
-}
 
-inline CLSID ClassOf(IStorage* storage) {
-    STATSTG stat{};
-    EXPECT_EQ(storage->Stat(&stat, STATFLAG_NONAME), S_OK);
-    return stat.clsid;
-}
+    std::filesystem::path root_;
+};
 
 } // namespace ut::test

@@ -1,14 +1,43 @@
-// The subcommands of the ut tool. Each takes the arguments after its name and returns the
-// process exit code.
+// The subcommands of the ut tool. Each Add<Command>Command puts its subcommand, with its help and
+// an example, on the tool's application; main() parses the command line and runs it.
 #pragma once
 
 #include <string>
-#include <vector>
+
+namespace CLI {
+class App;
+}
+
+namespace CLI {
+class App;
+}
 
 namespace ut::tool {
 
-using Arguments = std::vector<std::string>;
+// Exit statuses of every command.
+inline constexpr int kExitSuccess = 0;
+inline constexpr int kExitNo = 1;    // the answer is no: nothing found
+inline constexpr int kExitUsage = 2; // bad usage or unreadable input
 
-int Demo(const Arguments& args);
+// Thrown by a command to end the tool with `status`; main() writes `message` as one line on
+// standard error.
+struct Exit {
+    int status;
+    std::string message;
+};
+
+[[noreturn]] inline void Fail(int status, std::string message) {
+    throw Exit{status, std::move(message)};
+}
+
+void AddDemoCommand(CLI::App& app);
+void AddFramesCommand(CLI::App& app);
+void AddSortCommand(CLI::App& app);
+void AddHeaderCommand(CLI::App& app);
+void AddTimeCommand(CLI::App& app);
+
+// ut registry list | get | export | import; list lives in registry_list.cpp.
+void AddRegistryCommand(CLI::App& app);
+void AddRegistryListCommand(CLI::App& registry);
 
 } // namespace ut::tool

@@ -1,6 +1,9 @@
 // A short tour of the library on the reference host.
 #include <cstdio>
+#include <memory>
 #include <string>
+
+#include <CLI/CLI.hpp>
 
 #include <ut/detail/names.h>
 #include <ut/host/reference_host.h>
@@ -181,17 +184,60 @@ int ShowPersistence() {
     return found == kSceneObjects ? 0 : 1;
 }
 
+// The names a category holds, in the registry's order, joined with ", ".
+std::string NamesIn(const wchar_t* category) {
+    DWORD count = 0;
+    GUID* list = nullptr;
+    if (FAILED(KXGetCLSIDList(category, &count, &list)))
+        return "(none)";
+    std::unique_ptr<GUID, ut::TaskMemDeleter> owned(list);
+    std::string names;
+    for (DWORD i = 0; i < count; ++i) {
+        wchar_t name[80] = L"";
+        DWORD bytes = sizeof name;
+        (void)KXGetKeyName(category, list[i], name, &bytes); // an unnamed class shows as empty
+        names += (i ? ", " : "") + Narrow(name);
+    }
+    return names;
+}
+
+// A sample plug-in registers two operators (named from its string table) and a view, lists them
+// back, and removes them again.
+int ShowRegistration() {
+    HINSTANCE plugin = ut::platform::ModuleOf(reinterpret_cast<const void*>(&ShowRegistration));
+    const KXDictString strings[] = {{1, L"Sample twist"}, {2, L"Sample bend"}};
+    constexpr GUID twist = {0x5A3F1E01, 0xD3C2, 0x4B7A, {0x9E, 0x10, 0x6C, 0x21, 0x8D, 0x44, 0x0A, 0x01}};
+    constexpr GUID bend = {0x5A3F1E02, 0xD3C2, 0x4B7A, {0x9E, 0x10, 0x6C, 0x21, 0x8D, 0x44, 0x0A, 0x01}};
+    constexpr GUID view = {0x5A3F1E03, 0xD3C2, 0x4B7A, {0x9E, 0x10, 0x6C, 0x21, 0x8D, 0x44, 0x0A, 0x01}};
+    bool registered = KXDictAddInstanceStrings(plugin, strings, 2) == S_OK &&
+                      KXRegisterOperator(twist, plugin, 1u) == S_OK &&
+                      KXRegisterOperator(bend, plugin, 2u) == S_OK &&
+                      KXRegisterView(view, plugin, L"Sample curve view") == S_OK;
+    std::printf("registry    Operator: %s; View: %s\n", NamesIn(L"Operator").c_str(),
+                NamesIn(L"View").c_str());
+    bool removed = SUCCEEDED(KXUnRegisterOperator(twist)) && SUCCEEDED(KXUnRegisterOperator(bend)) &&
+                   SUCCEEDED(KXUnRegisterView(view));
+    return registered && removed ? 0 : 1;
+}
+
+void RunDemo() {
+    ut::host::ReferenceHost host;
+    if (FAILED(host.Status()))
+        Fail(kExitNo, "the reference host did not start");
+    int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowPersistence() +
+                   ShowVersions() + ShowMemoryPool() + ShowRegistration();
+    if (failures)
+        Fail(kExitNo, "the tour found " + std::to_string(failures) + " part(s) not working");
+}
+
 } // namespace
 
-int Demo(const Arguments&) {
-    ut::host::ReferenceHost host;
-    if (FAILED(host.Status())) {
-        std::fprintf(stderr, "ut: the reference host did not start\n");
-        return 1;
-    }
-    int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowPersistence() +
-                   ShowVersions() + ShowMemoryPool();
-    return failures ? 1 : 0;
+void AddDemoCommand(CLI::App& app) {
+    CLI::App* demo = app.add_subcommand(
+        "demo", "Load the library on the reference host and show what it does (module, GUIDs, streams, "
+                "persistence, versions, memory pool).");
+    demo->footer("Example:\n  ut demo");
+    demo->callback(RunDemo);
 }
 
 } // namespace ut::tool

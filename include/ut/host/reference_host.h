@@ -7,6 +7,7 @@
 #include <vector>
 
 #include <ut/platform/com.h>
+#include <ut/sdk/time.h>
 
 namespace ut::host {
 
@@ -23,6 +24,19 @@ struct Settings {
     // Seeds of the ambient values "referencing.importingdelta" and "context.constructionmode".
     bool importingDelta = false;
     LONG constructionMode = 0;
+    // The scene's time: the format and rate the time manager answers (a scene at 30 frames a
+    // second) and how it shows times.
+    tagGWTIMEFORMAT timeFormat = GWTIMEFORMAT_VIDEO30;
+    double frameRate = 30.0;
+    GWTIMEDISPLAYFORMAT timeDisplay = GWTIMEDISPLAY_FRAMES;
+    // The play control's position and range, in frames of the scene.
+    double playFrame = 1.0;
+    double firstFrame = 1.0;
+    double lastFrame = 100.0;
+    // The key time of every content container the host makes, in frames, and whether one of them
+    // is current from the start (otherwise the library makes its own when it needs one).
+    double keyFrame = 1.0;
+    bool currentContainer = true;
 };
 
 // Installs the reference services for its lifetime and revokes exactly what it installed.
@@ -39,8 +53,14 @@ public:
 
 private:
     HRESULT InstallService(REFCLSID clsid, IUnknown* service);
+    HRESULT InstallClass(REFCLSID clsid, IClassFactory* factory);
+    HRESULT Record(HRESULT hr);
+    // Makes a content container of the installed class current.
+    HRESULT OpenContainer();
 
     std::vector<CLSID> services_;
+    std::vector<CLSID> classes_;
+    bool containerOpened_ = false;
     HRESULT status_ = S_OK;
 };
 

@@ -5,4 +5,5 @@
 #pragma once
 
 #include <ut/platform/com.h>
+#include <ut/platform/file_search.h>
 #include <ut/platform/native/files.h>

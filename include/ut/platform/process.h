@@ -2,6 +2,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 #include <ut/platform/com.h>
 
@@ -23,5 +24,9 @@ UT_PLATFORM_API bool RunningUnderCompatibilityLayer();
 // Writes one line to the process's error output (standard error, or the debugger on Windows
 // when there is no console).
 UT_PLATFORM_API void ReportError(const std::wstring& line);
+
+// The program's arguments after its name, in UTF-8: argv as it is on POSIX; on Windows read from
+// the wide command line, so that names outside the ANSI code page come through.
+UT_PLATFORM_API std::vector<std::string> Utf8Arguments(int argc, char** argv);
 
 } // namespace ut::platform

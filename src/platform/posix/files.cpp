@@ -1,32 +1,23 @@
-// Files on POSIX: temporary names from mkstemps, file search over opendir with Windows-style
-// patterns, deletion, access tests with Windows' notion of read-only, and path splitting.
+// Files on POSIX: temporary names from mkstemps, deletion, access tests with Windows' notion of read-only, and path splitting.
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
-#include <cwctype>
-#include <dirent.h>
 #include <functional>
-#include <map>
-#include <memory>
-#include <mutex>
 #include <string>
 #include <sys/stat.h>
 #include <unistd.h>
-#include <vector>
 
 #include <ut/platform/detail/boundary.h>
 #include <ut/platform/files.h>
 
-#include "posix/letters.h"
 #include "posix/path.h"
 
 namespace {
 
 using ut::platform::WideFromUtf8;
-using ut::platform::posix::SameLetter;
 using ut::platform::posix::SystemPath;
 
 constexpr DWORD ERROR_BUFFER_OVERFLOW = 111;
@@ -55,13 +46,6 @@ DWORD ErrorFromErrno(int error) {
     }
 }
 
-FILETIME FileTimeOf(const timespec& time) {
-    constexpr ULONGLONG kSecondsFrom1601 = 11644473600ull;
-    ULONGLONG ticks = (static_cast<ULONGLONG>(time.tv_sec) + kSecondsFrom1601) * 10000000ull +
-                      static_cast<ULONGLONG>(time.tv_nsec) / 100;
-    return {static_cast<DWORD>(ticks), static_cast<DWORD>(ticks >> 32)};
-}
-
 // Copies `text` into a buffer of `capacity` characters, cut to fit, always terminated.
 void CopyCut(std::wstring_view text, wchar_t* buffer, std::size_t capacity) {
     if (!buffer || capacity == 0)
@@ -69,121 +53,6 @@ void CopyCut(std::wstring_view text, wchar_t* buffer, std::size_t capacity) {
     std::size_t length = std::min(text.size(), capacity - 1);
     std::wmemcpy(buffer, text.data(), length);
     buffer[length] = L'\0';
-}
-
-// Windows patterns: '*' any run, '?' one character, letters without case; "*.*" is everything.
-bool Matches(std::wstring_view pattern, std::wstring_view name) {
-    if (pattern == L"*.*")
-        pattern = L"*";
-    std::size_t p = 0, n = 0, starP = std::wstring_view::npos, starN = 0;
-    while (n < name.size()) {
-        if (p < pattern.size() && (pattern[p] == L'?' || SameLetter(pattern[p], name[n]))) {
-            ++p;
-            ++n;
-        } else if (p < pattern.size() && pattern[p] == L'*') {
-            starP = p++;
-            starN = n;
-        } else if (starP != std::wstring_view::npos) {
-            p = starP + 1;
-            n = ++starN;
-        } else {
-            return false;
-        }
-    }
-    while (p < pattern.size() && pattern[p] == L'*')
-        ++p;
-    return p == pattern.size();
-}
-
-struct Search {
-    std::string folder;
-    std::vector<std::string> names;
-    std::size_t next = 0;
-};
-
-struct SearchTable {
-    std::mutex mutex;
-    std::map<HANDLE, std::unique_ptr<Search>> searches;
-};
-
-SearchTable& Searches() {
-    static SearchTable* table = new SearchTable;
-    return *table;
-}
-
-bool Fill(const std::string& folder, const std::string& name, WIN32_FIND_DATAW* found) {
-    std::string path = folder.empty() ? name : folder + "/" + name;
-    struct stat info {};
-    if (::stat(path.c_str(), &info) != 0 && ::lstat(path.c_str(), &info) != 0)
-        return false;
-    std::memset(found, 0, sizeof *found);
-    bool folderEntry = S_ISDIR(info.st_mode);
-    found->dwFileAttributes = folderEntry ? FILE_ATTRIBUTE_DIRECTORY : FILE_ATTRIBUTE_ARCHIVE;
-    if (!(info.st_mode & (S_IWUSR | S_IWGRP | S_IWOTH)))
-        found->dwFileAttributes |= FILE_ATTRIBUTE_READONLY;
-    if (name.size() > 1 && name[0] == '.' && name != "..")
-        found->dwFileAttributes |= FILE_ATTRIBUTE_HIDDEN;
-    found->ftCreationTime = FileTimeOf(info.st_ctim);
-    found->ftLastAccessTime = FileTimeOf(info.st_atim);
-    found->ftLastWriteTime = FileTimeOf(info.st_mtim);
-    ULONGLONG size = folderEntry ? 0 : static_cast<ULONGLONG>(info.st_size);
-    found->nFileSizeHigh = static_cast<DWORD>(size >> 32);
-    found->nFileSizeLow = static_cast<DWORD>(size);
-    CopyCut(WideFromUtf8(name), found->cFileName, MAX_PATH);
-    return true;
-}
-
-// Lists the entries of `folder` whose names match `pattern`: "." and ".." first, then the
-// others by name without case, as an NTFS folder lists them.
-DWORD Collect(const std::string& folder, std::wstring_view pattern, std::vector<std::string>& names) {
-    DIR* dir = ::opendir(folder.empty() ? "." : folder.c_str());
-    if (!dir)
-        return ERROR_PATH_NOT_FOUND;
-    while (dirent* entry = ::readdir(dir))
-        if (Matches(pattern, WideFromUtf8(entry->d_name)))
-            names.emplace_back(entry->d_name);
-    ::closedir(dir);
-    auto rank = [](const std::string& name) { return name == "." ? 0 : name == ".." ? 1 : 2; };
-    std::sort(names.begin(), names.end(), [&](const std::string& a, const std::string& b) {
-        if (rank(a) != rank(b))
-            return rank(a) < rank(b);
-        return ::strcasecmp(a.c_str(), b.c_str()) < 0;
-    });
-    return names.empty() ? ERROR_FILE_NOT_FOUND : ERROR_SUCCESS;
-}
-
-HANDLE StartSearch(const wchar_t* pattern, WIN32_FIND_DATAW* found) {
-    std::wstring_view text(pattern);
-    std::size_t cut = text.find_last_of(L"/\\");
-    std::string folder = cut == std::wstring_view::npos ? std::string() : SystemPath(text.substr(0, cut + 1));
-    if (folder.size() > 1 && folder.back() == '/')
-        folder.pop_back();
-    std::wstring_view last = cut == std::wstring_view::npos ? text : text.substr(cut + 1);
-    auto search = std::make_unique<Search>();
-    search->folder = folder;
-    DWORD error = ERROR_SUCCESS;
-    if (last.empty()) {
-        error = ERROR_FILE_NOT_FOUND;
-    } else if (last.find_first_of(L"*?") == std::wstring_view::npos) {
-        struct stat info {};
-        std::string path = SystemPath(text);
-        if (::stat(path.c_str(), &info) == 0)
-            search->names.push_back(SystemPath(last));
-        else
-            error = ErrorFromErrno(errno);
-    } else {
-        error = Collect(folder, last, search->names);
-    }
-    if (error != ERROR_SUCCESS || !Fill(search->folder, search->names[0], found)) {
-        SetLastError(error != ERROR_SUCCESS ? error : ERROR_FILE_NOT_FOUND);
-        return INVALID_HANDLE_VALUE;
-    }
-    search->next = 1;
-    HANDLE handle = search.get();
-    SearchTable& table = Searches();
-    std::lock_guard lock(table.mutex);
-    table.searches.emplace(handle, std::move(search));
-    return handle;
 }
 
 // A new name for a temporary file, made and created by mkstemps; its number is the random
@@ -242,40 +111,6 @@ UINT GetTempFileNameW(LPCWSTR path, LPCWSTR prefix, UINT unique, LPWSTR name) {
     }
     CopyCut(formed, name, MAX_PATH);
     return unique;
-}
-
-HANDLE FindFirstFileW(LPCWSTR pattern, WIN32_FIND_DATAW* found) {
-    if (!pattern || !found) {
-        SetLastError(ERROR_INVALID_PARAMETER);
-        return INVALID_HANDLE_VALUE;
-    }
-    return ut::ExportBoundary([&] { return StartSearch(pattern, found); }, INVALID_HANDLE_VALUE);
-}
-
-BOOL FindNextFileW(HANDLE handle, WIN32_FIND_DATAW* found) {
-    SearchTable& table = Searches();
-    std::lock_guard lock(table.mutex);
-    auto entry = table.searches.find(handle);
-    if (entry == table.searches.end() || !found) {
-        SetLastError(entry == table.searches.end() ? ERROR_INVALID_HANDLE : ERROR_INVALID_PARAMETER);
-        return FALSE;
-    }
-    Search& search = *entry->second;
-    while (search.next < search.names.size())
-        if (Fill(search.folder, search.names[search.next++], found))
-            return TRUE;
-    SetLastError(ERROR_NO_MORE_FILES);
-    return FALSE;
-}
-
-BOOL FindClose(HANDLE handle) {
-    SearchTable& table = Searches();
-    std::lock_guard lock(table.mutex);
-    if (table.searches.erase(handle) == 0) {
-        SetLastError(ERROR_INVALID_HANDLE);
-        return FALSE;
-    }
-    return TRUE;
 }
 
 BOOL DeleteFileW(LPCWSTR path) {

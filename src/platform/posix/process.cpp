@@ -1,4 +1,4 @@
-// Process queries on POSIX: environment, module file names, the executable.
+// POSIX home: the process's environment, modules, error output and arguments.
 #include <cstdlib>
 #include <dlfcn.h>
 
@@ -33,6 +33,12 @@ std::wstring ModuleFileName(HINSTANCE module) {
 
 void ReportError(const std::wstring& line) {
     WriteErrorLine(line);
+}
+
+std::vector<std::string> Utf8Arguments(int argc, char** argv) {
+    if (argc < 1 || !argv)
+        return {};
+    return std::vector<std::string>(argv + 1, argv + argc);
 }
 
 } // namespace ut::platform

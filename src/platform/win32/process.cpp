@@ -1,7 +1,10 @@
-// Process queries on Windows: environment, module file names, the executable.
+// Windows home: the process's environment, modules, error output and command line.
 #include <string>
 
 #include <ut/platform/process.h>
+#include <ut/platform/text.h>
+
+#include <shellapi.h> // needs the system header that the face includes first
 
 #include "common/error_output.h"
 
@@ -61,6 +64,22 @@ std::wstring ModuleFileName(HINSTANCE module) {
 void ReportError(const std::wstring& line) {
     WriteErrorLine(line);
     OutputDebugStringW((line + L"\n").c_str());
+}
+
+std::vector<std::string> Utf8Arguments(int argc, char** argv) {
+    int count = 0;
+    LPWSTR* wide = CommandLineToArgvW(GetCommandLineW(), &count);
+    std::vector<std::string> arguments;
+    if (!wide) {
+        // Without the wide form the ANSI one is all there is.
+        if (argc > 1 && argv)
+            arguments.assign(argv + 1, argv + argc);
+        return arguments;
+    }
+    for (int i = 1; i < count; ++i)
+        arguments.push_back(Utf8FromWide(wide[i]));
+    (void)LocalFree(wide); // the block is ours alone; a failure leaves nothing to undo
+    return arguments;
 }
 
 } // namespace ut::platform

@@ -20,6 +20,13 @@ int main() {
         std::puts("the library did not load");
         return 1;
     }
+    // The library's texts were installed beside it.
+    wchar_t text[80] = L"";
+    KXGetCDError(0xFFFF, text, 80);
+    if (!text[0]) {
+        std::puts("the library's dictionary was not found");
+        return 1;
+    }
     ut::ComPtr<IStream> stream;
     if (FAILED(ut::platform::CreateMemoryStream(stream.Put())) || FAILED(stream->Write("ok", 2, nullptr))) {
         std::puts("no memory stream");

@@ -1,38 +1,18 @@
-// POSIX home: file search, temporary names, access tests and path splitting with the Windows
+// POSIX home: temporary names, access tests and path splitting with the Windows
 // semantics. Paths are wide text, handed to the system in UTF-8; a backslash separates folders
-// as a slash does. Names match patterns without regard to case, as on Windows.
+// as a slash does.
 #pragma once
 
 #include <cstdint>
 
 #include <ut/platform/native/com.h>
+#include <ut/platform/native/file_search.h>
 
 inline constexpr DWORD MAX_PATH = 260;
 inline constexpr int _MAX_DRIVE = 3;
 inline constexpr int _MAX_DIR = 256;
 inline constexpr int _MAX_FNAME = 256;
 inline constexpr int _MAX_EXT = 256;
-
-inline constexpr DWORD FILE_ATTRIBUTE_READONLY = 0x01;
-inline constexpr DWORD FILE_ATTRIBUTE_HIDDEN = 0x02;
-inline constexpr DWORD FILE_ATTRIBUTE_DIRECTORY = 0x10;
-inline constexpr DWORD FILE_ATTRIBUTE_ARCHIVE = 0x20;
-inline constexpr DWORD FILE_ATTRIBUTE_NORMAL = 0x80;
-
-inline HANDLE const INVALID_HANDLE_VALUE = reinterpret_cast<HANDLE>(~std::uintptr_t{0});
-
-struct WIN32_FIND_DATAW {
-    DWORD dwFileAttributes;
-    FILETIME ftCreationTime;
-    FILETIME ftLastAccessTime;
-    FILETIME ftLastWriteTime;
-    DWORD nFileSizeHigh;
-    DWORD nFileSizeLow;
-    DWORD dwReserved0;
-    DWORD dwReserved1;
-    WCHAR cFileName[MAX_PATH];
-    WCHAR cAlternateFileName[14];
-};
 
 extern "C" {
 // The temporary folder ($TMPDIR, else /tmp) with a trailing separator. Returns its length, or
@@ -42,10 +22,6 @@ UT_PLATFORM_API DWORD GetTempPathW(DWORD capacity, LPWSTR buffer);
 // with mkstemps and returns a nonzero number; otherwise only forms <path>/<prefix><unique in hex>.tmp.
 // `name` holds MAX_PATH characters. 0 on failure.
 UT_PLATFORM_API UINT GetTempFileNameW(LPCWSTR path, LPCWSTR prefix, UINT unique, LPWSTR name);
-// '*' and '?' in the last part of the pattern; "." and ".." are listed as on Windows.
-UT_PLATFORM_API HANDLE FindFirstFileW(LPCWSTR pattern, WIN32_FIND_DATAW* found);
-UT_PLATFORM_API BOOL FindNextFileW(HANDLE search, WIN32_FIND_DATAW* found);
-UT_PLATFORM_API BOOL FindClose(HANDLE search);
 UT_PLATFORM_API BOOL DeleteFileW(LPCWSTR path);
 // Mode 0 tests existence, 2 writing, 4 reading, 6 both. A file without any write permission
 // bit is read-only for every user, the superuser included, as a read-only file is on Windows.

@@ -1,0 +1,203 @@
+// Reading registrations back: class keys however their names are written, checked string reads,
+// the paths kept in the registry, and the sizing of the factory's resource folder.
+#include "registration/registration_test.h"
+
+#include <cwctype>
+#include <optional>
+
+#include <ut/registration.h>
+#include <ut/sdk/detail/registry.h>
+#include <ut/sdk/paths.h>
+
+namespace ut::test {
+namespace {
+
+using Bytes = std::vector<BYTE>;
+
+Bytes Units(const std::wstring& text) {
+    const auto* first = reinterpret_cast<const BYTE*>(text.data());
+    return Bytes(first, first + text.size() * sizeof(wchar_t));
+}
+
+// Sets a value to exactly `data`: a unit that is not zero follows it in memory, so that the
+// registry does not complete text that lacks its terminator.
+void SetRaw(HKEY root, const std::wstring& path, const wchar_t* name, DWORD type, Bytes data) {
+    UniqueHKey key;
+    ASSERT_EQ(sdk::CreateKey(root, path.c_str(), key), ERROR_SUCCESS);
+    auto size = static_cast<DWORD>(data.size());
+    data.insert(data.end(), sizeof(wchar_t), 1);
+    ASSERT_EQ(RegSetValueExW(key.get(), name, 0, type, data.data(), size), ERROR_SUCCESS);
+}
+
+void SetText(HKEY root, const std::wstring& path, const wchar_t* name, const std::wstring& text) {
+    SetRaw(root, path, name, REG_SZ, Units(text + L'\0'));
+}
+
+const GUID kClass = TestGuid(1);
+
+TEST_F(RegistrationTest, ClassKeysAreFoundByTheIdentifierTheirNameParsesTo) {
+    const std::wstring operators = Base(L"Operator\\");
+    std::wstring lower = GuidToString(kClass);
+    for (wchar_t& c : lower)
+        c = static_cast<wchar_t>(std::towlower(static_cast<wint_t>(c)));
+    SetText(HKEY_LOCAL_MACHINE, operators + lower, L"Name", L"in lower case");
+    EXPECT_EQ(NameOf(L"Operator", kClass), L"in lower case");
+    // A class key is enough, deliberately: without "Name", or with one too long for the buffer.
+    SetRaw(HKEY_LOCAL_MACHINE, operators + GuidToString(TestGuid(2)), L"Other", REG_SZ, Units(L"x"));
+    SetText(HKEY_LOCAL_MACHINE, operators + GuidToString(TestGuid(3)), L"Name", std::wstring(100, L'n'));
+    for (ULONG n : {2, 3}) {
+        wchar_t name[8] = L"kept";
+        DWORD bytes = sizeof name;
+        EXPECT_EQ(KXGetKeyName(L"Operator", TestGuid(n), name, &bytes), S_OK) << n;
+        EXPECT_TRUE(n == 3 ||
+                    std::wstring(name) == L"kept"); // what a value too large leaves is the registry's
+    }
+    // A name that is no identifier breaks the list, not the lookups.
+    SetText(HKEY_LOCAL_MACHINE, operators + L"not an identifier", L"Name", L"stray");
+    DWORD count = 7;
+    GUID* list = reinterpret_cast<GUID*>(&count);
+    EXPECT_EQ(KXGetCLSIDList(L"Operator", &count, &list), CO_E_CLASSSTRING);
+    EXPECT_EQ(count, 0u);
+    EXPECT_EQ(list, nullptr);
+    EXPECT_EQ(NameOf(L"Operator", kClass), L"in lower case");
+    EXPECT_EQ(NameOf(L"Operator", TestGuid(4)), L"<failed>");
+    EXPECT_EQ(NameOf(L"Nothing here", kClass), L"<failed>");
+    // A name the home's parser resolves some other way (a program id) is found by the walk.
+    SetText(HKEY_CLASSES_ROOT, L"UtTest.Twist\\CLSID", nullptr, GuidToString(TestGuid(5)));
+    SetText(HKEY_LOCAL_MACHINE, operators + L"UtTest.Twist", L"Name", L"by program id");
+    GUID resolved{};
+    bool resolves = SUCCEEDED(CLSIDFromString(L"UtTest.Twist", &resolved));
+    EXPECT_EQ(NameOf(L"Operator", TestGuid(5)), resolves ? L"by program id" : L"<failed>");
+
+    EXPECT_EQ(KXGetCLSIDList(L"Operator", nullptr, &list), E_POINTER);
+    EXPECT_EQ(KXGetCLSIDList(L"Operator", &count, nullptr), E_POINTER);
+    EXPECT_EQ(Listed(L"Nothing here"), std::vector<GUID>{GUID_NULL});
+    ASSERT_EQ(KXSetPathAtRegKey(L"Empty", L"only a path"), S_OK);
+    ASSERT_EQ(KXGetCLSIDList(L"Empty", &count, &list), S_OK);
+    EXPECT_EQ(count, 0u);
+    EXPECT_NE(list, nullptr); // a block of no entries, which the caller frees
+    CoTaskMemFree(list);
+}
+
+TEST_F(RegistrationTest, PathsAtACategoryAreReadWithChecks) {
+    struct Stored {
+        DWORD type;
+        std::wstring data;
+        HRESULT result;
+        std::optional<std::wstring> read; // none: whatever the registry left
+    };
+    const Stored cases[] = {
+        {REG_SZ, std::wstring(L"c:\\a\0", 5), S_OK, L"c:\\a"},
+        {REG_EXPAND_SZ, std::wstring(L"c:\\a\0", 5), S_OK, L"c:\\a"},
+        {REG_SZ, L"c:\\a", E_FAIL, L""}, // no terminator
+        {REG_SZ, L"", S_OK, L""},
+        {REG_MULTI_SZ, std::wstring(L"a\0b\0\0", 5), S_OK, L"a"},
+        {REG_MULTI_SZ, std::wstring(L"\0", 1), E_FAIL, L""},
+        {REG_MULTI_SZ, std::wstring(L"a\0b", 3), E_FAIL, L""},
+        {REG_DWORD, std::wstring(4 / sizeof(wchar_t), L'\1'), E_FAIL, L""},
+        {REG_SZ, std::wstring(50, L'p') + L'\0', E_FAIL, std::nullopt}, // too long for the buffer
+    };
+    for (const Stored& stored : cases) {
+        SCOPED_TRACE(platform::Utf8FromWide(stored.data) + " of type " + std::to_string(stored.type));
+        SetRaw(HKEY_LOCAL_MACHINE, Base(L"Shaders"), L"Path", stored.type, Units(stored.data));
+        wchar_t path[20] = L"untouched";
+        EXPECT_EQ(KXGetPathAtRegKey(L"Shaders", sizeof path, path), stored.result);
+        EXPECT_TRUE(!stored.read || *stored.read == path);
+    }
+    wchar_t path[20];
+    EXPECT_EQ(KXGetPathAtRegKey(L"Nothing here", sizeof path, path), E_FAIL);
+    EXPECT_EQ(KXSetPathAtRegKey(L"Shaders", L"c:\\shaders"), S_OK);
+    EXPECT_EQ(KXGetPathAtRegKey(L"Shaders", sizeof path, path), S_OK);
+    EXPECT_STREQ(path, L"c:\\shaders");
+    EXPECT_EQ(KXSetPathAtRegKey(L"Fresh", nullptr), E_FAIL);
+    EXPECT_TRUE(KeyExists(HKEY_LOCAL_MACHINE, Base(L"Fresh")));
+}
+
+TEST_F(RegistrationTest, ViewNamesFallBackToTheIdentifierText) {
+    const std::wstring key = Base(L"View\\") + GuidToString(kClass), id = GuidToString(kClass);
+    struct Stored {
+        DWORD type;
+        std::wstring name;
+        HRESULT result;
+        std::wstring read;
+    };
+    const Stored cases[] = {
+        {REG_SZ, std::wstring(39, L'v'), S_OK, std::wstring(39, L'v')},
+        {REG_SZ, std::wstring(40, L'v'), E_FAIL, id},
+        {REG_DWORD, L"", E_FAIL, id},
+    };
+    for (const Stored& stored : cases) {
+        SetRaw(HKEY_LOCAL_MACHINE, key, L"Name", stored.type, Units(stored.name + L'\0'));
+        wchar_t name[40] = L"untouched";
+        EXPECT_EQ(KXGetCorvaneViewName(kClass, name), stored.result) << stored.name.size();
+        EXPECT_EQ(std::wstring(name), stored.read);
+    }
+    wchar_t name[40] = L"untouched";
+    EXPECT_EQ(KXGetCorvaneViewName(TestGuid(2), name), E_FAIL);
+    EXPECT_STREQ(name, L"");
+
+    CKXString hostName = L"untouched";
+    EXPECT_EQ(KXGetGWViewName(TestGuid(2), hostName), HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND));
+    EXPECT_EQ(hostName, CKXString(L""));
+    ASSERT_EQ(KXRegisterView(TestGuid(2), Module(), L"Curve view"), S_OK);
+    EXPECT_EQ(KXGetGWViewName(TestGuid(2), hostName), S_OK);
+    EXPECT_EQ(hostName, CKXString(L"Curve view"));
+}
+
+TEST_F(RegistrationTest, InspectorsAreReadBackByTheClassGiven) {
+    GUID inspector = TestGuid(9);
+    EXPECT_EQ(KXGetObjectInspectorView(kClass, nullptr), E_INVALIDARG);
+    EXPECT_EQ(KXGetObjectInspectorView(kClass, &inspector), S_FALSE);
+    EXPECT_EQ(inspector, GUID_NULL);
+    ASSERT_EQ(KXRegisterViewInspector(kClass, Module(), TestGuid(99)), S_OK);
+    EXPECT_EQ(KXGetObjectInspectorView(kClass, &inspector), S_OK);
+    EXPECT_EQ(inspector, TestGuid(99));
+    SetText(HKEY_LOCAL_MACHINE, Base(L"Inspector View\\") + GuidToString(kClass), L"Name", L"no identifier");
+    EXPECT_EQ(KXGetObjectInspectorView(kClass, &inspector), CO_E_CLASSSTRING);
+}
+
+TEST_F(RegistrationTest, PathsOfTheClassesRootKeepTheirLimits) {
+    const std::wstring key = L"QVX\\Shaders\\" + GuidToString(kClass), fits(39, L'p'), tooLong(40, L'p');
+    wchar_t path[80] = L"";
+    EXPECT_EQ(KXFindPathInRegistry(kClass, L"Shaders", path), E_FAIL);
+    ASSERT_EQ(KXSetPathInRegistry(key.c_str(), fits.c_str()), S_OK);
+    EXPECT_EQ(KXGetPathInRegistry(key.c_str(), sizeof path, path), S_OK);
+    EXPECT_EQ(std::wstring(path), fits);
+    EXPECT_EQ(KXFindPathInRegistry(kClass, L"Shaders", path), S_OK);
+    EXPECT_EQ(std::wstring(path), fits);
+    ASSERT_EQ(KXSetPathInRegistry(key.c_str(), tooLong.c_str()), S_OK);
+    EXPECT_EQ(KXFindPathInRegistry(kClass, L"Shaders", path), E_FAIL);
+    EXPECT_EQ(KXGetPathInRegistry(key.c_str(), 8, path), E_FAIL);
+    EXPECT_EQ(KXFindPathInRegistry(kClass, L"Textures", path), E_FAIL);
+    EXPECT_EQ(KXSetPathInRegistry(key.c_str(), nullptr), E_FAIL);
+}
+
+TEST_F(RegistrationTest, DescriptionFilesComeFromTheCoreBranch) {
+    SetText(HKEY_LOCAL_MACHINE, L"Software\\ut\\Core\\QDEF\\" + GuidToString(kClass), nullptr, L"twist.qdef");
+    wchar_t file[40] = L"";
+    DWORD bytes = sizeof file, none = 0;
+    EXPECT_EQ(KXGetQDEFFilename(kClass, nullptr, &bytes), E_POINTER);
+    EXPECT_EQ(KXGetQDEFFilename(kClass, file, &none), E_POINTER);
+    EXPECT_EQ(KXGetQDEFFilename(GUID_NULL, file, &bytes), E_INVALIDARG);
+    EXPECT_EQ(KXGetQDEFFilename(TestGuid(2), file, &bytes), E_FAIL);
+    EXPECT_EQ(KXGetQDEFFilename(kClass, file, &bytes), S_OK);
+    EXPECT_STREQ(file, L"twist.qdef");
+}
+
+TEST_F(RegistrationTest, TheResourceFolderSizesItsOwnBuffer) {
+    CKXString factory;
+    ASSERT_EQ(KXGetFactoryPath(factory), S_OK);
+    const std::wstring folder = factory.Str() + L"\\Application\\rsrc";
+    const auto n = static_cast<DWORD>(folder.size());
+    std::wstring buffer(n + 1, L'?');
+    EXPECT_EQ(KXGetFactoryRsrcPath(0, nullptr), n);
+    EXPECT_EQ(KXGetFactoryRsrcPath(0, buffer.data()), n);
+    EXPECT_EQ(buffer[0], L'?'); // no room: untouched
+    EXPECT_EQ(KXGetFactoryRsrcPath(n, buffer.data()), n);
+    EXPECT_EQ(buffer[0], L'\0'); // one short: emptied
+    EXPECT_EQ(KXGetFactoryRsrcPath(n + 1, buffer.data()), n);
+    EXPECT_EQ(std::wstring(buffer.c_str()), folder);
+}
+
+} // namespace
+} // namespace ut::test

@@ -1,0 +1,128 @@
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include <ut/sdk/catalog.h>
+#include <ut/sdk/log.h>
+#include <ut/sdk/resources.h>
+
+#include "support/temp_folder.h"
+
+namespace {
+
+TEST(TextTables, ReadOneNumberedTextALineAndSkipWhatTheyCannotRead) {
+    ut::test::TempFolder folder;
+    const std::string content = "# a comment\n"
+                                "1 plain\n"
+                                "2\ttab separated\n"
+                                "3    many blanks\n"
+                                "4 escapes \\n \\t \\\\ and C:\\dir\\file\n"
+                                "5\n"
+                                "6 trailing blanks kept  \n"
+                                "7 a line ending in CR LF\r\n"
+                                " 8 a leading blank\n"
+                                "x9 no number\n"
+                                "10x no blank after the number\n"
+                                "1 replaced\n"
+                                "\n"
+                                "1234567890 ten digits\n"
+                                "0 zero\n"
+                                "12 \xC3\xBCn\xC3\xAF \xE2\x82\xAC\n"
+                                "13 the last line without a break";
+    ASSERT_EQ(KXDictLoadFile(L"UTPARSE", folder.Write(L"parse.dict", content).c_str()), S_OK);
+    struct Case {
+        unsigned short id;
+        std::wstring text;
+    };
+    const Case cases[] = {
+        {1, L"replaced"},
+        {2, L"tab separated"},
+        {3, L"many blanks"},
+        {4, L"escapes \n \t \\ and C:\\dir\\file"},
+        {5, L""},
+        {6, L"trailing blanks kept  "},
+        {7, L"a line ending in CR LF"},
+        {8, L""},
+        {9, L""},
+        {10, L""},
+        {0, L"zero"},
+        {12, L"\u00FCn\u00EF \u20AC"},
+        {13, L"the last line without a break"},
+    };
+    for (const Case& c : cases)
+        EXPECT_EQ(std::wstring(DictLoadIdstring(L"UTPARSE", c.id)), c.text) << "entry " << c.id;
+
+    // Reading again replaces the table; texts handed out before stay readable.
+    const wchar_t* before = DictLoadIdstring(L"UTPARSE", 1);
+    ASSERT_EQ(KXDictLoadFile(L"UTPARSE", folder.Write(L"again.dict", "1 again\n").c_str()), S_OK);
+    EXPECT_STREQ(DictLoadIdstring(L"UTPARSE", 1), L"again");
+    EXPECT_STREQ(before, L"replaced");
+    EXPECT_STREQ(DictLoadIdstring(L"UTPARSE", 2), L"");
+}
+
+TEST(TextTables, RefuseWhatCannotBeRead) {
+    ut::test::TempFolder folder;
+    EXPECT_EQ(KXDictLoadFile(L"UTPARSE", folder.Path(L"missing.dict").c_str()), STG_E_FILENOTFOUND);
+    EXPECT_EQ(KXDictLoadFile(L"UTPARSE", nullptr), E_INVALIDARG);
+    EXPECT_EQ(KXDictLoadFile(nullptr, L"x"), E_INVALIDARG);
+    EXPECT_EQ(KXDictLoadFile(L"", L"x"), E_INVALIDARG);
+    EXPECT_EQ(KXCatalogLoadFile(L"", L"x"), E_INVALIDARG);
+    EXPECT_STREQ(DictLoadIdstring(L"UTNOSUCHDICTIONARY", 1), L"");
+    EXPECT_STREQ(DictLoadIdstring(nullptr, 1), L"");
+    EXPECT_STREQ(KXDictLoadInstanceIdstring(nullptr, 1), L"");
+}
+
+TEST(LogMessage, WritesOneLineWithTheKindToStandardErrorByDefault) {
+    struct Case {
+        ULONG kind;
+        const wchar_t* text;
+        const wchar_t* source;
+        const wchar_t* details;
+        std::string line;
+    };
+    const Case cases[] = {
+        {KXLOG_INFO, L"plain", nullptr, nullptr, "info: plain\n"},
+        {KXLOG_WARNING, L"two\nlines\r", L"cat 7", nullptr, "warning: two lines  [cat 7]\n"},
+        {KXLOG_ERROR, L"failed", L"", L"more", "error: failed more\n"},
+        {7, L"odd", nullptr, L"", "kind 7: odd\n"},
+    };
+    for (const Case& c : cases) {
+        testing::internal::CaptureStderr();
+        HRESULT hr = KXLogMessage(c.kind, c.text, c.source, c.details);
+        EXPECT_EQ(testing::internal::GetCapturedStderr(), c.line);
+        EXPECT_EQ(hr, S_OK);
+    }
+    EXPECT_EQ(KXLogMessage(KXLOG_INFO, nullptr, nullptr, nullptr), E_POINTER);
+}
+
+// Reports from a catalog of the test's own and keeps what it would log.
+class CountingHandling : public CKXErrorHandling {
+public:
+    HRESULT OnCreateMsgMap() override { return ++mapsCreated, S_OK; }
+    wchar_t* GetCatalogName() override { return catalog; }
+    HRESULT LogMessage(CKXMsgString& message) override {
+        return logged.push_back(message.Text().Str()), S_OK;
+    }
+
+    wchar_t* catalog = nullptr;
+    int mapsCreated = 0;
+    std::vector<std::wstring> logged;
+};
+
+TEST(ErrorHandling, CreatesItsMapOnceAndReportsThroughTheVirtualLog) {
+    ut::test::TempFolder folder;
+    ASSERT_EQ(KXCatalogLoadFile(L"utscores", folder.Write(L"s.cat", "1 %ls scored %u%%\n").c_str()), S_OK);
+    CountingHandling handling;
+    wchar_t name[] = L"utscores";
+    const std::pair<wchar_t*, HRESULT> reports[] = {{nullptr, E_FAIL}, {name, S_OK}, {name, S_OK}};
+    for (auto [catalog, expected] : reports) {
+        handling.catalog = catalog;
+        EXPECT_EQ(handling.ReportMsg(1, L"Ann", 90u), expected);
+    }
+    EXPECT_EQ(handling.ReportMsg(2), KX_E_MSG_NOT_FOUND);
+    EXPECT_EQ(handling.mapsCreated, 1);
+    EXPECT_EQ(handling.logged, (std::vector<std::wstring>{L"Ann scored 90%", L"Ann scored 90%"}));
+}
+
+} // namespace
