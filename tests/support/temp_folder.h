@@ -3,6 +3,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <random>
 #include <string>
 #include <string_view>
 
@@ -23,10 +24,12 @@ public:
     TempFolder(const TempFolder&) = delete;
     TempFolder& operator=(const TempFolder&) = delete;
 
+    const std::filesystem::path& Root() const { return root_; }
     // The path of `name` inside the folder, or of the folder itself.
     std::wstring Path(std::wstring_view name = {}) const {
         return (name.empty() ? root_ : root_ / name).wstring();
     }
+    std::wstring operator/(std::wstring_view name) const { return Path(name); }
     // Writes file `name` with `content` as it is; returns its path.
     std::wstring Write(std::wstring_view name, std::string_view content) const {
         std::ofstream(root_ / name, std::ios::binary).write(content.data(), std::streamsize(content.size()));
@@ -38,10 +41,16 @@ public:
     }
 
 private:
+    // Unique across processes too: a run that was killed leaves its folder behind.
     static std::string UniqueName() {
-        static int count = 0;
-        return "ut_" + std::string(::testing::UnitTest::GetInstance()->current_test_info()->name()) + "_" +
-               std::to_string(count++);
+        static std::random_device random;
+        const auto* test = ::testing::UnitTest::GetInstance()->current_test_info();
+        std::string name = std::string("ut_") + (test ? test->name() : "test") + "_" + std::to_string(random()) +
+                           std::to_string(random());
+        for (char& c : name)
+            if (c == '/')
+                c = '_';
+        return name;
     }
 
     std::filesystem::path root_;

@@ -12,6 +12,26 @@
 
 namespace ut::platform {
 
+// Fills a STATSTG: everything zero but the type, size and mode, and the name (task memory)
+// unless STATFLAG_NONAME asks for none or there is none.
+inline HRESULT FillStatRecord(STATSTG* stat, DWORD flags, DWORD type, ULONGLONG size,
+                              const std::wstring& name, DWORD mode) {
+    if (!stat)
+        return STG_E_INVALIDPOINTER;
+    std::memset(stat, 0, sizeof *stat);
+    stat->type = type;
+    stat->cbSize.QuadPart = size;
+    stat->grfMode = mode;
+    if ((flags & STATFLAG_NONAME) || name.empty())
+        return S_OK;
+    auto* copy = static_cast<wchar_t*>(CoTaskMemAlloc((name.size() + 1) * sizeof(wchar_t)));
+    if (!copy)
+        return STG_E_INSUFFICIENTMEMORY;
+    std::memcpy(copy, name.c_str(), (name.size() + 1) * sizeof(wchar_t));
+    stat->pwcsName = copy;
+    return S_OK;
+}
+
 class StreamBase : public IStream {
 public:
     HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override {
@@ -85,20 +105,7 @@ protected:
     // Fills the parts of STATSTG that every stream reports the same way.
     static HRESULT FillStat(STATSTG* stat, DWORD flags, ULONGLONG size, const std::wstring& name,
                             DWORD mode) {
-        if (!stat)
-            return STG_E_INVALIDPOINTER;
-        std::memset(stat, 0, sizeof *stat);
-        stat->type = STGTY_STREAM;
-        stat->cbSize.QuadPart = size;
-        stat->grfMode = mode;
-        if ((flags & STATFLAG_NONAME) || name.empty())
-            return S_OK;
-        auto* copy = static_cast<wchar_t*>(CoTaskMemAlloc((name.size() + 1) * sizeof(wchar_t)));
-        if (!copy)
-            return STG_E_INSUFFICIENTMEMORY;
-        std::memcpy(copy, name.c_str(), (name.size() + 1) * sizeof(wchar_t));
-        stat->pwcsName = copy;
-        return S_OK;
+        return FillStatRecord(stat, flags, STGTY_STREAM, size, name, mode);
     }
 
     // Applies a Seek request to a position; false when it would land before the start or the

@@ -1,4 +1,4 @@
-// COM basics for POSIX: task memory, GUID text and the in-process class table.
+// COM basics for POSIX: the last error, task memory, GUID text and the in-process class table.
 #include <cstdlib>
 #include <mutex>
 #include <vector>
@@ -80,9 +80,14 @@ IUnknown* FindFactory(REFCLSID clsid) {
     return nullptr;
 }
 
+thread_local DWORD lastError = 0;
+
 } // namespace
 
 extern "C" {
+
+DWORD GetLastError() { return lastError; }
+void SetLastError(DWORD code) { lastError = code; }
 
 void* CoTaskMemAlloc(SIZE_T size) { return std::malloc(size ? size : 1); }
 

@@ -11,6 +11,7 @@
 #include <ut/platform/text.h>
 
 #include "common/stream_base.h"
+#include "posix/descriptor.h"
 
 // A growable stream in memory. Clones share the bytes and keep their own position, as the
 // system's memory streams do.
@@ -124,25 +125,6 @@ HRESULT CreateMemoryStream(IStream** stream) {
 namespace ut::platform::posix {
 namespace {
 
-HRESULT FromErrno(int error, HRESULT fallback) {
-    switch (error) {
-    case ENOENT:
-    case ENOTDIR:
-        return STG_E_FILENOTFOUND;
-    case EACCES:
-    case EPERM:
-    case EROFS:
-        return STG_E_ACCESSDENIED;
-    case ENOSPC:
-    case EFBIG:
-        return STG_E_MEDIUMFULL;
-    case ENOMEM:
-        return STG_E_INSUFFICIENTMEMORY;
-    default:
-        return fallback;
-    }
-}
-
 class FileStream final : public StreamBase {
 public:
     FileStream(int fd, std::wstring path, DWORD mode) : fd_(fd), path_(std::move(path)), mode_(mode) {}
@@ -154,19 +136,9 @@ public:
             return STG_E_INVALIDPOINTER;
         if (!CanRead(mode_))
             return STG_E_ACCESSDENIED;
-        ULONG done = 0;
-        while (done < count) {
-            ssize_t got = ::pread(fd_, static_cast<char*>(buffer) + done, count - done,
-                                  static_cast<off_t>(position_ + done));
-            if (got < 0 && errno == EINTR)
-                continue;
-            if (got < 0)
-                return FinishRead(done, read, FromErrno(errno, STG_E_READFAULT));
-            if (got == 0)
-                break;
-            done += static_cast<ULONG>(got);
-        }
-        return FinishRead(done, read, S_OK);
+        std::size_t done = 0;
+        HRESULT hr = PreadFully(fd_, position_, buffer, count, done);
+        return FinishRead(static_cast<ULONG>(done), read, hr);
     }
 
     HRESULT STDMETHODCALLTYPE Write(const void* buffer, ULONG count, ULONG* written) override {
@@ -177,25 +149,12 @@ public:
         // A file created for reading is open for writing underneath, so that it can be truncated.
         if (!CanWrite(mode_))
             return STG_E_ACCESSDENIED;
-        ULONG done = 0;
-        while (done < count) {
-            ssize_t put = ::pwrite(fd_, static_cast<const char*>(buffer) + done, count - done,
-                                   static_cast<off_t>(position_ + done));
-            if (put < 0 && errno == EINTR)
-                continue;
-            if (put <= 0) {
-                HRESULT hr = put < 0 ? FromErrno(errno, STG_E_WRITEFAULT) : STG_E_WRITEFAULT;
-                position_ += done;
-                if (written)
-                    *written = done;
-                return hr;
-            }
-            done += static_cast<ULONG>(put);
-        }
+        std::size_t done = 0;
+        HRESULT hr = PwriteFully(fd_, position_, buffer, count, done);
         position_ += done;
         if (written)
-            *written = done;
-        return S_OK;
+            *written = static_cast<ULONG>(done);
+        return hr;
     }
 
     HRESULT STDMETHODCALLTYPE Seek(LARGE_INTEGER move, DWORD origin, ULARGE_INTEGER* position) override {
@@ -215,7 +174,7 @@ public:
         if (!CanWrite(mode_))
             return STG_E_ACCESSDENIED;
         if (::ftruncate(fd_, static_cast<off_t>(size.QuadPart)) != 0)
-            return FromErrno(errno, STG_E_WRITEFAULT);
+            return StorageError(errno, STG_E_WRITEFAULT);
         return S_OK;
     }
 
@@ -247,7 +206,7 @@ private:
     HRESULT Size(ULONGLONG& size) const {
         struct stat info {};
         if (::fstat(fd_, &info) != 0)
-            return FromErrno(errno, STG_E_READFAULT);
+            return StorageError(errno, STG_E_READFAULT);
         size = static_cast<ULONGLONG>(info.st_size);
         return S_OK;
     }
@@ -289,7 +248,7 @@ HRESULT OpenFileStream(const wchar_t* path, DWORD mode, IStream** stream) {
         flags = (flags & ~O_ACCMODE) | O_RDWR;
     int fd = ::open(Utf8FromWide(path).c_str(), flags, 0666);
     if (fd < 0)
-        return posix::FromErrno(errno, STG_E_ACCESSDENIED);
+        return posix::StorageError(errno, STG_E_ACCESSDENIED);
     // A folder opens for reading here but not on Windows: refuse it on both homes.
     struct stat info {};
     if (::fstat(fd, &info) == 0 && S_ISDIR(info.st_mode)) {

@@ -2,8 +2,13 @@
 #include <cstdio>
 
 #include <ut/detail/names.h>
+#include <ut/platform/bitmap.h>
+#include <ut/platform/dataobject.h>
+#include <ut/platform/files.h>
+#include <ut/platform/storage.h>
 #include <ut/platform/stream.h>
 #include <ut/sdk/resources.h>
+#include <ut/sdk/storage.h>
 #include <ut/ut.h>
 
 // Defined for the home the plug-in is built on.

@@ -51,6 +51,9 @@ struct FILETIME {
     DWORD dwHighDateTime;
 };
 
+// An opaque handle of the system's objects (search handles, global memory blocks).
+using HANDLE = void*;
+
 // A module handle: the load address of a shared object.
 struct HINSTANCE__;
 using HINSTANCE = HINSTANCE__*;
@@ -110,12 +113,26 @@ inline constexpr HRESULT STG_E_INVALIDFLAG = static_cast<HRESULT>(0x800300FF);
 inline constexpr HRESULT STG_E_REVERTED = static_cast<HRESULT>(0x80030102);
 inline constexpr HRESULT STG_E_CANTSAVE = static_cast<HRESULT>(0x80030103);
 inline constexpr HRESULT STG_E_OLDFORMAT = static_cast<HRESULT>(0x80030104);
+inline constexpr HRESULT STG_E_DOCFILECORRUPT = static_cast<HRESULT>(0x80030109);
+inline constexpr HRESULT STG_E_SHAREVIOLATION = static_cast<HRESULT>(0x80030020);
+inline constexpr HRESULT STG_E_LOCKVIOLATION = static_cast<HRESULT>(0x80030021);
+inline constexpr HRESULT DV_E_FORMATETC = static_cast<HRESULT>(0x80040064);
+inline constexpr HRESULT DV_E_LINDEX = static_cast<HRESULT>(0x80040068);
+inline constexpr HRESULT DV_E_TYMED = static_cast<HRESULT>(0x80040069);
+inline constexpr HRESULT DV_E_DVASPECT = static_cast<HRESULT>(0x8004006B);
+inline constexpr HRESULT OLE_E_ADVISENOTSUPPORTED = static_cast<HRESULT>(0x80040003);
+inline constexpr HRESULT DATA_S_SAMEFORMATETC = static_cast<HRESULT>(0x00040130);
 
 inline constexpr LONG ERROR_SUCCESS = 0;
 inline constexpr LONG ERROR_FILE_NOT_FOUND = 2;
+inline constexpr LONG ERROR_PATH_NOT_FOUND = 3;
 inline constexpr LONG ERROR_ACCESS_DENIED = 5;
+inline constexpr LONG ERROR_INVALID_HANDLE = 6;
+inline constexpr LONG ERROR_NOT_ENOUGH_MEMORY = 8;
 inline constexpr LONG ERROR_INVALID_DATA = 13;
 inline constexpr LONG ERROR_OUTOFMEMORY = 14;
+inline constexpr LONG ERROR_NO_MORE_FILES = 18;
+inline constexpr LONG ERROR_FILE_EXISTS = 80;
 inline constexpr LONG ERROR_INVALID_PARAMETER = 87;
 inline constexpr LONG ERROR_INSUFFICIENT_BUFFER = 122;
 inline constexpr LONG ERROR_MORE_DATA = 234;
@@ -189,6 +206,10 @@ enum REGCLS : DWORD {
 };
 
 extern "C" {
+// The calling thread's last error code, as the system's calls leave it.
+UT_PLATFORM_API DWORD GetLastError();
+UT_PLATFORM_API void SetLastError(DWORD code);
+
 UT_PLATFORM_API void* CoTaskMemAlloc(SIZE_T size);
 UT_PLATFORM_API void* CoTaskMemRealloc(void* block, SIZE_T size);
 UT_PLATFORM_API void CoTaskMemFree(void* block);

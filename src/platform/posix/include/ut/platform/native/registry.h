@@ -81,7 +81,6 @@ inline constexpr DWORD REG_CREATED_NEW_KEY = 1;
 inline constexpr DWORD REG_OPENED_EXISTING_KEY = 2;
 
 inline constexpr LONG ERROR_INVALID_FUNCTION = 1;
-inline constexpr LONG ERROR_INVALID_HANDLE = 6;
 inline constexpr LONG ERROR_DISK_FULL = 112;
 inline constexpr LONG ERROR_BAD_PATHNAME = 161;
 inline constexpr LONG ERROR_BUSY = 170;

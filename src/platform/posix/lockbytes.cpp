@@ -1,0 +1,307 @@
+// Byte arrays on POSIX: over a file (with atomic replacement of the whole content) and over a
+// global memory block.
+#include "posix/lockbytes.h"
+
+#include <algorithm>
+#include <cstring>
+#include <fcntl.h>
+#include <filesystem>
+#include <new>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <ut/platform/detail/boundary.h>
+
+#include "common/lockbytes_base.h"
+#include "common/stream_base.h"
+#include "posix/descriptor.h"
+#include "posix/path.h"
+
+namespace ut::platform::posix {
+namespace {
+
+bool CanWrite(DWORD mode) {
+    return (mode & 3) != STGM_READ;
+}
+
+// Makes sure a file's new name and content reach the disk before anyone relies on them.
+void SyncFolderOf(const std::string& path) {
+    std::string folder = std::filesystem::path(path).parent_path().string();
+    int fd = ::open(folder.empty() ? "." : folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (fd < 0)
+        return;
+    (void)::fsync(fd); // the rename is done; a folder that cannot sync loses only durability
+    ::close(fd);
+}
+
+class FileLockBytes final : public LockBytesBase, public FileBytes {
+public:
+    FileLockBytes(int fd, std::string path, std::wstring shownPath, DWORD mode, bool ownsDescriptor = true)
+        : fd_(fd), path_(std::move(path)), shownPath_(std::move(shownPath)), mode_(mode),
+          ownsDescriptor_(ownsDescriptor) {}
+
+    HRESULT STDMETHODCALLTYPE ReadAt(ULARGE_INTEGER offset, void* buffer, ULONG count, ULONG* read) override {
+        if (HRESULT hr = BeginTransfer(buffer, count, read); FAILED(hr))
+            return hr;
+        std::size_t done = 0;
+        HRESULT hr = PreadFully(fd_, offset.QuadPart, buffer, count, done);
+        if (read)
+            *read = static_cast<ULONG>(done);
+        return hr;
+    }
+
+    HRESULT STDMETHODCALLTYPE WriteAt(ULARGE_INTEGER offset, const void* buffer, ULONG count,
+                                      ULONG* written) override {
+        if (HRESULT hr = BeginTransfer(buffer, count, written); FAILED(hr))
+            return hr;
+        if (!CanWrite(mode_))
+            return STG_E_ACCESSDENIED;
+        std::size_t done = 0;
+        HRESULT hr = PwriteFully(fd_, offset.QuadPart, buffer, count, done);
+        if (written)
+            *written = static_cast<ULONG>(done);
+        return hr;
+    }
+
+    HRESULT STDMETHODCALLTYPE Flush() override {
+        if (!CanWrite(mode_) || ::fdatasync(fd_) == 0)
+            return S_OK;
+        return StorageError(errno, STG_E_WRITEFAULT);
+    }
+
+    HRESULT STDMETHODCALLTYPE SetSize(ULARGE_INTEGER size) override {
+        if (!CanWrite(mode_))
+            return STG_E_ACCESSDENIED;
+        return ::ftruncate(fd_, static_cast<off_t>(size.QuadPart)) == 0
+                   ? S_OK
+                   : StorageError(errno, STG_E_WRITEFAULT);
+    }
+
+    HRESULT STDMETHODCALLTYPE Stat(STATSTG* stat, DWORD flags) override {
+        struct stat info {};
+        if (::fstat(fd_, &info) != 0)
+            return StorageError(errno, STG_E_READFAULT);
+        return FillStatRecord(stat, flags, STGTY_LOCKBYTES, static_cast<ULONGLONG>(info.st_size), shownPath_,
+                              mode_);
+    }
+
+    HRESULT ReplaceContent(const ContentWriter& write, bool durable) override {
+        if (!CanWrite(mode_))
+            return STG_E_ACCESSDENIED;
+        return ut::ExportBoundary([&] { return Replace(write, durable); });
+    }
+
+    const std::wstring& Path() const override { return shownPath_; }
+
+    void DeleteOnRelease() { deleteOnRelease_ = true; }
+
+private:
+    ~FileLockBytes() override {
+        if (ownsDescriptor_)
+            ::close(fd_);
+        if (deleteOnRelease_)
+            (void)::unlink(path_.c_str()); // nothing to report to at the last release
+    }
+
+    HRESULT Replace(const ContentWriter& write, bool durable) {
+        std::string temporary = path_ + ".XXXXXX";
+        int fd = ::mkostemp(temporary.data(), O_CLOEXEC);
+        if (fd < 0)
+            return StorageError(errno, STG_E_WRITEFAULT);
+        HRESULT hr = WriteAndSync(fd, write, durable);
+        if (SUCCEEDED(hr) && ::rename(temporary.c_str(), path_.c_str()) != 0)
+            hr = StorageError(errno, STG_E_WRITEFAULT);
+        if (FAILED(hr)) {
+            (void)::unlink(temporary.c_str()); // the old file stays as it was
+            ::close(fd);
+            return hr;
+        }
+        if (durable)
+            SyncFolderOf(path_);
+        ::close(fd_);
+        fd_ = fd;
+        return S_OK;
+    }
+
+    // Writes the content through a stdio stream on a duplicate of `fd`, gives it the file's
+    // permissions and, when asked, flushes it to the disk.
+    HRESULT WriteAndSync(int fd, const ContentWriter& write, bool durable) {
+        int duplicate = ::dup(fd);
+        std::FILE* file = duplicate >= 0 ? ::fdopen(duplicate, "w+b") : nullptr;
+        if (!file) {
+            if (duplicate >= 0)
+                ::close(duplicate);
+            return STG_E_INSUFFICIENTMEMORY;
+        }
+        HRESULT hr = write(file);
+        if (std::fflush(file) != 0 && SUCCEEDED(hr))
+            hr = StorageError(errno, STG_E_WRITEFAULT);
+        std::fclose(file);
+        if (FAILED(hr))
+            return hr;
+        struct stat info {};
+        if (::fstat(fd_, &info) == 0)
+            (void)::fchmod(fd, info.st_mode & 07777); // the owner's default is only less open
+        if (durable && ::fdatasync(fd) != 0)
+            return StorageError(errno, STG_E_WRITEFAULT);
+        return S_OK;
+    }
+
+    int fd_;
+    std::string path_;
+    std::wstring shownPath_;
+    DWORD mode_;
+    bool ownsDescriptor_;
+    bool deleteOnRelease_ = false;
+};
+
+// A byte array over a global memory block: the block's size is the array's size, and the
+// block grows with writes past its end.
+class GlobalLockBytes final : public LockBytesBase {
+public:
+    GlobalLockBytes(HGLOBAL block, bool deleteOnRelease) : block_(block), deleteOnRelease_(deleteOnRelease) {}
+
+    HRESULT STDMETHODCALLTYPE ReadAt(ULARGE_INTEGER offset, void* buffer, ULONG count, ULONG* read) override {
+        if (HRESULT hr = BeginTransfer(buffer, count, read); FAILED(hr))
+            return hr;
+        ULONGLONG size = GlobalSize(block_);
+        if (offset.QuadPart >= size || count == 0)
+            return S_OK;
+        ULONG copied = static_cast<ULONG>(std::min<ULONGLONG>(count, size - offset.QuadPart));
+        GlobalLockGuard lock(block_);
+        if (!lock.Data())
+            return STG_E_INVALIDHANDLE;
+        std::memcpy(buffer, static_cast<const char*>(lock.Data()) + offset.QuadPart, copied);
+        if (read)
+            *read = copied;
+        return S_OK;
+    }
+
+    HRESULT STDMETHODCALLTYPE WriteAt(ULARGE_INTEGER offset, const void* buffer, ULONG count,
+                                      ULONG* written) override {
+        if (HRESULT hr = BeginTransfer(buffer, count, written); FAILED(hr))
+            return hr;
+        if (count == 0)
+            return S_OK;
+        ULONGLONG end = offset.QuadPart + count;
+        if (end > GlobalSize(block_)) {
+            ULARGE_INTEGER size{};
+            size.QuadPart = end;
+            if (HRESULT hr = SetSize(size); FAILED(hr))
+                return hr;
+        }
+        GlobalLockGuard lock(block_);
+        if (!lock.Data())
+            return STG_E_INVALIDHANDLE;
+        std::memcpy(static_cast<char*>(lock.Data()) + offset.QuadPart, buffer, count);
+        if (written)
+            *written = count;
+        return S_OK;
+    }
+
+    HRESULT STDMETHODCALLTYPE Flush() override { return S_OK; }
+
+    HRESULT STDMETHODCALLTYPE SetSize(ULARGE_INTEGER size) override {
+        SIZE_T old = GlobalSize(block_);
+        if (size.QuadPart == old)
+            return S_OK;
+        if (!GlobalReAlloc(block_, static_cast<SIZE_T>(size.QuadPart), GMEM_MOVEABLE))
+            return STG_E_MEDIUMFULL;
+        if (size.QuadPart > old) {
+            GlobalLockGuard lock(block_);
+            if (lock.Data())
+                std::memset(static_cast<char*>(lock.Data()) + old, 0, size.QuadPart - old);
+        }
+        return S_OK;
+    }
+
+    HRESULT STDMETHODCALLTYPE Stat(STATSTG* stat, DWORD flags) override {
+        return FillStatRecord(stat, flags, STGTY_LOCKBYTES, GlobalSize(block_), std::wstring(),
+                              STGM_READWRITE);
+    }
+
+private:
+    ~GlobalLockBytes() override {
+        if (deleteOnRelease_)
+            (void)GlobalFree(block_); // ours to free; nothing to report at the last release
+    }
+
+    HGLOBAL block_;
+    bool deleteOnRelease_;
+};
+
+} // namespace
+
+FileBytes* FileBehind(ILockBytes* bytes) {
+    auto* file = dynamic_cast<FileLockBytes*>(bytes);
+    return file && !file->Path().empty() ? static_cast<FileBytes*>(file) : nullptr;
+}
+
+HRESULT OpenFileBytes(const std::string& path, DWORD mode, Disposition disposition, ILockBytes** bytes) {
+    static constexpr int kCreation[] = {0, O_CREAT, O_CREAT | O_EXCL, O_CREAT | O_TRUNC};
+    int flags = O_CLOEXEC | (CanWrite(mode) ? O_RDWR : O_RDONLY) | kCreation[static_cast<int>(disposition)];
+    int fd = ::open(path.c_str(), flags, 0666);
+    if (fd < 0 && errno == ENOENT && disposition != Disposition::Existing)
+        return STG_E_PATHNOTFOUND;
+    if (fd < 0)
+        return StorageError(errno, STG_E_ACCESSDENIED);
+    struct stat info {};
+    if (::fstat(fd, &info) != 0 || S_ISDIR(info.st_mode)) {
+        ::close(fd);
+        return STG_E_ACCESSDENIED;
+    }
+    return ut::ExportBoundary([&] {
+        std::error_code error;
+        std::filesystem::path absolute = std::filesystem::canonical(path, error);
+        std::string resolved = error ? path : absolute.string();
+        auto* file = new FileLockBytes(fd, resolved, WideFromUtf8(resolved), mode & ~STGM_DELETEONRELEASE);
+        if (mode & STGM_DELETEONRELEASE)
+            file->DeleteOnRelease();
+        *bytes = file;
+        return S_OK;
+    });
+}
+
+HRESULT WrapDescriptor(int fd, ILockBytes** bytes) {
+    *bytes = new (std::nothrow) FileLockBytes(fd, std::string(), std::wstring(), STGM_READWRITE, false);
+    return *bytes ? S_OK : E_OUTOFMEMORY;
+}
+
+HRESULT CreateScratchFile(std::FILE** file) {
+    *file = std::tmpfile();
+    return *file ? S_OK : StorageError(errno, STG_E_WRITEFAULT);
+}
+
+} // namespace ut::platform::posix
+
+namespace ut::platform {
+
+HRESULT OpenFileLockBytes(const wchar_t* path, DWORD mode, ILockBytes** bytes) {
+    if (!bytes)
+        return E_POINTER;
+    *bytes = nullptr;
+    if (!path || !*path)
+        return STG_E_INVALIDNAME;
+    if ((mode & 3) == 3)
+        return STG_E_INVALIDFLAG;
+    auto disposition = (mode & STGM_CREATE) ? posix::Disposition::Truncate : posix::Disposition::Existing;
+    return ut::ExportBoundary(
+        [&] { return posix::OpenFileBytes(posix::SystemPath(path), mode, disposition, bytes); });
+}
+
+} // namespace ut::platform
+
+extern "C" HRESULT CreateILockBytesOnHGlobal(HGLOBAL block, BOOL deleteOnRelease, ILockBytes** bytes) {
+    if (!bytes)
+        return E_INVALIDARG;
+    *bytes = nullptr;
+    bool ownBlock = !block;
+    if (ownBlock && !(block = GlobalAlloc(GMEM_MOVEABLE, 0)))
+        return E_OUTOFMEMORY;
+    *bytes = new (std::nothrow) ut::platform::posix::GlobalLockBytes(block, ownBlock || deleteOnRelease);
+    if (*bytes)
+        return S_OK;
+    if (ownBlock)
+        (void)GlobalFree(block); // never handed out
+    return E_OUTOFMEMORY;
+}

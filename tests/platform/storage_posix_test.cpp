@@ -1,0 +1,334 @@
+// What POSIX's own compound files promise beyond the shared rules: damaged files refused with
+// the system's codes, atomic commits, and what the system writes read back.
+#include <chrono>
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <thread>
+#include <unistd.h>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include <ut/platform/storage.h>
+
+#include "support/compound.h"
+#include "support/temp_folder.h"
+
+namespace {
+
+using ut::ComPtr;
+using ut::test::ElementsOf;
+using ut::test::kCreateMode;
+using ut::test::kElementMode;
+using ut::test::kReadMode;
+using ut::test::Pattern;
+using ut::test::PutStream;
+using ut::test::ReadStream;
+using ut::test::TempFolder;
+
+std::string ReadAll(const std::filesystem::path& path) {
+    std::ifstream in(path, std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
+
+void WriteAll(const std::filesystem::path& path, const std::string& bytes) {
+    std::ofstream(path, std::ios::binary | std::ios::trunc) << bytes;
+}
+
+HRESULT Open(const std::wstring& path, ComPtr<IStorage>& storage, DWORD mode = kReadMode) {
+    return StgOpenStorage(path.c_str(), nullptr, mode, nullptr, 0, storage.Put());
+}
+
+// The bytes of a compound file, with the places a test damages found by name.
+class RawFile {
+public:
+    explicit RawFile(std::string bytes) : bytes_(std::move(bytes)) {}
+
+    std::uint32_t Get32(std::size_t at) const {
+        std::uint32_t value = 0;
+        for (int i = 3; i >= 0; --i)
+            value = value << 8 | static_cast<std::uint8_t>(bytes_[at + i]);
+        return value;
+    }
+    void Put32(std::size_t at, std::uint32_t value) {
+        for (int i = 0; i < 4; ++i)
+            bytes_[at + i] = static_cast<char>(value >> (8 * i));
+    }
+    void Put16(std::size_t at, std::uint16_t value) {
+        bytes_[at] = static_cast<char>(value);
+        bytes_[at + 1] = static_cast<char>(value >> 8);
+    }
+    // The directory entry named `name`: entries are 128 bytes, aligned, after the header.
+    std::size_t Entry(const std::string& name) const {
+        std::string utf16;
+        for (char c : name)
+            utf16 += std::string{c, '\0'};
+        for (std::size_t at = 512; at + 128 <= bytes_.size(); at += 128)
+            if (bytes_.compare(at, utf16.size() + 2, utf16 + std::string(2, '\0')) == 0 &&
+                static_cast<std::uint8_t>(bytes_[at + 64]) == utf16.size() + 2)
+                return at;
+        ADD_FAILURE() << "no entry " << name;
+        return 0;
+    }
+    // The FAT slot of `sector`, in the first FAT sector.
+    std::size_t FatSlot(std::uint32_t sector) const { return (Get32(76) + 1) * 512 + 4 * sector; }
+
+    std::string& Bytes() { return bytes_; }
+
+private:
+    std::string bytes_;
+};
+
+// A small file: a regular stream "big", a mini stream "small" and a storage "sub".
+std::string SampleBytes(const TempFolder& folder) {
+    std::wstring path = folder / L"good.cfb";
+    {
+        ComPtr<IStorage> root;
+        EXPECT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+        EXPECT_EQ(PutStream(root.Get(), L"big", Pattern(8192, 1)), S_OK);
+        EXPECT_EQ(PutStream(root.Get(), L"small", Pattern(100, 2)), S_OK);
+        ComPtr<IStorage> sub;
+        EXPECT_EQ(root->CreateStorage(L"sub", kElementMode, 0, 0, sub.Put()), S_OK);
+        EXPECT_EQ(PutStream(sub.Get(), L"in", "x"), S_OK);
+    }
+    return ReadAll(folder.Root() / "good.cfb");
+}
+
+struct Damage {
+    const char* what;
+    void (*apply)(RawFile& file);
+    HRESULT open;    // from StgOpenStorage
+    HRESULT readBig; // reading "big" when the open succeeds
+    HRESULT readSmall;
+};
+
+const Damage kDamages[] = {
+    {"byte order", [](RawFile& f) { f.Put16(28, 0x1234); }, STG_E_INVALIDHEADER, S_OK, S_OK},
+    {"sector shift", [](RawFile& f) { f.Put16(30, 20); }, STG_E_INVALIDHEADER, S_OK, S_OK},
+    {"major version", [](RawFile& f) { f.Put16(26, 7); }, STG_E_INVALIDHEADER, S_OK, S_OK},
+    {"mini sector shift", [](RawFile& f) { f.Put16(32, 7); }, STG_E_INVALIDHEADER, S_OK, S_OK},
+    {"FAT count past the file", [](RawFile& f) { f.Put32(44, 0x7FFFFFFF); }, STG_E_DOCFILECORRUPT, S_OK,
+     S_OK},
+    {"directory past the file", [](RawFile& f) { f.Put32(48, 0x00FFFFFF); }, STG_E_DOCFILECORRUPT, S_OK,
+     S_OK},
+    {"truncated", [](RawFile& f) { f.Bytes().resize(1024); }, STG_E_DOCFILECORRUPT, S_OK, S_OK},
+    {"sibling back to the root", [](RawFile& f) { f.Put32(f.Entry("small") + 72, 0); }, STG_E_DOCFILECORRUPT,
+     S_OK, S_OK},
+    {"sibling past the directory", [](RawFile& f) { f.Put32(f.Entry("small") + 72, 5000); },
+     STG_E_DOCFILECORRUPT, S_OK, S_OK},
+    {"odd name length", [](RawFile& f) { f.Put16(f.Entry("small") + 64, 7); }, STG_E_DOCFILECORRUPT, S_OK,
+     S_OK},
+    {"unknown type", [](RawFile& f) { f.Bytes()[f.Entry("small") + 66] = 9; }, STG_E_DOCFILECORRUPT, S_OK,
+     S_OK},
+    {"stream with elements", [](RawFile& f) { f.Put32(f.Entry("small") + 76, 0); }, STG_E_DOCFILECORRUPT,
+     S_OK, S_OK},
+    {"stream larger than the file", [](RawFile& f) { f.Put32(f.Entry("big") + 120, 0x7FFFFFF0); }, S_OK,
+     STG_E_DOCFILECORRUPT, S_OK},
+    {"chain in a loop",
+     [](RawFile& f) { f.Put32(f.FatSlot(f.Get32(f.Entry("big") + 116)), f.Get32(f.Entry("big") + 116)); },
+     S_OK, STG_E_DOCFILECORRUPT, S_OK},
+    {"chain into a free sector",
+     [](RawFile& f) { f.Put32(f.FatSlot(f.Get32(f.Entry("big") + 116)), 0xFFFFFFFF); }, S_OK,
+     STG_E_DOCFILECORRUPT, S_OK},
+    {"mini chain past the mini stream", [](RawFile& f) { f.Put32(f.Entry("small") + 116, 10000); }, S_OK,
+     S_OK, STG_E_DOCFILECORRUPT},
+};
+
+HRESULT ReadResult(IStorage* root, const wchar_t* name) {
+    ComPtr<IStream> stream;
+    if (HRESULT hr = root->OpenStream(name, nullptr, kReadMode, 0, stream.Put()); FAILED(hr))
+        return hr;
+    char buffer[512];
+    ULONG got = 0;
+    HRESULT hr = S_OK;
+    while (SUCCEEDED(hr = stream->Read(buffer, sizeof buffer, &got)) && got > 0) {
+    }
+    return hr;
+}
+
+TEST(StoragePosix, DamagedFilesAreRefusedWithTheSystemsCodes) {
+    TempFolder folder;
+    std::string good = SampleBytes(folder);
+    ASSERT_GT(good.size(), 2048u);
+    std::wstring path = folder / L"damaged.cfb";
+    for (const Damage& damage : kDamages) {
+        RawFile file(good);
+        damage.apply(file);
+        WriteAll(std::filesystem::path(path), file.Bytes());
+        ComPtr<IStorage> root;
+        ASSERT_EQ(Open(path, root), damage.open) << damage.what;
+        if (!root)
+            continue;
+        EXPECT_EQ(ReadResult(root.Get(), L"big"), damage.readBig) << damage.what;
+        EXPECT_EQ(ReadResult(root.Get(), L"small"), damage.readSmall) << damage.what;
+    }
+}
+
+TEST(StoragePosix, NamesTheSystemForbidsAreRefused) {
+    TempFolder folder;
+    ComPtr<IStorage> root;
+    ASSERT_EQ(StgCreateDocfile((folder / L"names.cfb").c_str(), kCreateMode, 0, root.Put()), S_OK);
+    for (const wchar_t* name : {L"x/y", L"x\\y", L"x:y", L"x!y", L""}) {
+        ComPtr<IStream> stream;
+        EXPECT_EQ(root->CreateStream(name, kElementMode, 0, 0, stream.Put()), STG_E_INVALIDNAME) << name;
+        EXPECT_EQ(root->RenameElement(L"any", name), STG_E_INVALIDNAME) << name;
+    }
+    EXPECT_EQ(StgCreateDocfile(L"", kCreateMode, 0, root.Put()), STG_E_INVALIDNAME);
+    EXPECT_EQ(StgCreateDocfile((folder / L"no/such/folder.cfb").c_str(), kCreateMode, 0, root.Put()),
+              STG_E_PATHNOTFOUND);
+}
+
+TEST(StoragePosix, StateBitsTimesAndClassIdsRoundTrip) {
+    TempFolder folder;
+    std::wstring path = folder / L"attributes.cfb";
+    constexpr CLSID kClass = {0x01020304, 0x0506, 0x0708, {9, 10, 11, 12, 13, 14, 15, 16}};
+    const FILETIME created{0x11111111, 0x01D00000};
+    const FILETIME modified{0x22222222, 0x01D10000};
+    {
+        ComPtr<IStorage> root;
+        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+        ASSERT_EQ(root->SetStateBits(0xF0F0, 0xFFFF), S_OK);
+        ComPtr<IStorage> sub;
+        ASSERT_EQ(root->CreateStorage(L"sub", kElementMode, 0, 0, sub.Put()), S_OK);
+        ASSERT_EQ(sub->SetClass(kClass), S_OK);
+        ASSERT_EQ(sub->SetStateBits(0x5, 0xF), S_OK);
+        ASSERT_EQ(root->SetElementTimes(L"sub", &created, nullptr, &modified), S_OK);
+        EXPECT_EQ(root->SetElementTimes(L"missing", &created, nullptr, &modified), STG_E_FILENOTFOUND);
+    }
+    ComPtr<IStorage> root;
+    ASSERT_EQ(Open(path, root), S_OK);
+    STATSTG stat{};
+    ASSERT_EQ(root->Stat(&stat, STATFLAG_NONAME), S_OK);
+    EXPECT_EQ(stat.grfStateBits, 0xF0F0u);
+    ComPtr<IEnumSTATSTG> list;
+    ASSERT_EQ(root->EnumElements(0, nullptr, 0, list.Put()), S_OK);
+    ASSERT_EQ(list->Next(1, &stat, nullptr), S_OK);
+    CoTaskMemFree(stat.pwcsName);
+    EXPECT_TRUE(IsEqualGUID(stat.clsid, kClass));
+    EXPECT_EQ(stat.grfStateBits, 0x5u);
+    EXPECT_EQ(stat.ctime.dwLowDateTime, created.dwLowDateTime);
+    EXPECT_EQ(stat.mtime.dwHighDateTime, modified.dwHighDateTime);
+    EXPECT_EQ(root->SetClass(kClass), STG_E_ACCESSDENIED);
+    EXPECT_EQ(root->SetStateBits(1, 1), STG_E_ACCESSDENIED);
+    EXPECT_EQ(root->Commit(STGC_DEFAULT), STG_E_ACCESSDENIED);
+}
+
+// libgsf links a storage's elements as one list, which its own reader follows recursively:
+// the written directory must be relinked as balanced trees to read back.
+TEST(StoragePosix, ManyElementsInOneStorageReadBack) {
+    TempFolder folder;
+    std::wstring path = folder / L"many.cfb";
+    constexpr int kCount = 5000;
+    {
+        ComPtr<IStorage> root;
+        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+        for (int i = 0; i < kCount; ++i)
+            ASSERT_EQ(PutStream(root.Get(), (L"s" + std::to_wstring(i)).c_str(), std::to_string(i)), S_OK);
+    }
+    ComPtr<IStorage> root;
+    ASSERT_EQ(Open(path, root), S_OK);
+    EXPECT_EQ(ElementsOf(root.Get()).size(), static_cast<std::size_t>(kCount));
+    EXPECT_EQ(ReadStream(root.Get(), L"s4321"), "4321");
+}
+
+TEST(StoragePosix, CommitsKeepPermissionsAndLeaveNothingBeside) {
+    TempFolder folder;
+    std::wstring path = folder / L"kept.cfb";
+    {
+        ComPtr<IStorage> root;
+        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+    }
+    std::filesystem::path file(path);
+    std::filesystem::permissions(file, std::filesystem::perms(0640));
+    {
+        ComPtr<IStorage> root;
+        ASSERT_EQ(Open(path, root, kElementMode), S_OK);
+        ASSERT_EQ(PutStream(root.Get(), L"data", "changed"), S_OK);
+        ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
+    }
+    EXPECT_EQ(std::filesystem::status(file).permissions(), std::filesystem::perms(0640));
+    auto entries = std::distance(std::filesystem::directory_iterator(folder.Root()), {});
+    EXPECT_EQ(entries, 1);
+}
+
+// The bytes the system itself wrote: a class id, streams large and small, an empty one, and a
+// sub-storage with its own class id.
+TEST(StoragePosix, ReadsWhatTheSystemWrites) {
+    std::wstring path =
+        (std::filesystem::path(UT_SOURCE_DIR) / "tests/platform/data/system_written.cfb").wstring();
+    ComPtr<IStorage> root;
+    ASSERT_EQ(Open(path, root), S_OK);
+    constexpr CLSID kRoot = {0x12345678, 0x9ABC, 0xDEF0, {1, 2, 3, 4, 5, 6, 7, 8}};
+    constexpr CLSID kSub = {0xAABBCCDD, 0x1122, 0x3344, {9, 8, 7, 6, 5, 4, 3, 2}};
+    EXPECT_TRUE(IsEqualGUID(ut::test::ClassOf(root.Get()), kRoot));
+    std::vector<ut::test::Element> expected = {{L"Big", STGTY_STREAM, 10000},
+                                               {L"Sub", STGTY_STORAGE, 0},
+                                               {L"Empty", STGTY_STREAM, 0},
+                                               {L"Contents", STGTY_STREAM, 100}};
+    EXPECT_EQ(ElementsOf(root.Get()), expected);
+    EXPECT_EQ(ReadStream(root.Get(), L"Big"), Pattern(10000, 2));
+    EXPECT_EQ(ReadStream(root.Get(), L"Contents"), Pattern(100, 1));
+    ComPtr<IStorage> sub;
+    ASSERT_EQ(root->OpenStorage(L"Sub", nullptr, kReadMode, nullptr, 0, sub.Put()), S_OK);
+    EXPECT_TRUE(IsEqualGUID(ut::test::ClassOf(sub.Get()), kSub));
+    EXPECT_EQ(ReadStream(sub.Get(), L"Inner"), Pattern(5, 4));
+}
+
+// A writer killed while its commit is halfway through the new file: the old file stays whole.
+TEST(StoragePosix, AWriterKilledDuringACommitLeavesTheOldFileIntact) {
+    TempFolder folder;
+    std::wstring path = folder / L"crash.cfb";
+    {
+        ComPtr<IStorage> root;
+        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+        ASSERT_EQ(PutStream(root.Get(), L"old", Pattern(1000, 1)), S_OK);
+    }
+    std::string before = ReadAll(std::filesystem::path(path));
+    pid_t writer = ::fork();
+    ASSERT_GE(writer, 0);
+    if (writer == 0) {
+        ComPtr<IStorage> root;
+        if (FAILED(Open(path, root, kElementMode)))
+            ::_exit(2);
+        for (int i = 0;; ++i) { // commit after commit until killed
+            (void)PutStream(root.Get(), (L"big" + std::to_wstring(i % 4)).c_str(),
+                            std::string(64 << 20, 'x'));
+            (void)root->Commit(STGC_DEFAULT);
+        }
+    }
+    // Wait until a temporary file beside the original holds part of a commit.
+    bool caught = false;
+    for (auto start = std::chrono::steady_clock::now();
+         !caught && std::chrono::steady_clock::now() - start < std::chrono::seconds(120);) {
+        for (const auto& entry : std::filesystem::directory_iterator(folder.Root())) {
+            std::error_code error;
+            auto size = entry.file_size(error);
+            if (entry.path().filename() != "crash.cfb" && !error && size > (1u << 20)) {
+                caught = true;
+                break;
+            }
+        }
+        if (!caught)
+            std::this_thread::sleep_for(std::chrono::microseconds(200));
+    }
+    ::kill(writer, SIGKILL);
+    int status = 0;
+    ::waitpid(writer, &status, 0);
+    ASSERT_TRUE(caught) << "the writer never started a commit";
+    EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
+    std::string after = ReadAll(std::filesystem::path(path));
+    ComPtr<IStorage> root;
+    ASSERT_EQ(Open(path, root), S_OK);
+    EXPECT_EQ(ReadStream(root.Get(), L"old"), Pattern(1000, 1));
+    // Either the old file or one whole commit of the writer, never a mix.
+    if (after == before) {
+        EXPECT_EQ(ElementsOf(root.Get()).size(), 1u);
+    }
+}
+
+} // namespace
