@@ -4,10 +4,14 @@
 #include <ut/catalog.h>
 #include <ut/compare.h>
 #include <ut/export.h>
+#include <ut/families.h>
 #include <ut/frames.h>
+#include <ut/hierarchy.h>
 #include <ut/memory.h>
 #include <ut/mifile.h>
+#include <ut/notify.h>
 #include <ut/persist.h>
 #include <ut/registration.h>
 #include <ut/scene.h>
+#include <ut/shaders.h>
 #include <ut/time.h>

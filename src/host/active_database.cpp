@@ -1,6 +1,9 @@
-// The reference host's active database: the mode it reports.
+// The reference host's active database: its mode, state flags and object-event notifier.
 #include "active_database.h"
 
+#include <algorithm>
+
+#include <ut/platform/detail/boundary.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/testing.h>
 
@@ -8,7 +11,8 @@ namespace ut::host {
 
 std::span<const CGWCOMObject::InterfaceEntry> ActiveDatabase::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        ut::sdk::Entry<ActiveDatabase, IGWActiveDatabase>(IID_IGWActiveDatabase)};
+        ut::sdk::Entry<ActiveDatabase, IGWActiveDatabase>(IID_IGWActiveDatabase),
+        ut::sdk::Entry<ActiveDatabase, IGWActiveDatabaseNotifier>(IID_IGWActiveDatabaseNotifier)};
     return map;
 }
 
@@ -19,6 +23,100 @@ HRESULT ActiveDatabase::GetCurrentMode(ULONG* mode) {
         return hr;
     *mode = mode_;
     return S_OK;
+}
+
+HRESULT ActiveDatabase::SetStateFlags(ULONG flags, BOOL on) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabase::SetStateFlags"); FAILED(hr))
+        return hr;
+    flags_ = on ? (flags_ | flags) : (flags_ & ~flags);
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::TestStateFlags(ULONG flags) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabase::TestStateFlags"); FAILED(hr))
+        return hr;
+    return (flags_ & flags) == flags ? S_OK : S_FALSE;
+}
+
+ActiveDatabase::Advised* ActiveDatabase::Find(IGWObjectEventSink* sink) {
+    auto at = std::find_if(sinks_.begin(), sinks_.end(),
+                           [&](const Advised& one) { return one.sink.Get() == sink; });
+    return at == sinks_.end() ? nullptr : &*at;
+}
+
+HRESULT ActiveDatabase::Enter(IGWObjectEventSink* sink, Advised** entry) {
+    if (!sink)
+        return E_POINTER;
+    return ut::ExportBoundary([&] {
+        *entry = Find(sink);
+        if (!*entry)
+            *entry = &sinks_.emplace_back(Advised{ut::ComPtr<IGWObjectEventSink>(sink)});
+        return S_OK;
+    });
+}
+
+HRESULT ActiveDatabase::Advise(IGWObjectEventSink* sink, ULONG mask) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabaseNotifier::Advise"); FAILED(hr))
+        return hr;
+    Advised* entry = nullptr;
+    if (HRESULT hr = Enter(sink, &entry); FAILED(hr))
+        return hr;
+    entry->mask = mask;
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::AdviseFinalEndLoad(IGWObjectEventSink* sink, ULONG cookie) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabaseNotifier::AdviseFinalEndLoad"); FAILED(hr))
+        return hr;
+    Advised* entry = nullptr;
+    if (HRESULT hr = Enter(sink, &entry); FAILED(hr))
+        return hr;
+    entry->finalEndLoad = true;
+    entry->cookie = cookie;
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::Unadvise(IGWObjectEventSink* sink) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabaseNotifier::Unadvise"); FAILED(hr))
+        return hr;
+    Advised* entry = Find(sink);
+    if (!entry)
+        return S_FALSE;
+    sinks_.erase(sinks_.begin() + (entry - sinks_.data()));
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::Fire(ULONG event, IUnknown* object) {
+    // A sink may withdraw while it is told: the ones to tell are taken first.
+    std::vector<Advised> told;
+    HRESULT copied = ut::ExportBoundary([&] {
+        for (const Advised& one : sinks_)
+            if ((one.mask & event) || (event == GWDB_EVENT_LOAD_SAVE && one.finalEndLoad))
+                told.push_back(one);
+        return S_OK;
+    });
+    if (FAILED(copied))
+        return copied;
+    for (const Advised& one : told) {
+        IGWObjectEventSink& sink = *one.sink;
+        switch (event) {
+        case GWDB_EVENT_ADDED:
+            (void)sink.OnObjectAdded(object); // what a sink answers is not looked at
+            break;
+        case GWDB_EVENT_REMOVED:
+            (void)sink.OnObjectRemoved(object);
+            break;
+        case GWDB_EVENT_ID_CHANGED:
+            (void)sink.OnObjectIDChanged(object);
+            break;
+        default:
+            if (one.mask & event)
+                (void)sink.OnEndLoad();
+            if (one.finalEndLoad)
+                (void)sink.OnFinalEndLoad(one.cookie);
+        }
+    }
+    return told.empty() ? S_FALSE : S_OK;
 }
 
 } // namespace ut::host

@@ -1,6 +1,7 @@
 // The reference host's object families, in the registry.
 #include "families_manager.h"
 
+#include <algorithm>
 #include <new>
 #include <string>
 #include <string_view>
@@ -10,6 +11,8 @@
 #include <ut/platform/process.h>
 #include <ut/sdk/detail/registry.h>
 #include <ut/sdk/testing.h>
+
+#include "host_support.h"
 
 namespace ut::host {
 namespace {
@@ -126,6 +129,24 @@ private:
     std::size_t next_ = 0;
 };
 
+// The identifiers that name the sub-keys of `path`; none when it is missing.
+HRESULT SubKeyIds(const std::wstring& path, std::vector<GUID>& ids) {
+    UniqueHKey key = sdk::OpenKey(HKEY_LOCAL_MACHINE, path.c_str());
+    if (!key)
+        return S_OK;
+    return FromRegistry(sdk::ForEachSubKey(key.get(), [&](const wchar_t* name) {
+        GUID id{};
+        if (SUCCEEDED(ParseGuid(name, &id)))
+            ids.push_back(id);
+        return true;
+    }));
+}
+
+HRESULT HandOut(std::vector<GUID> ids, IGWEnumGUID** list) {
+    *list = new (std::nothrow) GuidList(std::move(ids));
+    return *list ? S_OK : E_OUTOFMEMORY;
+}
+
 } // namespace
 
 std::span<const CGWCOMObject::InterfaceEntry> FamiliesManager::GetInterfaceMap() const {
@@ -211,6 +232,52 @@ HRESULT FamiliesManager::UnregisterMembers(REFCLSID clsid, ULONG count, const GU
     });
 }
 
+HRESULT FamiliesManager::EnumFamilies(IGWEnumGUID** families) {
+    if (!families)
+        return E_POINTER;
+    *families = nullptr;
+    return Read("IGWFamiliesManager::EnumFamilies", [&] {
+        std::vector<GUID> ids;
+        HRESULT hr = SubKeyIds(sdk::kFamiliesBranch, ids);
+        return FAILED(hr) ? hr : HandOut(std::move(ids), families);
+    });
+}
+
+HRESULT FamiliesManager::GetFamilyName(REFGUID family, LPOLESTR* name) {
+    if (!name)
+        return E_POINTER;
+    *name = nullptr;
+    return Read("IGWFamiliesManager::GetFamilyName", [&] {
+        UniqueHKey key = sdk::OpenKey(HKEY_LOCAL_MACHINE, FamilyKey(family).c_str());
+        if (!key)
+            return DISP_E_MEMBERNOTFOUND;
+        std::wstring kind;
+        (void)sdk::ReadText(key.get(), L"Kind", kind); // a family with members only has no kind
+        return CopyToTaskMemory(kind, name);
+    });
+}
+
+HRESULT FamiliesManager::GetClassFamilies(REFCLSID clsid, ULONG capacity, GUID* families, ULONG* count) {
+    if (!count)
+        return E_POINTER;
+    *count = 0;
+    return Read("IGWFamiliesManager::GetClassFamilies", [&] {
+        std::vector<GUID> all;
+        if (HRESULT hr = SubKeyIds(sdk::kFamiliesBranch, all); FAILED(hr))
+            return hr;
+        ULONG found = 0;
+        for (const GUID& family : all) {
+            if (!sdk::OpenKey(HKEY_LOCAL_MACHINE, MemberKey(family, clsid).c_str()))
+                continue;
+            if (families && found < capacity)
+                families[found] = family;
+            ++found;
+        }
+        *count = families ? std::min(found, capacity) : found;
+        return S_OK;
+    });
+}
+
 HRESULT FamiliesManager::EnumMembers(REFGUID family, IGWEnumGUID** members) {
     if (!members)
         return E_POINTER;
@@ -219,18 +286,8 @@ HRESULT FamiliesManager::EnumMembers(REFGUID family, IGWEnumGUID** members) {
         return E_INVALIDARG;
     return Read("IGWFamiliesManager::EnumMembers", [&] {
         std::vector<GUID> ids;
-        if (UniqueHKey key = sdk::OpenKey(HKEY_LOCAL_MACHINE, MembersKey(family).c_str())) {
-            LONG listed = sdk::ForEachSubKey(key.get(), [&](const wchar_t* name) {
-                GUID id{};
-                if (SUCCEEDED(ParseGuid(name, &id)))
-                    ids.push_back(id);
-                return true;
-            });
-            if (listed != ERROR_SUCCESS)
-                return FromRegistry(listed);
-        }
-        *members = new (std::nothrow) GuidList(std::move(ids));
-        return *members ? S_OK : E_OUTOFMEMORY;
+        HRESULT hr = SubKeyIds(MembersKey(family), ids);
+        return FAILED(hr) ? hr : HandOut(std::move(ids), members);
     });
 }
 

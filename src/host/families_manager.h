@@ -24,6 +24,10 @@ public:
                                                 HINSTANCE module) override;
     HRESULT STDMETHODCALLTYPE EnumMembers(REFGUID family, IGWEnumGUID** members) override;
     HRESULT STDMETHODCALLTYPE IsMember(REFCLSID clsid, REFGUID family) override;
+    HRESULT STDMETHODCALLTYPE EnumFamilies(IGWEnumGUID** families) override;
+    HRESULT STDMETHODCALLTYPE GetFamilyName(REFGUID family, LPOLESTR* name) override;
+    HRESULT STDMETHODCALLTYPE GetClassFamilies(REFCLSID clsid, ULONG capacity, GUID* families,
+                                               ULONG* count) override;
 };
 
 } // namespace ut::host

@@ -144,4 +144,40 @@ HRESULT HandOutList(const std::vector<IUnknown*>& objects, I3DList** list) {
     return objects.empty() ? S_FALSE : S_OK;
 }
 
+namespace {
+
+class ObjectEnum final : public ut::sdk::ComObject<IGWEnumObjects> {
+public:
+    explicit ObjectEnum(std::vector<ut::ComPtr<IUnknown>> objects) : objects_(std::move(objects)) {}
+
+    std::span<const InterfaceEntry> GetInterfaceMap() const override {
+        static const InterfaceEntry map[] = {ut::sdk::Entry<ObjectEnum, IGWEnumObjects>(IID_IGWEnumObjects)};
+        return map;
+    }
+    HRESULT STDMETHODCALLTYPE Next(IUnknown** object) override {
+        if (!object)
+            return E_POINTER;
+        *object = nullptr;
+        if (HRESULT hr = ut::sdk::CheckHostFault("IGWEnumObjects::Next"); FAILED(hr))
+            return hr;
+        if (next_ == objects_.size())
+            return S_FALSE;
+        *object = ut::ComPtr<IUnknown>(objects_[next_++]).Detach();
+        return S_OK;
+    }
+
+private:
+    std::vector<ut::ComPtr<IUnknown>> objects_;
+    std::size_t next_ = 0;
+};
+
+} // namespace
+
+HRESULT HandOutObjects(std::vector<ut::ComPtr<IUnknown>> objects, IGWEnumObjects** enumeration) {
+    if (!enumeration)
+        return E_POINTER;
+    *enumeration = Make<ObjectEnum>(std::move(objects)).Detach();
+    return *enumeration ? S_OK : E_OUTOFMEMORY;
+}
+
 } // namespace ut::host

@@ -1,10 +1,12 @@
 // The reference host's lists: element references that point at objects (or components in them),
-// the creatable list that holds them in order, and the enumeration of a list.
+// the creatable list that holds them in order, the enumeration of a list, and objects handed out
+// one at a time.
 #pragma once
 
 #include <vector>
 
 #include <ut/sdk/comobject.h>
+#include <ut/sdk/components.h>
 #include <ut/sdk/list.h>
 #include <ut/sdk/scene.h>
 
@@ -53,5 +55,7 @@ private:
 // A new list of `objects` in order, handed out through `list` (cleared first); S_FALSE when it
 // is empty.
 HRESULT HandOutList(const std::vector<IUnknown*>& objects, I3DList** list);
+// Hands `objects` out one at a time through `objects` (cleared first).
+HRESULT HandOutObjects(std::vector<ut::ComPtr<IUnknown>> objects, IGWEnumObjects** enumeration);
 
 } // namespace ut::host

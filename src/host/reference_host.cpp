@@ -95,6 +95,7 @@ HRESULT ReferenceHost::InstallScene(const Settings& settings) {
     InstallService(CLSID_GWDeleteAllBracket, asUnknown(Make<DeleteAllBracket>()));
     InstallService(CLSID_GWViewerControllerFactory, asUnknown(Make<ViewerControllerFactory>()));
     InstallService(CLSID_GWSetValueProxy, asUnknown(Make<SetValueProxy>()));
+    InstallService(CLSID_GWParamDict, asUnknown(Make<ParamDictionary>(settings.parameterAliases)));
     ut::ComPtr<IClassFactory> lists;
     Record(ut::sdk::CreateClassFactory(&ut::sdk::NewObject<List>, lists.Put()));
     InstallClass(CLSID_3DList, lists.Get());

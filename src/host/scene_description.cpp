@@ -114,7 +114,8 @@ PropertySetDescription ReadPropertySet(const Json& json, const std::string& path
 }
 
 ObjectDescription ReadObject(const Json& json, const std::string& path) {
-    OnlyKeys(json, path, {"name", "model", "selected", "hidden", "families", "properties", "children"});
+    OnlyKeys(json, path,
+             {"name", "model", "selected", "hidden", "families", "properties", "children", "references"});
     ObjectDescription object;
     Optional(json, "name", path,
              [&](const Json& value, const std::string& at) { object.name = Text(value, at); });
@@ -127,6 +128,8 @@ ObjectDescription ReadObject(const Json& json, const std::string& path) {
     Each(json, "families", path, object.families, Guid);
     Each(json, "properties", path, object.properties, ReadPropertySet);
     Each(json, "children", path, object.children, ReadObject);
+    Optional(json, "references", path,
+             [&](const Json& value, const std::string& at) { object.references = Text(value, at); });
     return object;
 }
 
@@ -217,6 +220,8 @@ Json WriteObject(const ObjectDescription& object) {
     PutEach(json, "families", object.families, GuidText);
     PutEach(json, "properties", object.properties, WritePropertySet);
     PutEach(json, "children", object.children, WriteObject);
+    if (!object.references.empty())
+        json["references"] = Utf8(object.references);
     return json;
 }
 

@@ -2,6 +2,8 @@
 #include "scene_manager.h"
 
 #include <ut/platform/detail/boundary.h>
+#include <ut/sdk/database.h>
+#include <ut/sdk/objects.h>
 #include <ut/sdk/testing.h>
 
 #include "host_support.h"
@@ -141,7 +143,8 @@ HRESULT Scene::GetModel(IUnknown** model) {
 std::span<const CGWCOMObject::InterfaceEntry> SceneManager::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
         ut::sdk::Entry<SceneManager, I3DSceneManager>(IID_I3DSceneManager),
-        ut::sdk::Entry<SceneManager, IGWManagerRegistry>(IID_IGWManagerRegistry)};
+        ut::sdk::Entry<SceneManager, IGWManagerRegistry>(IID_IGWManagerRegistry),
+        ut::sdk::Entry<SceneManager, IGWHierarchyRoots>(IID_IGWHierarchyRoots)};
     return map;
 }
 
@@ -220,7 +223,27 @@ HRESULT SceneManager::RemoveObject(I3DObject* object) {
     if (!own->InScene())
         return S_FALSE;
     own->Detach();
+    ut::ComPtr<IGWActiveDatabaseNotifier> database;
+    if (SUCCEEDED(
+            GWQueryGenericObject(CLSID_GWActiveDatabase, IID_IGWActiveDatabaseNotifier, database.PutVoid())))
+        (void)database->Fire(GWDB_EVENT_REMOVED,
+                             static_cast<I3DObject*>(own.Get())); // told or not, it is gone
     return S_OK;
+}
+
+HRESULT SceneManager::GetHierarchyRoot(I3DObject* object, I3DObject** root) {
+    if (!root)
+        return E_POINTER;
+    *root = nullptr;
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWHierarchyRoots::GetHierarchyRoot"); FAILED(hr))
+        return hr;
+    ut::ComPtr<SceneObject> own = SceneObject::Own(object);
+    if (!own)
+        return E_INVALIDARG;
+    SceneObject* top = own.Get();
+    while (top->Parent() && !(scene_ && top->Parent() == &scene_->Root()))
+        top = top->Parent();
+    return top->QueryInterface(IID_I3DObject, reinterpret_cast<void**>(root));
 }
 
 HRESULT SceneManager::DeleteAll(int) {

@@ -10,6 +10,7 @@
 
 #include <ut/host/reference_scene.h>
 #include <ut/sdk/comobject.h>
+#include <ut/sdk/hierarchy.h>
 #include <ut/sdk/scene.h>
 
 #include "folder.h"
@@ -41,7 +42,7 @@ private:
     std::vector<std::pair<GUID, ut::ComPtr<Folder>>> containers_;
 };
 
-class SceneManager final : public ut::sdk::ComObject<I3DSceneManager, IGWManagerRegistry> {
+class SceneManager final : public ut::sdk::ComObject<I3DSceneManager, IGWManagerRegistry, IGWHierarchyRoots> {
 public:
     explicit SceneManager(ut::ComPtr<Scene> scene) : scene_(std::move(scene)) {}
 
@@ -63,6 +64,10 @@ public:
 
     HRESULT STDMETHODCALLTYPE FindManager(REFGUID id, REFIID iid, void** manager) override;
     HRESULT STDMETHODCALLTYPE RegisterManager(REFGUID id, IUnknown* manager) override;
+
+    // The object's ancestor right below the scene's root (the object itself when it is there); for
+    // an object in no scene, the top of its own hierarchy.
+    HRESULT STDMETHODCALLTYPE GetHierarchyRoot(I3DObject* object, I3DObject** root) override;
 
     Scene* CurrentScene() const { return scene_.Get(); }
     LONG NotificationMode() const { return notificationMode_; }

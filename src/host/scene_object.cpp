@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <map>
 
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/testing.h>
@@ -42,12 +43,51 @@ ULONG FlagsOf(const ObjectDescription& description) {
 
 } // namespace
 
+namespace {
+
+// Every live object by its serial number, for moves to address objects by number.
+std::map<ULONG, SceneObject*>& Serials() {
+    static std::map<ULONG, SceneObject*> serials;
+    return serials;
+}
+ULONG nextSerial = 1;
+constexpr BYTE kMovedObject = 4;
+constexpr ULONG kModelNode = 1;
+constexpr LONG kPresentParent = -2;
+
+} // namespace
+
+SceneObject::SceneObject(std::wstring name, bool model)
+    : name_(std::move(name)), model_(model), serial_(nextSerial++) {
+    Serials()[serial_] = this;
+}
+
+SceneObject::~SceneObject() {
+    RemoveChildren();
+    Serials().erase(serial_);
+}
+
+SceneObject* SceneObject::BySerial(ULONG serial) {
+    auto found = Serials().find(serial);
+    return found == Serials().end() ? nullptr : found->second;
+}
+
+bool SceneObject::IsWithin(const SceneObject* ancestor) const {
+    for (const SceneObject* at = this; at; at = at->parent_)
+        if (at == ancestor)
+            return true;
+    return false;
+}
+
 ut::ComPtr<SceneObject> SceneObject::Build(const ObjectDescription& description) {
     ut::ComPtr<SceneObject> object = Make<SceneObject>(description.name, description.model);
     if (!object)
         return object;
     object->flags_ = FlagsOf(description);
     object->families_ = description.families;
+    object->references_ = description.references;
+    object->extent_ = description.extent;
+    object->position_ = description.position;
     if (!description.properties.empty()) {
         object->sets_ = Make<PropertySet>();
         if (!object->sets_ || !AddPropertySets(description.properties, object->Sets()))
@@ -68,7 +108,10 @@ ObjectDescription SceneObject::Describe() const {
                                   (flags_ & GWACTIVEDATA_HIDDEN) != 0,
                                   families_,
                                   DescribePropertySets(Sets()),
-                                  {}};
+                                  {},
+                                  references_,
+                                  extent_,
+                                  position_};
     for (const ut::ComPtr<SceneObject>& child : children_)
         description.children.push_back(child->Describe());
     return description;
@@ -87,6 +130,10 @@ std::span<const CGWCOMObject::InterfaceEntry> SceneObject::GetInterfaceMap() con
         ut::sdk::Entry<SceneObject, IGWPropertyOwner>(IID_IGWPropertyOwner),
         ut::sdk::Entry<SceneObject, IGWComponentHierarchy>(IID_IGWComponentHierarchy),
         ut::sdk::Entry<SceneObject, IGWActiveData>(IID_IGWActiveData),
+        ut::sdk::Entry<SceneObject, IGWComponentAccess>(IID_IGWComponentAccess),
+        ut::sdk::Entry<SceneObject, IGWValidObject>(IID_IGWValidObject),
+        ut::sdk::Entry<SceneObject, IGWHierarchyNode>(IID_IGWHierarchyNode),
+        ut::sdk::Entry<SceneObject, I3DBoundingBox>(IID_I3DBoundingBox),
         ut::sdk::Entry<SceneObject, SceneObject>(IID_ReferenceSceneObject)};
     static const InterfaceEntry model[] = {
         ut::sdk::Entry<SceneObject, I3DObject>(IID_I3DObject),
@@ -94,6 +141,10 @@ std::span<const CGWCOMObject::InterfaceEntry> SceneObject::GetInterfaceMap() con
         ut::sdk::Entry<SceneObject, IGWPropertyOwner>(IID_IGWPropertyOwner),
         ut::sdk::Entry<SceneObject, IGWComponentHierarchy>(IID_IGWComponentHierarchy),
         ut::sdk::Entry<SceneObject, IGWActiveData>(IID_IGWActiveData),
+        ut::sdk::Entry<SceneObject, IGWComponentAccess>(IID_IGWComponentAccess),
+        ut::sdk::Entry<SceneObject, IGWValidObject>(IID_IGWValidObject),
+        ut::sdk::Entry<SceneObject, IGWHierarchyNode>(IID_IGWHierarchyNode),
+        ut::sdk::Entry<SceneObject, I3DBoundingBox>(IID_I3DBoundingBox),
         ut::sdk::Entry<SceneObject, SceneObject>(IID_ReferenceSceneObject)};
     if (model_)
         return model;
@@ -250,6 +301,18 @@ HRESULT SceneObject::GetNextSibling(const tagGWComponent& component, USHORT, tag
     return S_OK;
 }
 
+HRESULT SceneObject::GetNestedHierarchy(const tagGWComponent& component, REFIID iid, void** nested) {
+    if (!nested)
+        return E_POINTER;
+    *nested = nullptr;
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWComponentHierarchy::GetNestedHierarchy"); FAILED(hr))
+        return hr;
+    SceneObject* model = component.kind == kObject ? Referenced() : nullptr;
+    if (!model)
+        return S_FALSE;
+    return model->QueryInterface(iid, nested);
+}
+
 HRESULT SceneObject::GetFlags(ULONG* flags) {
     if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::GetFlags"); FAILED(hr))
         return hr;
@@ -274,6 +337,171 @@ HRESULT SceneObject::FindParameter(REFGUID id, tagGWComponent* parameter) {
         }
     }
     return DISP_E_MEMBERNOTFOUND;
+}
+
+HRESULT SceneObject::QueryObjects(ULONG query, ULONG, ULONG, REFGUID filter, REFIID iid,
+                                  IGWEnumObjects** objects) {
+    if (!objects)
+        return E_POINTER;
+    *objects = nullptr;
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::QueryObjects"); FAILED(hr))
+        return hr;
+    if (query != GWQUERY_NESTED)
+        return E_INVALIDARG;
+    return ut::ExportBoundary([&] {
+        std::vector<SceneObject*> models;
+        for (const ut::ComPtr<SceneObject>& child : children_)
+            models.push_back(child.Get());
+        if (SceneObject* referenced = Referenced())
+            models.push_back(referenced);
+        std::vector<ut::ComPtr<IUnknown>> answered;
+        for (SceneObject* model : models) {
+            ut::ComPtr<IUnknown> one;
+            if (IsEqualGUID(filter, GUID_NULL) || model->InFamily(filter))
+                if (SUCCEEDED(model->QueryInterface(iid, one.PutVoid())))
+                    answered.push_back(std::move(one));
+        }
+        return HandOutObjects(std::move(answered), objects);
+    });
+}
+
+SceneObject* SceneObject::Referenced() {
+    if (references_.empty())
+        return nullptr;
+    SceneObject* top = this;
+    while (top->parent_)
+        top = top->parent_;
+    SceneObject* found = top->FindByName(references_);
+    return found && found->model_ && found != this ? found : nullptr;
+}
+
+HRESULT SceneObject::IsValid() {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWValidObject::IsValid"); FAILED(hr))
+        return hr;
+    return InScene() ? S_OK : S_FALSE;
+}
+
+HRESULT SceneObject::ResolveObject(IUnknown* object, ULONG* handle) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::ResolveObject"); FAILED(hr))
+        return hr;
+    if (!handle)
+        return E_POINTER;
+    ut::ComPtr<SceneObject> own = Own(object);
+    if (!own)
+        return S_FALSE;
+    *handle = own->serial_;
+    return S_OK;
+}
+
+HRESULT SceneObject::GetComponentRecord(ULONG handle, tagGWComponent* component) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::GetComponentRecord"); FAILED(hr))
+        return hr;
+    if (!component)
+        return E_POINTER;
+    if (!BySerial(handle))
+        return E_INVALIDARG;
+    *component = tagGWComponent{kMovedObject, 4, 0, handle, {}};
+    return S_OK;
+}
+
+HRESULT SceneObject::CheckComponent(const tagGWComponent& component) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::CheckComponent"); FAILED(hr))
+        return hr;
+    SceneObject* object = component.kind == kMovedObject ? BySerial(component.id) : nullptr;
+    return object && object->InScene() ? S_OK : S_FALSE;
+}
+
+HRESULT SceneObject::FollowUp(const tagGWComponent& component, ULONG* handle) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::FollowUp"); FAILED(hr))
+        return hr;
+    if (!handle)
+        return E_POINTER;
+    *handle = component.id;
+    return component.kind == kMovedObject && BySerial(component.id) ? S_OK : E_INVALIDARG;
+}
+
+HRESULT SceneObject::FetchObject(ULONG handle, LONG index, REFIID iid, void** object) {
+    if (!object)
+        return E_POINTER;
+    *object = nullptr;
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::FetchObject"); FAILED(hr))
+        return hr;
+    SceneObject* found = BySerial(handle);
+    if (!found || index != kPresentParent)
+        return E_INVALIDARG;
+    return found->parent_ ? found->parent_->QueryInterface(iid, object) : S_FALSE;
+}
+
+HRESULT SceneObject::MoveComponent(const tagGWComponent& component, LONG destination,
+                                   const tagGWComponent* reference) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWComponentHierarchy::MoveComponent"); FAILED(hr))
+        return hr;
+    ut::ComPtr<SceneObject> moved(component.kind == kMovedObject ? BySerial(component.id) : nullptr);
+    SceneObject* anchor = reference ? BySerial(reference->id) : nullptr;
+    bool relative = destination == GWDEST_BEFORE || destination == GWDEST_AFTER;
+    if (!moved || IsWithin(moved.Get()) || moved->root_ ||
+        (relative && (!anchor || anchor->parent_ != this)) || anchor == moved.Get() ||
+        destination < GWDEST_FIRST || destination > GWDEST_LAST)
+        return E_INVALIDARG;
+    return ut::ExportBoundary([&] {
+        children_.reserve(children_.size() + 1); // the detach below cannot be undone
+        moved->Detach();
+        auto at = destination == GWDEST_FIRST  ? children_.begin()
+                  : destination == GWDEST_LAST ? children_.end()
+                                               : std::find_if(children_.begin(), children_.end(),
+                                                              [&](const auto& child) { return child.Get() == anchor; });
+        if (destination == GWDEST_AFTER)
+            ++at;
+        children_.insert(at, moved);
+        moved->parent_ = this;
+        return S_OK;
+    });
+}
+
+HRESULT SceneObject::GetNodeInfo(tagGWHierNodeInfo* info) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWHierarchyNode::GetNodeInfo"); FAILED(hr))
+        return hr;
+    if (!info)
+        return E_POINTER;
+    info->kind = model_ ? kModelNode : GWHIERNODE_ITEMS;
+    return S_OK;
+}
+
+HRESULT SceneObject::GetBoundingBox(const tagGWTIME*, LONG withChildren, LONG, E3DSpaceTag space,
+                                    const double* matrix, LONG, LONG, C3DBBox* box) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("I3DBoundingBox::GetBoundingBox"); FAILED(hr))
+        return hr;
+    if (!box)
+        return E_POINTER;
+    *box = C3DBBox{};
+    double offset[3] = {0, 0, 0};
+    for (const SceneObject* at = space == E3DSPACE_LOCAL ? nullptr : parent_; at; at = at->parent_)
+        for (std::size_t i = 0; i < 3 && at->position_.size() == 3; ++i)
+            offset[i] += at->position_[i];
+    AddExtents(offset, withChildren != 0, matrix, *box);
+    return box->empty ? S_FALSE : S_OK;
+}
+
+void SceneObject::AddExtents(double (&offset)[3], bool withChildren, const double* matrix,
+                             C3DBBox& box) const {
+    double here[3] = {offset[0], offset[1], offset[2]};
+    for (std::size_t i = 0; i < 3 && position_.size() == 3; ++i)
+        here[i] += position_[i];
+    if (extent_.size() == 6) {
+        for (int corner = 0; corner < 8; ++corner) {
+            double point[3], moved[3];
+            for (int i = 0; i < 3; ++i)
+                point[i] = here[i] + extent_[(corner >> i & 1) ? 3 + i : i];
+            for (int i = 0; i < 3; ++i)
+                moved[i] = matrix ? point[0] * matrix[i] + point[1] * matrix[4 + i] +
+                                        point[2] * matrix[8 + i] + matrix[12 + i]
+                                  : point[i];
+            box.Add(moved);
+        }
+    }
+    if (withChildren)
+        for (const ut::ComPtr<SceneObject>& child : children_)
+            child->AddExtents(here, true, matrix, box);
 }
 
 bool SceneObject::InFamily(REFGUID family) const {

@@ -12,6 +12,8 @@
 #include <ut/host/reference_scene.h>
 #include <ut/sdk/comobject.h>
 #include <ut/sdk/components.h>
+#include <ut/sdk/curves.h>
+#include <ut/sdk/hierarchy.h>
 #include <ut/sdk/scene.h>
 
 #include "property_set.h"
@@ -19,11 +21,12 @@
 namespace ut::host {
 
 class SceneObject final
-    : public ut::sdk::ComObject<I3DObject, I3DModel, IGWPropertyOwner, IGWComponentHierarchy, IGWActiveData> {
+    : public ut::sdk::ComObject<I3DObject, I3DModel, IGWPropertyOwner, IGWComponentHierarchy, IGWActiveData,
+                                IGWComponentAccess, IGWValidObject, IGWHierarchyNode, I3DBoundingBox> {
 public:
-    SceneObject(std::wstring name, bool model) : name_(std::move(name)), model_(model) {}
+    SceneObject(std::wstring name, bool model);
     // The objects below outlive this one only when someone else holds them; then they have no parent.
-    ~SceneObject() override { RemoveChildren(); }
+    ~SceneObject() override;
 
     // The object `description` describes with everything below it; null when memory ran out.
     static ut::ComPtr<SceneObject> Build(const ObjectDescription& description);
@@ -49,9 +52,36 @@ public:
                                             tagGWComponent* child) override;
     HRESULT STDMETHODCALLTYPE GetNextSibling(const tagGWComponent& component, USHORT depth,
                                              tagGWComponent* sibling) override;
+    // The root component of an object that references a model stands for that model.
+    HRESULT STDMETHODCALLTYPE GetNestedHierarchy(const tagGWComponent& component, REFIID iid,
+                                                 void** nested) override;
 
     HRESULT STDMETHODCALLTYPE GetFlags(ULONG* flags) override;
     HRESULT STDMETHODCALLTYPE FindParameter(REFGUID id, tagGWComponent* parameter) override;
+    // GWQUERY_NESTED: the objects right below this one (each a hierarchy of its own), then the
+    // model it references; `filter` keeps those of that family.
+    HRESULT STDMETHODCALLTYPE QueryObjects(ULONG query, ULONG scope, ULONG depth, REFGUID filter, REFIID iid,
+                                           IGWEnumObjects** objects) override;
+
+    // S_OK while the object is in a scene.
+    HRESULT STDMETHODCALLTYPE IsValid() override;
+
+    // Moves. An object is addressed here by its serial number (a kind-4 component); any object of
+    // the host resolves. A model is a node of kind 1, any other object an item parent (kind 3).
+    HRESULT STDMETHODCALLTYPE MoveComponent(const tagGWComponent& component, LONG destination,
+                                            const tagGWComponent* reference) override;
+    HRESULT STDMETHODCALLTYPE ResolveObject(IUnknown* object, ULONG* handle) override;
+    HRESULT STDMETHODCALLTYPE GetComponentRecord(ULONG handle, tagGWComponent* component) override;
+    HRESULT STDMETHODCALLTYPE CheckComponent(const tagGWComponent& component) override;
+    HRESULT STDMETHODCALLTYPE FollowUp(const tagGWComponent& component, ULONG* handle) override;
+    HRESULT STDMETHODCALLTYPE FetchObject(ULONG handle, LONG index, REFIID iid, void** object) override;
+    HRESULT STDMETHODCALLTYPE GetNodeInfo(tagGWHierNodeInfo* info) override;
+    // The extents of the object (and, with `withChildren`, of everything below it), each moved by
+    // the positions down to it (from the object itself in E3DSPACE_LOCAL, from the top otherwise),
+    // then through `matrix` (row-major; scale and translation).
+    HRESULT STDMETHODCALLTYPE GetBoundingBox(const tagGWTIME* time, LONG withChildren, LONG flags,
+                                             E3DSpaceTag space, const double* matrix, LONG option, LONG exact,
+                                             C3DBBox* box) override;
 
     // The hierarchy, for the scene manager.
     const std::wstring& Name() const { return name_; }
@@ -73,6 +103,10 @@ public:
     SceneObject* FindByName(std::wstring_view name);
     // Every object below this one, depth first.
     void CollectBelow(std::vector<SceneObject*>& objects);
+    // The object of serial number `serial`; null when there is none.
+    static SceneObject* BySerial(ULONG serial);
+    // Whether this object is `ancestor` or below it.
+    bool IsWithin(const SceneObject* ancestor) const;
 
     // Sets the parameter a kind-3 component addresses.
     HRESULT SetParameter(const tagGWComponent& parameter, const GWVARIANT* value);
@@ -82,12 +116,19 @@ private:
     const std::vector<ut::ComPtr<PropertySet>>& Sets() const;
     // The parameter a kind-3 component addresses; null for any other address.
     ParameterDescription* ParameterAt(const tagGWComponent& component);
+    void AddExtents(double (&offset)[3], bool withChildren, const double* matrix, C3DBBox& box) const;
+    // The model this object references; null when it references none or the name is not a model.
+    SceneObject* Referenced();
 
     std::wstring name_;
     bool model_;
     bool root_ = false;
     ULONG flags_ = 0;
     std::vector<GUID> families_;
+    std::wstring references_;
+    std::vector<double> extent_;
+    std::vector<double> position_;
+    ULONG serial_;
     // The collection that GetPropertySets hands out; its members are the object's sets.
     ut::ComPtr<PropertySet> sets_;
     ut::ComPtr<IUnknown> primitive_;

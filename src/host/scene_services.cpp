@@ -1,8 +1,10 @@
-// The reference host's undo manager, delete-all bracket and views.
+// The reference host's undo manager, delete-all bracket, views and parameter dictionary.
 #include "scene_services.h"
 
 #include <ut/platform/detail/boundary.h>
+#include <ut/sdk/properties.h>
 #include <ut/sdk/testing.h>
+#include <ut/sdk/variant.h>
 
 #include "host_support.h"
 
@@ -18,7 +20,57 @@ public:
     }
 };
 
+// A dictionary entry: only its alias parameter can be read.
+class DictionaryEntry final : public ut::sdk::ComObject<IGWProperties> {
+public:
+    explicit DictionaryEntry(const GUID& alias) : alias_(alias) {}
+
+    std::span<const InterfaceEntry> GetInterfaceMap() const override {
+        static const InterfaceEntry map[] = {
+            ut::sdk::Entry<DictionaryEntry, IGWProperties>(IID_IGWProperties)};
+        return map;
+    }
+    HRESULT STDMETHODCALLTYPE GetParameterValue(REFGUID id, GWVARIANT* value) override {
+        if (HRESULT hr = ut::sdk::CheckHostFault("IGWProperties::GetParameterValue"); FAILED(hr))
+            return hr;
+        if (!value)
+            return E_POINTER;
+        return IsEqualGUID(id, GUID_GWParamAlias) ? GWVariantSetGUID(value, alias_) : DISP_E_MEMBERNOTFOUND;
+    }
+    HRESULT STDMETHODCALLTYPE SetValue(const tagGWREQUEST*, const GWVARIANT*) override { return E_NOTIMPL; }
+    HRESULT STDMETHODCALLTYPE Refresh(const tagGWREQUEST*, BOOL, LONG, LONG) override { return E_NOTIMPL; }
+    HRESULT STDMETHODCALLTYPE GetProperty(REFGUID, GWVARIANT*, LONG) override { return E_NOTIMPL; }
+    HRESULT STDMETHODCALLTYPE CountMembers(REFGUID, ULONG*) override { return E_NOTIMPL; }
+    HRESULT STDMETHODCALLTYPE GetMembers(REFGUID, ULONG, ULONG, IGWProperties**) override {
+        return E_NOTIMPL;
+    }
+    HRESULT STDMETHODCALLTYPE EnumProperties(ULONG, IEnumGWProperties**) override { return E_NOTIMPL; }
+
+private:
+    GUID alias_;
+};
+
 } // namespace
+
+std::span<const CGWCOMObject::InterfaceEntry> ParamDictionary::GetInterfaceMap() const {
+    static const InterfaceEntry map[] = {ut::sdk::Entry<ParamDictionary, IGWParamDict>(IID_IGWParamDict)};
+    return map;
+}
+
+HRESULT ParamDictionary::FindEntry(REFGUID id, IGWProperties** entry) {
+    if (!entry)
+        return E_POINTER;
+    *entry = nullptr;
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWParamDict::FindEntry"); FAILED(hr))
+        return hr;
+    for (const auto& [parameter, alias] : aliases_) {
+        if (IsEqualGUID(parameter, id)) {
+            *entry = Make<DictionaryEntry>(alias).Detach();
+            return *entry ? S_OK : E_OUTOFMEMORY;
+        }
+    }
+    return DISP_E_MEMBERNOTFOUND;
+}
 
 std::span<const CGWCOMObject::InterfaceEntry> UndoManager::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {ut::sdk::Entry<UndoManager, IGWUndoManager>(IID_IGWUndoManager)};

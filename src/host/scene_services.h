@@ -1,5 +1,6 @@
 // The reference host's editing services around the scene: the undo manager with its complex-undo
-// steps, the delete-all bracket, the view manager and the factory of viewer controllers.
+// steps, the delete-all bracket, the view manager, the factory of viewer controllers and the
+// parameter dictionary.
 #pragma once
 
 #include <optional>
@@ -7,6 +8,7 @@
 #include <vector>
 
 #include <ut/sdk/comobject.h>
+#include <ut/sdk/components.h>
 #include <ut/sdk/scene.h>
 #include <ut/sdk/undo.h>
 #include <ut/sdk/views.h>
@@ -27,6 +29,20 @@ public:
 private:
     std::optional<std::wstring> open_;
     std::vector<std::wstring> steps_;
+};
+
+// Knows the parameters that are also known by another id: the entry of such a parameter answers
+// that id (a GW_VT_GUID) as its GUID_GWParamAlias parameter; other ids have no entry.
+class ParamDictionary final : public ut::sdk::ComObject<IGWParamDict> {
+public:
+    explicit ParamDictionary(std::vector<std::pair<GUID, GUID>> aliases) : aliases_(std::move(aliases)) {}
+
+    std::span<const InterfaceEntry> GetInterfaceMap() const override;
+
+    HRESULT STDMETHODCALLTYPE FindEntry(REFGUID id, IGWProperties** entry) override;
+
+private:
+    std::vector<std::pair<GUID, GUID>> aliases_;
 };
 
 // Counts the brackets open; an End without a Begin is refused.

@@ -1,4 +1,5 @@
-// GWGetSetValueProxy: the application's set-value proxy, found among its services.
+// GWGetSetValueProxy and GWGetParamDict: the application's set-value proxy and parameter
+// dictionary, found among its services.
 #include <ut/sdk/components.h>
 #include <ut/sdk/objects.h>
 
@@ -13,4 +14,14 @@ HRESULT GWGetSetValueProxy(IGWComponentHierarchy* hierarchy, REFIID iid, void** 
     if (HRESULT hr = GWQueryGenericObject(CLSID_GWSetValueProxy, found.PutVoid()); FAILED(hr))
         return hr;
     return found->QueryInterface(iid, proxy);
+}
+
+HRESULT GWGetParamDict(REFIID iid, void** dict, IUnknown*) {
+    if (!dict)
+        return E_POINTER;
+    *dict = nullptr;
+    ut::ComPtr<IUnknown> found;
+    if (HRESULT hr = GWQueryGenericObject(CLSID_GWParamDict, found.PutVoid()); FAILED(hr))
+        return hr;
+    return found->QueryInterface(iid, dict);
 }

@@ -55,6 +55,14 @@ inline std::string Result(HRESULT hr) {
     return std::to_string(hr);
 }
 
+// ASCII text of a wide name, for messages and comparisons.
+inline std::string Narrow(const wchar_t* text) {
+    std::string narrow;
+    for (; text && *text; ++text)
+        narrow += static_cast<char>(*text);
+    return narrow;
+}
+
 // "set" or "null" for an out-parameter; what it holds is released.
 template <class Interface>
 std::string Held(Interface*& out) {

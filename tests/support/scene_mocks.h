@@ -9,7 +9,11 @@
 
 #include <ut/sdk/components.h>
 #include <ut/sdk/content.h>
+#include <ut/sdk/curves.h>
+#include <ut/sdk/database.h>
+#include <ut/sdk/hierarchy.h>
 #include <ut/sdk/list.h>
+#include <ut/sdk/notify.h>
 #include <ut/sdk/play.h>
 #include <ut/sdk/presets.h>
 #include <ut/sdk/properties.h>
@@ -126,11 +130,59 @@ struct MockComponentHierarchy : ComMock<IGWComponentHierarchy> {
     UT_MOCK(HRESULT, GetComponentGuid, (const tagGWComponent&, GUID*));
     UT_MOCK(HRESULT, GetFirstChild, (const tagGWComponent&, USHORT, tagGWComponent*));
     UT_MOCK(HRESULT, GetNextSibling, (const tagGWComponent&, USHORT, tagGWComponent*));
+    UT_MOCK(HRESULT, GetNestedHierarchy, (const tagGWComponent&, REFIID, void**));
+    UT_MOCK(HRESULT, MoveComponent, (const tagGWComponent&, LONG, const tagGWComponent*));
 };
 
 struct MockActiveData : ComMock<IGWActiveData> {
     UT_MOCK(HRESULT, GetFlags, (ULONG*));
     UT_MOCK(HRESULT, FindParameter, (REFGUID, tagGWComponent*));
+    UT_MOCK(HRESULT, QueryObjects, (ULONG, ULONG, ULONG, REFGUID, REFIID, IGWEnumObjects**));
+    UT_MOCK(HRESULT, ResolveObject, (IUnknown*, ULONG*));
+    UT_MOCK(HRESULT, GetComponentRecord, (ULONG, tagGWComponent*));
+    UT_MOCK(HRESULT, CheckComponent, (const tagGWComponent&));
+    UT_MOCK(HRESULT, FollowUp, (const tagGWComponent&, ULONG*));
+    UT_MOCK(HRESULT, FetchObject, (ULONG, LONG, REFIID, void**));
+};
+
+struct MockHierarchyNode : ComMock<IGWHierarchyNode> {
+    UT_MOCK(HRESULT, GetNodeInfo, (tagGWHierNodeInfo*));
+};
+
+struct MockPersist : ComMock<IPersist> {
+    MockPersist() : ComMock(IID_IPersist) {}
+    UT_MOCK(HRESULT, GetClassID, (CLSID*));
+};
+
+struct MockView : ComMock<I3DView> {
+    UT_MOCK(HRESULT, GetObjectBoundingBox,
+            (const tagGWTIME*, IUnknown*, LONG, E3DSpaceTag, const double*, LONG, C3DBBox*));
+};
+
+struct MockFCurve : ComMock<IFCurve> {
+    UT_MOCK(HRESULT, GetParentObject, (IUnknown**));
+};
+
+struct MockEventSink : ComMock<IGWObjectEventSink> {
+    UT_MOCK(HRESULT, OnObjectAdded, (IUnknown*));
+    UT_MOCK(HRESULT, OnObjectRemoved, (IUnknown*));
+    UT_MOCK(HRESULT, OnObjectIDChanged, (IUnknown*));
+    UT_MOCK(HRESULT, OnBeginLoad, ());
+    UT_MOCK(HRESULT, OnBeginSave, ());
+    UT_MOCK(HRESULT, OnEndLoad, ());
+    UT_MOCK(HRESULT, OnEndSave, ());
+    UT_MOCK(HRESULT, OnFinalEndLoad, (ULONG));
+};
+
+struct MockPropertySink : ComMock<IGwPropertyNotifySink> {
+    UT_MOCK(HRESULT, OnPropertyNotify,
+            (ULONG, REFGUID, const VARIANT*, IUnknown*, const GWPARAMS*, USHORT, USHORT));
+};
+
+struct MockNotificationService : ComMock<IGWNotificationService> {
+    UT_MOCK(HRESULT, Advise, (const wchar_t*, IGwNotifySink*));
+    UT_MOCK(HRESULT, Unadvise, (const wchar_t*, IGwNotifySink*));
+    UT_MOCK(HRESULT, Broadcast, (const wchar_t*, ULONG, const VARIANT*));
 };
 
 struct MockSetValueProxy : ComMock<IGWSetValueProxy> {

@@ -4,6 +4,7 @@
 #pragma once
 
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <ut/host/reference_scene.h>
@@ -44,6 +45,8 @@ struct Settings {
     // The property classes the host can create (empty property sets of the class), as the scene
     // does when a scene property is asked for that it lacks.
     std::vector<CLSID> propertyClasses = {GUID_GWTimeMappingProperty};
+    // The parameter dictionary: parameters (by id) that are also known by a second id.
+    std::vector<std::pair<GUID, GUID>> parameterAliases = {};
 };
 
 class SceneManager;

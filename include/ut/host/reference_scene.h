@@ -53,6 +53,13 @@ struct ObjectDescription {
     std::vector<GUID> families = {};
     std::vector<PropertySetDescription> properties = {};
     std::vector<ObjectDescription> children = {};
+    // The name of a model elsewhere in the scene that this object references: its hierarchy is
+    // nested in this object's, so that a model referenced twice is reached twice.
+    std::wstring references = {};
+    // The object's own extent (minimum x, y, z, then maximum x, y, z; none when empty) and its
+    // position relative to its parent. Set in code only: the JSON form leaves them out.
+    std::vector<double> extent = {};
+    std::vector<double> position = {};
 };
 
 // The member names of the scene's containers and of the content container's folders.

@@ -65,6 +65,15 @@ struct IGWFamiliesManager : IUnknown {
     virtual HRESULT STDMETHODCALLTYPE EnumMembers(REFGUID family, IGWEnumGUID** members) = 0;
     // S_OK when `clsid` is a member of `family`, S_FALSE when it is not.
     virtual HRESULT STDMETHODCALLTYPE IsMember(REFCLSID clsid, REFGUID family) = 0;
+    // Every family there is (described, or with members only), in the registry's order.
+    virtual HRESULT STDMETHODCALLTYPE EnumFamilies(IGWEnumGUID** families) = 0;
+    // The family's name in task memory that the caller frees: the kind text it was described
+    // with, empty for a family with members only. DISP_E_MEMBERNOTFOUND for an unknown family.
+    virtual HRESULT STDMETHODCALLTYPE GetFamilyName(REFGUID family, LPOLESTR* name) = 0;
+    // The families `clsid` is a member of. With a null `families` *count is how many there are;
+    // otherwise up to `capacity` of them are copied and *count says how many.
+    virtual HRESULT STDMETHODCALLTYPE GetClassFamilies(REFCLSID clsid, ULONG capacity, GUID* families,
+                                                       ULONG* count) = 0;
 
 protected:
     ~IGWFamiliesManager() = default;

@@ -1,11 +1,14 @@
 // The application's named notifications: a sink interface that receives them, and the service
-// that sinks advise by notification name and that broadcasts to them.
+// that sinks advise by notification name and that broadcasts to them; and the property
+// notifications that a property owner sends to its own sinks with GWPropertyNotify.
 #pragma once
 
+#include <map>
 #include <optional>
 
 #include <ut/platform/com.h>
 #include <ut/platform/variant.h>
+#include <ut/sdk/export.h>
 
 // {A06DA230-7691-11CE-90A9-00AA006297D6}
 inline constexpr IID IID_IGwNotifySink = {
@@ -50,10 +53,44 @@ protected:
     ~IGWNotificationService() = default;
 };
 
+// {5B0E3F6C-7A52-4C4B-8E0D-2C6A4F1B9D31}
+inline constexpr IID IID_IGwPropertyNotifySink = {
+    0x5B0E3F6C, 0x7A52, 0x4C4B, {0x8E, 0x0D, 0x2C, 0x6A, 0x4F, 0x1B, 0x9D, 0x31}};
+
+// The parameters a property notification is about; `ids` holds `count` parameter ids.
+struct GWPARAMS {
+    ULONG count;
+    const GUID* ids;
+};
+
+// What happened to a property.
+inline constexpr ULONG GWPROPERTY_ADDED = 1;
+inline constexpr ULONG GWPROPERTY_CHANGED = 2;
+inline constexpr ULONG GWPROPERTY_REMOVED = 3;
+
+struct IGwPropertyNotifySink : IUnknown {
+    // `kind` is a GWPROPERTY_*; the rest is what the sender passed on.
+    virtual HRESULT STDMETHODCALLTYPE OnPropertyNotify(ULONG kind, REFGUID property, const VARIANT* value,
+                                                       IUnknown* owner, const GWPARAMS* parameters,
+                                                       USHORT first, USHORT second) = 0;
+
+protected:
+    ~IGwPropertyNotifySink() = default;
+};
+
 template <>
 struct ut::InterfaceId<IGwNotifySink> : ut::Iid<IID_IGwNotifySink> {};
 template <>
+struct ut::InterfaceId<IGwPropertyNotifySink> : ut::Iid<IID_IGwPropertyNotifySink> {};
+template <>
 struct ut::InterfaceId<IGWNotificationService> : ut::Iid<IID_IGWNotificationService> {};
+
+// Tells every sink of `sinks` whose mask (the value it is mapped to: bits 1 << kind, 0 for every
+// kind) takes `kind`, in pointer order. Every sink is told even when one fails: the answer is the
+// first failure, else S_OK, or S_FALSE when no sink was told.
+UT_SDK_API HRESULT GWPropertyNotify(ULONG kind, REFGUID property, const VARIANT* value, IUnknown* owner,
+                                    const GWPARAMS* parameters, USHORT first, USHORT second,
+                                    std::map<IGwPropertyNotifySink*, unsigned long>& sinks);
 
 namespace ut::sdk {
 

@@ -175,6 +175,14 @@ protected:
     ~IUnknown() = default;
 };
 
+// An object that can say its class.
+struct IPersist : IUnknown {
+    virtual HRESULT STDMETHODCALLTYPE GetClassID(CLSID* clsid) = 0;
+
+protected:
+    ~IPersist() = default;
+};
+
 struct IClassFactory : IUnknown {
     virtual HRESULT STDMETHODCALLTYPE CreateInstance(IUnknown* outer, REFIID iid, void** object) = 0;
     virtual HRESULT STDMETHODCALLTYPE LockServer(BOOL lock) = 0;
@@ -184,6 +192,7 @@ protected:
 };
 
 inline constexpr IID IID_IUnknown = {0x00000000, 0x0000, 0x0000, {0xC0, 0, 0, 0, 0, 0, 0, 0x46}};
+inline constexpr IID IID_IPersist = {0x0000010C, 0x0000, 0x0000, {0xC0, 0, 0, 0, 0, 0, 0, 0x46}};
 inline constexpr IID IID_IClassFactory = {0x00000001, 0x0000, 0x0000, {0xC0, 0, 0, 0, 0, 0, 0, 0x46}};
 
 enum CLSCTX : DWORD {

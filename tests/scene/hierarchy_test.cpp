@@ -1,0 +1,183 @@
+// Hierarchy moves on the reference scene (models and item parents) and on containers known by their
+// class, hierarchy roots in and outside a model, and the scene's bounding box.
+#include <string>
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <ut/hierarchy.h>
+#include <ut/scene.h>
+
+#include "support/ref_tracker.h"
+#include "support/scene_mocks.h"
+#include "test_scene.h"
+
+namespace {
+
+using ::testing::_;
+using ::testing::Return;
+using ut::test::Result;
+
+class Hierarchy : public ::testing::Test {
+protected:
+    static ut::host::Settings Scene() {
+        ut::host::Settings settings = ut::test::TestScene();
+        settings.scene.objects[0].position = {10, 0, 0};
+        settings.scene.objects[0].children[0].extent = {-1, -1, -1, 1, 1, 1};
+        settings.scene.objects[0].children[0].position = {0, 2, 0};
+        settings.scene.objects[2].extent = {0, 0, 0, 1, 1, 1};
+        return settings;
+    }
+    ut::ComPtr<I3DObject> Find(std::wstring name) {
+        ut::ComPtr<I3DObject> object;
+        EXPECT_EQ(F3DGet3DObjectFromName(name.data(), object.Put()), S_OK);
+        return object;
+    }
+    std::string Names(const std::vector<ut::host::ObjectDescription>& objects) {
+        std::string names;
+        for (const auto& object : objects)
+            names += ut::test::Narrow(object.name.c_str()) + " ";
+        return names;
+    }
+    ut::test::LiveObjectCheck live;
+    ut::host::ReferenceHost host{Scene()};
+    ut::ComPtr<I3DObject> robot = Find(L"Robot"), arm = Find(L"Arm"), light = Find(L"Light"),
+                          camera = Find(L"Camera1");
+};
+
+TEST_F(Hierarchy, MovesChecksTheirArgumentsInOrderAndMoveUnderModelsAndItems) {
+    ut::ComPtr<I3DObject> rig, root;
+    ASSERT_EQ(KXCreate3DModelObject(L"Rig", IID_I3DObject, rig.PutVoid()), S_OK);
+    ASSERT_EQ(KXGetCurrentSceneModel(IID_I3DObject, root.PutVoid()), S_OK);
+    ut::test::ComMock<IUnknown> marked(IID_IGWNotUnderModel);
+    IUnknown* out = nullptr;
+    const struct {
+        IUnknown* parent;
+        IUnknown* object;
+        LONG destination;
+        IUnknown* reference;
+        std::string expected; // the result and what `out` received
+    } cases[] = {
+        {robot.Get(), nullptr, GWDEST_LAST, nullptr, "E_POINTER null"},
+        {robot.Get(), rig.Get(), GWDEST_AFTER, nullptr, "E_POINTER null"},
+        {nullptr, rig.Get(), GWDEST_LAST, nullptr, "E_POINTER null"},
+        // Under a model only models go; a marked object is an invalid argument, the reference too.
+        {robot.Get(), light.Get(), GWDEST_LAST, nullptr, "E_POINTER null"},
+        {robot.Get(), &marked, GWDEST_LAST, nullptr, "E_INVALIDARG null"},
+        {root.Get(), rig.Get(), GWDEST_BEFORE, &marked, "E_INVALIDARG null"},
+        // A reference is ignored, unchecked, first and last; an unknown destination moves nothing.
+        {robot.Get(), rig.Get(), GWDEST_LAST, &marked, "S_OK null"},
+        {root.Get(), rig.Get(), 4, nullptr, "S_FALSE Robot"},
+        {root.Get(), rig.Get(), GWDEST_BEFORE, robot.Get(), "S_OK Robot"},
+        // Anything goes under an object that holds items; never into what is below it.
+        {arm.Get(), light.Get(), GWDEST_LAST, camera.Get(), "S_OK Shot"},
+        {arm.Get(), camera.Get(), GWDEST_BEFORE, light.Get(), "S_OK Shot"},
+        {arm.Get(), robot.Get(), GWDEST_FIRST, nullptr, "E_INVALIDARG Shot"},
+    };
+    for (const auto& c : cases) {
+        HRESULT hr = KXMoveObjectInHier(c.parent, c.object, static_cast<tagEGWDestination>(c.destination),
+                                        c.reference, &out);
+        LPOLESTR name = nullptr;
+        ut::ComPtr<I3DObject> previous;
+        if (out && SUCCEEDED(out->QueryInterface(IID_I3DObject, previous.PutVoid())))
+            previous->GetName(&name);
+        EXPECT_EQ(Result(hr) + " " + (out ? ut::test::Narrow(name) : "null"), c.expected) << c.destination;
+        CoTaskMemFree(name);
+        if (out)
+            out->Release();
+    }
+    ut::host::SceneDescription scene = host.DescribeScene();
+    EXPECT_EQ(Names(scene.objects), "Rig Robot ");
+    EXPECT_EQ(Names(scene.objects[1].children[0].children), "Camera1 Light ");
+    EXPECT_EQ(marked.Extra(), 0u);
+}
+
+TEST(HierarchyContainers, LayersPassesAndPlainContainersTakeObjectsAsTheyAre) {
+    struct Parent {
+        ut::test::MockPersist persist;
+        ::testing::NiceMock<ut::test::MockActiveData> data;
+        ::testing::NiceMock<ut::test::MockComponentHierarchy> hierarchy;
+    };
+    ut::test::ComMock<IUnknown> object(IID_IUnknown);
+    const GUID other = ut::test::kX;
+    const struct {
+        const GUID* kind;
+        HRESULT resolved;
+        bool withData, withHierarchy;
+        std::string expected;
+    } cases[] = {{&GUID_3DLayerContainer, S_OK, true, true, "S_OK 3"},
+                 {&GUID_3DPassContainer, S_OK, true, true, "S_OK 3"},
+                 {&CLSID_3DPlainContainer, S_OK, true, true, "S_OK 3"},
+                 {&other, S_OK, true, true, "E_INVALIDARG 0"},
+                 {&CLSID_3DPlainContainer, S_OK, false, true, "E_POINTER 0"},
+                 {&CLSID_3DPlainContainer, S_FALSE, true, true, "E_INVALIDARG 0"},
+                 {&CLSID_3DPlainContainer, S_OK, true, false, "E_NOINTERFACE 0"}};
+    for (const auto& c : cases) {
+        Parent parent;
+        EXPECT_CALL(parent.persist, GetClassID(_)).WillRepeatedly([&](CLSID* clsid) {
+            *clsid = *c.kind;
+            return S_OK;
+        });
+        if (c.withData)
+            parent.persist.Also(IID_IGWActiveData, &parent.data);
+        if (c.withHierarchy)
+            parent.data.Also(IID_IGWComponentHierarchy, &parent.hierarchy);
+        ON_CALL(parent.data, ResolveObject(&object, _)).WillByDefault(Return(c.resolved));
+        int moved = 0;
+        ON_CALL(parent.hierarchy, MoveComponent(_, GWDEST_LAST, nullptr)).WillByDefault([&](auto&&...) {
+            moved = 3;
+            return S_OK;
+        });
+        HRESULT hr = KXMoveObjectInHier(&parent.persist, &object, GWDEST_LAST, nullptr, nullptr);
+        EXPECT_EQ(Result(hr) + " " + std::to_string(moved), c.expected) << Result(c.resolved);
+    }
+}
+
+TEST_F(Hierarchy, RootsAreFoundInTheSceneAndBelowAModel) {
+    ut::ComPtr<I3DModel> model;
+    ut::ComPtr<I3DObject> found, rig;
+    ASSERT_EQ(robot.As(model), S_OK);
+    ASSERT_EQ(KXCreate3DModelObject(L"Rig", IID_I3DObject, rig.PutVoid()), S_OK);
+    ASSERT_EQ(KXMoveObjectInHier(arm.Get(), light.Get(), GWDEST_LAST, nullptr, nullptr), S_OK);
+    EXPECT_EQ(KXGet3DObjectHierarchyRoot(light.Get(), found.Put()), S_OK);
+    EXPECT_TRUE(found == robot);
+    EXPECT_EQ(KXGet3DObjectHierarchyRoot(nullptr, found.Put()), E_POINTER);
+    const struct {
+        I3DObject* object;
+        std::string expected;
+    } cases[] = {{arm.Get(), "S_OK Arm"},
+                 {light.Get(), "S_OK Arm"},
+                 {camera.Get(), "E_UNEXPECTED null"},
+                 {rig.Get(), "S_FALSE null"}};
+    for (const auto& c : cases) {
+        I3DObject* root = nullptr;
+        HRESULT hr = KXGet3DObjectHierarchyRootInModel(c.object, model.Get(), &root);
+        LPOLESTR name = nullptr;
+        if (root)
+            root->GetName(&name);
+        EXPECT_EQ(Result(hr) + " " + (root ? ut::test::Narrow(name) : "null"), c.expected);
+        CoTaskMemFree(name);
+        if (root)
+            root->Release();
+    }
+    EXPECT_EQ(KXGet3DObjectHierarchyRootInModel(arm.Get(), nullptr, found.Put()), E_POINTER);
+}
+
+TEST_F(Hierarchy, TheSceneBoxCoversEveryExtentMovedByPositionsAndTheTransform) {
+    C3DTransfo doubled;
+    doubled.SetScale(2, 2, 2);
+    C3DBBox box;
+    EXPECT_EQ(KXGetSceneBBox(nullptr, nullptr, 0, E3DSPACE_GLOBAL, &doubled, 0, nullptr), E_POINTER);
+    ASSERT_EQ(KXGetSceneBBox(nullptr, nullptr, 0, E3DSPACE_GLOBAL, &doubled, 0, &box), S_OK);
+    EXPECT_FALSE(doubled.IsStale());
+    // Arm: 9..11, 1..3, -1..1 at Robot's 10 plus its own 2; Light: the unit cube.
+    EXPECT_EQ(std::vector<double>(box.min, box.min + 3), (std::vector<double>{0, 0, -2}));
+    EXPECT_EQ(std::vector<double>(box.max, box.max + 3), (std::vector<double>{22, 6, 2}));
+    // Through a view, which gets the scene's root and the second integer.
+    ut::test::MockView view;
+    EXPECT_CALL(view, GetObjectBoundingBox(nullptr, _, 1, E3DSPACE_LOCAL, doubled.Matrix(), 7, &box))
+        .WillOnce(Return(S_FALSE));
+    EXPECT_EQ(KXGetSceneBBox(nullptr, &view, 5, E3DSPACE_LOCAL, &doubled, 7, &box), S_FALSE);
+}
+
+} // namespace
