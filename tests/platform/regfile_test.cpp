@@ -85,28 +85,20 @@ TEST_F(RegFile, ImportReadsEveryForm) {
         Value expected;   // of the value "v"
     };
     const Value deleted{ERROR_FILE_NOT_FOUND, REG_NONE, {}};
+    // clang-format off
     const Case cases[] = {
-        {"quoted text with escapes",
-         "[$]\n\"v\"=\"a\\\\b \\\"c\\\" \\n\"\n",
-         {0, REG_SZ, TextBytes(L"a\\b \"c\" \n")}},
+        {"quoted text with escapes", "[$]\n\"v\"=\"a\\\\b \\\"c\\\" \\n\"\n", {0, REG_SZ, TextBytes(L"a\\b \"c\" \n")}},
         {"spaces around =", "[$]\n\"v\" = dword:1\n", {0, REG_DWORD, LittleEndian(1, 4)}},
         {"dword", "[$]\n\"v\"=dword:DeadBeef\n", {0, REG_DWORD, LittleEndian(0xDEADBEEF, 4)}},
-        {"qword",
-         "[$]\n\"v\"=hex(b):08,07,06,05,04,03,02,01\n",
-         {0, REG_QWORD, LittleEndian(0x0102030405060708, 8)}},
-        {"binary over continued lines",
-         "[$]\n\"v\"=hex:01,02,\\\n  03 , 04,\\\n\t05\n",
-         {0, REG_BINARY, Bytes{1, 2, 3, 4, 5}}},
-        {"short root and comments",
-         "; a comment\n[HKCU\\$]\n  ; another\n\"v\"=\"x\"\n",
-         {0, REG_SZ, TextBytes(L"x")}},
+        {"qword", "[$]\n\"v\"=hex(b):08,07,06,05,04,03,02,01\n", {0, REG_QWORD, LittleEndian(0x0102030405060708, 8)}},
+        {"binary over continued lines", "[$]\n\"v\"=hex:01,02,\\\n  03 , 04,\\\n\t05\n", {0, REG_BINARY, Bytes{1, 2, 3, 4, 5}}},
+        {"short root and comments", "; a comment\n[HKCU\\$]\n  ; another\n\"v\"=\"x\"\n", {0, REG_SZ, TextBytes(L"x")}},
         {"CR LF lines", "[$]\r\n\"v\"=\"x\"\r\n", {0, REG_SZ, TextBytes(L"x")}},
         {"value deleted after it was set", "[$]\n\"v\"=\"x\"\n\"v\"=-\n", deleted},
         {"deleting what is not there", "[$]\n\"v\"=-\n[-$\\none]\n", deleted},
-        {"key deleted after it was made",
-         "[$\\k]\n[-$\\k]\n[$]\n\"v\"=\"x\"\n",
-         {0, REG_SZ, TextBytes(L"x")}},
+        {"key deleted after it was made", "[$\\k]\n[-$\\k]\n[$]\n\"v\"=\"x\"\n", {0, REG_SZ, TextBytes(L"x")}},
     };
+    // clang-format on
     for (const Case& c : cases) {
         SCOPED_TRACE(c.label);
         std::string text = "Windows Registry Editor Version 5.00\n\n" + c.body;
@@ -117,9 +109,8 @@ TEST_F(RegFile, ImportReadsEveryForm) {
         ASSERT_EQ(Import(text, &problem), ERROR_SUCCESS)
             << Narrow(problem.message) << " line " << problem.line;
         Value value = QueryValue(scratch_.Get(), L"v");
-        EXPECT_EQ(value.result, c.expected.result);
-        EXPECT_EQ(value.type, c.expected.type);
-        EXPECT_EQ(value.data, c.expected.data);
+        EXPECT_EQ(std::tie(value.result, value.type, value.data),
+                  std::tie(c.expected.result, c.expected.type, c.expected.data));
         EXPECT_FALSE(OpenKey(scratch_.Get(), L"k"));
         ASSERT_EQ(RegDeleteTreeW(scratch_.Get(), nullptr), ERROR_SUCCESS);
     }

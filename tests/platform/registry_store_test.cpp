@@ -23,6 +23,7 @@
 
 #include "registry_helpers.h"
 #include "support/registry_scratch.h"
+#include "support/temp_folder.h"
 
 namespace {
 
@@ -37,19 +38,6 @@ std::string ReadFile(const fs::path& path) {
 void WriteFile(const fs::path& path, const std::string& bytes) {
     std::ofstream(path, std::ios::binary) << bytes;
 }
-
-// A folder of its own in the temporary folder, removed with what it holds.
-struct TemporaryFolder {
-    TemporaryFolder() {
-        std::string pattern = (fs::temp_directory_path() / "ut-registry-XXXXXX").string();
-        path = mkdtemp(pattern.data()) ? pattern : "";
-    }
-    ~TemporaryFolder() {
-        std::error_code ignored;
-        fs::remove_all(path, ignored);
-    }
-    fs::path path;
-};
 
 // Sets (or with null, clears) an environment variable for a scope.
 struct Variable {
@@ -149,8 +137,9 @@ TEST(RegistryStore, AKilledWriterLosesNothingThatHadReturned) {
 }
 
 TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
-    TemporaryFolder folder;
-    fs::path store = folder.path / "store.db";
+    ut::test::TempFolder temp;
+    const fs::path folder = temp.Path();
+    fs::path store = folder / "store.db";
     {
         StoreSwitch use(store);
         ASSERT_EQ(
@@ -158,7 +147,7 @@ TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
             ERROR_SUCCESS);
     }
     // The folder stays open to everyone, so that the reader can keep its shared index there.
-    ASSERT_EQ(chmod(folder.path.c_str(), 01777) | chmod(store.c_str(), 0444), 0);
+    ASSERT_EQ(chmod(folder.c_str(), 01777) | chmod(store.c_str(), 0444), 0);
     std::string before = ReadFile(store);
     Child probe("probe 'Software\\ut-tests\\read-only'", store.string());
     EXPECT_EQ(probe.Line().value_or("no output"), "read=0 create=5 set=5 delete=5");
@@ -167,7 +156,8 @@ TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
 }
 
 TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
-    TemporaryFolder folder;
+    ut::test::TempFolder temp;
+    const fs::path folder = temp.Path();
     auto sql = [](const fs::path& path, const char* statements) {
         sqlite3* db = nullptr;
         sqlite3_open(path.c_str(), &db);
@@ -205,7 +195,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
     };
     for (const auto& [label, make] : cases) {
         SCOPED_TRACE(label);
-        fs::path path = folder.path / (std::string(label) + ".db");
+        fs::path path = folder / (std::string(label) + ".db");
         make(path);
         std::string before = ReadFile(path);
         {
@@ -235,13 +225,14 @@ TEST(RegistryStore, LivesWhereTheEnvironmentSaysAndMakesItsFolders) {
         Variable a("UT_REGISTRY", named), b("XDG_DATA_HOME", data), c("HOME", home);
         EXPECT_EQ(ut::platform::RegistryStorePath(), expected);
     }
-    TemporaryFolder folder;
-    Variable data("XDG_DATA_HOME", folder.path.c_str());
+    ut::test::TempFolder temp;
+    const fs::path folder = temp.Path();
+    Variable data("XDG_DATA_HOME", folder.c_str());
     {
         StoreSwitch use(""); // the default place
         ASSERT_TRUE(CreateKey(HKEY_LOCAL_MACHINE, L"Software\\ut-tests\\placed"));
     }
-    EXPECT_TRUE(fs::is_regular_file(folder.path / "ut" / "registry.db"));
+    EXPECT_TRUE(fs::is_regular_file(folder / "ut" / "registry.db"));
 }
 
 TEST(RegistryStore, ReadsCostTheSameAtEveryStepAndNothingUntilAnotherProcessCommits) {
@@ -272,12 +263,13 @@ TEST(RegistryStore, ReadsCostTheSameAtEveryStepAndNothingUntilAnotherProcessComm
     EXPECT_EQ(name(L"key100005").data, TextBytes(L"name 5"));
     EXPECT_EQ(ut::platform::GetRegistryStoreCounters().statements, statements);
 
-    TemporaryFolder folder;
+    ut::test::TempFolder temp;
+    const fs::path folder = temp.Path();
     std::string path = Narrow(scratch.FullPath()) + "\\hundred";
-    WriteFile(folder.path / "change.reg", "Windows Registry Editor Version 5.00\n\n[" + path +
-                                              "\\key100005]\n\"Name\"=\"changed\"\n[-" + path +
-                                              "\\key100006]\n[" + path + "\\key100000a]\n");
-    ASSERT_EQ(Child("import " + (folder.path / "change.reg").string()).Wait(), 0);
+    WriteFile(folder / "change.reg", "Windows Registry Editor Version 5.00\n\n[" + path +
+                                         "\\key100005]\n\"Name\"=\"changed\"\n[-" + path + "\\key100006]\n[" +
+                                         path + "\\key100000a]\n");
+    ASSERT_EQ(Child("import " + (folder / "change.reg").string()).Wait(), 0);
     EXPECT_EQ(name(L"key100005").data, TextBytes(L"changed"));
     EXPECT_EQ(name(L"key100006").result, ERROR_INVALID_HANDLE); // no key to read from
     std::vector<std::wstring> names = SubKeyNames(list.get());

@@ -30,34 +30,20 @@ LONG Query(HKEY key) {
     DWORD size = 0;
     return RegQueryValueExW(key, L"v", nullptr, nullptr, nullptr, &size);
 }
-LONG Set(HKEY key) {
-    return SetText(key, L"v", L"y");
-}
 LONG List(HKEY key, bool values, DWORD index = 0) {
     wchar_t name[64];
     DWORD length = 64;
     return values ? RegEnumValueW(key, index, name, &length, nullptr, nullptr, nullptr, nullptr)
                   : RegEnumKeyExW(key, index, name, &length, nullptr, nullptr, nullptr, nullptr);
 }
-LONG ListKeys(HKEY key) {
-    return List(key, false);
-}
-LONG ListValues(HKEY key) {
-    return List(key, true);
-}
-LONG DeleteValue(HKEY key) {
-    return RegDeleteValueW(key, L"v");
-}
-LONG OpenSub(HKEY key) {
-    return Open(key, L"sub");
-}
-LONG CreateNew(HKEY key) {
-    return Create(key, L"new");
-}
-LONG DeleteNew(HKEY key) {
-    return RegDeleteKeyW(key, L"new");
-}
 using Call = LONG (*)(HKEY);
+const Call Set = [](HKEY key) { return SetText(key, L"v", L"y"); };
+const Call ListKeys = [](HKEY key) { return List(key, false); };
+const Call ListValues = [](HKEY key) { return List(key, true); };
+const Call DeleteValue = [](HKEY key) { return RegDeleteValueW(key, L"v"); };
+const Call OpenSub = [](HKEY key) { return Open(key, L"sub"); };
+const Call CreateNew = [](HKEY key) { return Create(key, L"new"); };
+const Call DeleteNew = [](HKEY key) { return RegDeleteKeyW(key, L"new"); };
 LONG Info(HKEY key) {
     DWORD subKeys = 0;
     return RegQueryInfoKeyW(key, nullptr, nullptr, nullptr, &subKeys, nullptr, nullptr, nullptr, nullptr,
@@ -134,35 +120,30 @@ TEST_F(Registry, CallsAnswerTheSystemsCodes) {
         LONG (*call)(HKEY);
         LONG expected;
     };
+    // clang-format off
     const Case cases[] = {
         {"open a missing key", KEY_READ, [](HKEY k) { return Open(k, L"missing"); }, ERROR_FILE_NOT_FOUND},
-        {"open below a missing key", KEY_READ, [](HKEY k) { return Open(k, L"missing\\deeper"); },
-         ERROR_FILE_NOT_FOUND},
-        {"open without a result", KEY_READ,
-         [](HKEY k) { return RegOpenKeyExW(k, L"sub", 0, KEY_READ, nullptr); }, ERROR_INVALID_PARAMETER},
-        {"a path that starts with a backslash", KEY_READ, [](HKEY k) { return Create(k, L"\\lead"); },
-         ERROR_BAD_PATHNAME},
+        {"open below a missing key", KEY_READ, [](HKEY k) { return Open(k, L"missing\\deeper"); }, ERROR_FILE_NOT_FOUND},
+        {"open without a result", KEY_READ, [](HKEY k) { return RegOpenKeyExW(k, L"sub", 0, KEY_READ, nullptr); },
+         ERROR_INVALID_PARAMETER},
+        {"a path that starts with a backslash", KEY_READ, [](HKEY k) { return Create(k, L"\\lead"); }, ERROR_BAD_PATHNAME},
         {"query a missing value", KEY_READ, Query, ERROR_FILE_NOT_FOUND},
         {"query data without a byte count", KEY_READ,
-         [](HKEY k) {
-             return RegQueryValueExW(k, L"v", nullptr, nullptr, reinterpret_cast<BYTE*>(&k), nullptr);
-         },
+         [](HKEY k) { return RegQueryValueExW(k, L"v", nullptr, nullptr, reinterpret_cast<BYTE*>(&k), nullptr); },
          ERROR_INVALID_PARAMETER},
-        {"set data from a null pointer", KEY_ALL_ACCESS,
-         [](HKEY k) { return RegSetValueExW(k, L"v", 0, REG_BINARY, nullptr, 4); }, ERROR_NOACCESS},
+        {"set data from a null pointer", KEY_ALL_ACCESS, [](HKEY k) { return RegSetValueExW(k, L"v", 0, REG_BINARY, nullptr, 4); },
+         ERROR_NOACCESS},
         {"delete a missing value", KEY_ALL_ACCESS, DeleteValue, ERROR_FILE_NOT_FOUND},
         {"delete a missing key", KEY_ALL_ACCESS, DeleteNew, ERROR_FILE_NOT_FOUND},
-        {"delete a key without a name", KEY_ALL_ACCESS, [](HKEY k) { return RegDeleteKeyW(k, nullptr); },
-         ERROR_INVALID_PARAMETER},
-        {"delete a root", KEY_ALL_ACCESS, [](HKEY) { return RegDeleteKeyW(HKEY_CURRENT_USER, L""); },
-         ERROR_ACCESS_DENIED},
-        {"list sub-keys past the last", KEY_READ, [](HKEY k) { return List(k, false, 1); },
-         ERROR_NO_MORE_ITEMS},
+        {"delete a key without a name", KEY_ALL_ACCESS, [](HKEY k) { return RegDeleteKeyW(k, nullptr); }, ERROR_INVALID_PARAMETER},
+        {"delete a root", KEY_ALL_ACCESS, [](HKEY) { return RegDeleteKeyW(HKEY_CURRENT_USER, L""); }, ERROR_ACCESS_DENIED},
+        {"list sub-keys past the last", KEY_READ, [](HKEY k) { return List(k, false, 1); }, ERROR_NO_MORE_ITEMS},
         {"list values past the last", KEY_READ, [](HKEY k) { return List(k, true, 1); }, ERROR_NO_MORE_ITEMS},
         {"use a null handle", KEY_READ, [](HKEY) { return Query(nullptr); }, ERROR_INVALID_HANDLE},
         {"close a null handle", KEY_READ, [](HKEY) { return RegCloseKey(nullptr); }, ERROR_INVALID_HANDLE},
         {"close a root", KEY_READ, [](HKEY) { return RegCloseKey(HKEY_LOCAL_MACHINE); }, ERROR_SUCCESS},
     };
+    // clang-format on
     for (const Case& c : cases)
         EXPECT_EQ(c.call(OpenKey(HKEY_CURRENT_USER, scratch_.SubKey(), c.access).get()), c.expected)
             << c.label;

@@ -75,33 +75,22 @@ struct Cleaning {
 
 TEST(CleaningKeys, DropsWhatIsEmptyUpToTheCategory) {
     const std::wstring m = L"Software\\ut\\Modules\\cleaning";
+    const std::wstring cat = m + L"\\Cat", a = cat + L"\\A";
+    // clang-format off
     const Cleaning cases[] = {
-        {"class key and category", {m + L"\\Cat\\A"}, m + L"\\Cat\\A", S_OK, {m}, {m + L"\\Cat"}},
-        {"category with another class",
-         {m + L"\\Cat\\A", m + L"\\Cat\\B"},
-         m + L"\\Cat\\A",
-         S_OK,
-         {m + L"\\Cat\\B"},
-         {m + L"\\Cat\\A"}},
+        {"class key and category", {a}, a, S_OK, {m}, {cat}},
+        {"category with another class", {a, cat + L"\\B"}, a, S_OK, {cat + L"\\B"}, {a}},
         {"deeper keys", {m + L"\\Tool\\List\\Owner"}, m + L"\\Tool\\List\\Owner", S_OK, {m}, {m + L"\\Tool"}},
-        {"a key with a value", {m + L"\\Cat\\A="}, m + L"\\Cat\\A", S_FALSE, {m + L"\\Cat\\A"}, {}},
-        {"a key with a sub-key", {m + L"\\Cat\\A\\X"}, m + L"\\Cat\\A", S_FALSE, {m + L"\\Cat\\A\\X"}, {}},
-        {"a missing key", {m}, m + L"\\Cat", S_FALSE, {m}, {}},
+        {"a key with a value", {a + L"="}, a, S_FALSE, {a}, {}},
+        {"a key with a sub-key", {a + L"\\X"}, a, S_FALSE, {a + L"\\X"}, {}},
+        {"a missing key", {m}, cat, S_FALSE, {m}, {}},
         {"the module's key itself", {m}, m, S_FALSE, {m}, {}},
-        {"a trailing backslash", {m + L"\\Cat"}, m + L"\\Cat\\", S_OK, {m}, {m + L"\\Cat"}},
-        {"the branch in another case",
-         {m + L"\\Cat\\A"},
-         L"software\\UT\\modules\\cleaning\\Cat\\A",
-         S_OK,
-         {m},
-         {m + L"\\Cat"}},
-        {"outside the modules' branch",
-         {L"Software\\ut\\Other\\A"},
-         L"Software\\ut\\Other\\A",
-         S_OK,
-         {L"Software\\ut\\Other"},
-         {L"Software\\ut\\Other\\A"}},
+        {"a trailing backslash", {cat}, cat + L"\\", S_OK, {m}, {cat}},
+        {"the branch in another case", {a}, L"software\\UT\\modules\\cleaning\\Cat\\A", S_OK, {m}, {cat}},
+        {"outside the modules' branch", {L"Software\\ut\\Other\\A"}, L"Software\\ut\\Other\\A", S_OK,
+         {L"Software\\ut\\Other"}, {L"Software\\ut\\Other\\A"}},
     };
+    // clang-format on
     for (const Cleaning& c : cases) {
         SCOPED_TRACE(c.label);
         ut::test::RegistrationScope scope;

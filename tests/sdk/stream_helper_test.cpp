@@ -37,31 +37,23 @@ TEST(StreamHelperEncoding, FixedWidthValuesAreTheirLittleEndianBytes) {
         std::function<HRESULT(CGWStreamHelper&)> put;
         Bytes bytes;
     };
+    // clang-format off
     const Case cases[] = {
         {"Int8", [](CGWStreamHelper& h) { return h.PutInt8(-2); }, {0xFE}},
         {"UInt16", [](CGWStreamHelper& h) { return h.PutUInt16(0x1234); }, {0x34, 0x12}},
         {"Int32", [](CGWStreamHelper& h) { return h.PutInt32(-2); }, {0xFE, 0xFF, 0xFF, 0xFF}},
-        {"UInt64",
-         [](CGWStreamHelper& h) { return h.PutUInt64(0x0102030405060708ull); },
-         {8, 7, 6, 5, 4, 3, 2, 1}},
-        {"Int64 as LARGE_INTEGER",
-         [](CGWStreamHelper& h) {
-             LARGE_INTEGER value;
-             value.QuadPart = -1;
-             return h.PutInt64(value);
-         },
+        {"UInt64", [](CGWStreamHelper& h) { return h.PutUInt64(0x0102030405060708ull); }, {8, 7, 6, 5, 4, 3, 2, 1}},
+        {"Int64 as LARGE_INTEGER", [](CGWStreamHelper& h) { LARGE_INTEGER v; v.QuadPart = -1; return h.PutInt64(v); },
          Bytes(8, 0xFF)},
         {"bool", [](CGWStreamHelper& h) { return h.PutBool(true); }, {0x01}},
         {"BOOL", [](CGWStreamHelper& h) { return h.PutBool(7); }, {0x01}},
         {"float", [](CGWStreamHelper& h) { return h.PutFloat(0.5f); }, {0, 0, 0, 0x3F}},
         {"double", [](CGWStreamHelper& h) { return h.PutDouble(-2.0); }, {0, 0, 0, 0, 0, 0, 0, 0xC0}},
         {"TChar", [](CGWStreamHelper& h) { return h.PutTChar(L'\u00E9'); }, {0xE9, 0x00}},
-        {"GUID",
-         [](CGWStreamHelper& h) {
-             return h.PutGUID({0x01020304, 0x0506, 0x0708, {9, 10, 11, 12, 13, 14, 15, 16}});
-         },
+        {"GUID", [](CGWStreamHelper& h) { return h.PutGUID({0x01020304, 0x0506, 0x0708, {9, 10, 11, 12, 13, 14, 15, 16}}); },
          {4, 3, 2, 1, 6, 5, 8, 7, 9, 10, 11, 12, 13, 14, 15, 16}},
     };
+    // clang-format on
     for (const Case& c : cases) {
         SCOPED_TRACE(c.what);
         EXPECT_EQ(Written([&](CGWStreamHelper& h) { EXPECT_EQ(c.put(h), S_OK); }), c.bytes);
@@ -233,50 +225,25 @@ TEST(StreamHelperReading, BadInputFailsAndConsumesNothing) {
         Bytes bytes;
         std::function<HRESULT(CGWStreamHelper&)> read;
     };
+    // clang-format off
     const Read reads[] = {
         {"UInt32", {1, 2, 3}, Getter(&CGWStreamHelper::GetUInt32)},
         {"GUID", Bytes(15, 1), Getter(&CGWStreamHelper::GetGUID)},
-        {"string body",
-         {5, 0, 0, 0, 'a', 0},
-         [](CGWStreamHelper& h) {
-             wchar_t t[9];
-             return h.GetUnicodeString(t, 9);
-         }},
+        {"string body", {5, 0, 0, 0, 'a', 0}, [](CGWStreamHelper& h) { wchar_t t[9]; return h.GetUnicodeString(t, 9); }},
         {"string length", {0xFE, 0xFF, 0xFF, 0x7F}, Getter(&CGWStreamHelper::GetStringLength)},
-        {"ANSI",
-         {9, 0, 0, 0, 'a'},
-         [](CGWStreamHelper& h) {
-             char t[16];
-             return h.GetAnsiString(t, 16);
-         }},
+        {"ANSI", {9, 0, 0, 0, 'a'}, [](CGWStreamHelper& h) { char t[16]; return h.GetAnsiString(t, 16); }},
         {"BSTR skip", {9, 0, 0, 0, 'a', 0}, [](CGWStreamHelper& h) { return h.SkipBSTR(); }},
-        {"byte array",
-         {4, 0, 0, 0, 1},
-         [](CGWStreamHelper& h) {
-             BYTE b[8];
-             ULONG n;
-             return h.GetUByteArray(b, 8, &n);
-         }},
-        {"array claiming 2^31 elements",
-         {0x05, 0x00, 0x01, 0x00, 0x00, 0x00, 0x00, 0x80, 0, 0, 0, 0},
-         [](CGWStreamHelper& h) {
-             SAFEARRAY* a;
-             return h.GetSAFEARRAY(&a);
-         }},
+        {"byte array", {4, 0, 0, 0, 1}, [](CGWStreamHelper& h) { BYTE b[8]; ULONG n; return h.GetUByteArray(b, 8, &n); }},
+        {"array claiming 2^31 elements", {0x05, 0x00, 0x01, 0x00, 0x00, 0x00, 0x00, 0x80, 0, 0, 0, 0},
+         [](CGWStreamHelper& h) { SAFEARRAY* a; return h.GetSAFEARRAY(&a); }},
         {"interface in a VARIANT", {13, 0}, ReadVariant},
         {"GUID in a VARIANT cut short", {0x60, 0, 1, 2}, ReadVariant},
         {"arrays nested deeper than any reader goes", DeepArrays(), ReadVariant},
-        {"chunk header",
-         {1, 0, 0, 0, 1, 0, 0, 0, 4},
-         [](CGWStreamHelper& h) { return h.ChunkReadOpen(1, nullptr); }},
-        {"peek",
-         {1, 0, 0, 0, 1},
-         [](CGWStreamHelper& h) {
-             ULONG id;
-             return h.ChunkPeekHeader(&id, nullptr);
-         }},
+        {"chunk header", {1, 0, 0, 0, 1, 0, 0, 0, 4}, [](CGWStreamHelper& h) { return h.ChunkReadOpen(1, nullptr); }},
+        {"peek", {1, 0, 0, 0, 1}, [](CGWStreamHelper& h) { ULONG id; return h.ChunkPeekHeader(&id, nullptr); }},
         {"skip chunk", {1, 0, 0, 0, 1, 0, 0, 0}, [](CGWStreamHelper& h) { return h.SkipChunk(); }},
     };
+    // clang-format on
     for (const Read& r : reads) {
         SCOPED_TRACE(r.what);
         ComPtr<IStream> stream = StreamOf(r.bytes);
