@@ -7,6 +7,7 @@
 #include <ut/frames.h>
 #include <ut/memory.h>
 #include <ut/mifile.h>
+#include <ut/paths.h>
 #include <ut/persist.h>
 #include <ut/registration.h>
 #include <ut/time.h>

@@ -14,11 +14,13 @@
 #include <ut/sdk/version.h>
 #include <ut/sdk/views.h>
 
-#include "active_database.h"
 #include "ambient_values.h"
+#include "application.h"
 #include "content_container.h"
 #include "families_manager.h"
 #include "file_dialogs.h"
+#include "file_path.h"
+#include "install_locations.h"
 #include "notification_service.h"
 #include "preferences.h"
 #include "time_manager.h"
@@ -41,7 +43,7 @@ ut::ComPtr<IUnknown> NewService(const Settings& settings) {
 ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWVersionInfo, NewService<VersionInfo>(settings).Get());
     InstallService(CLSID_GWAmbientValues, NewService<AmbientValues>(settings).Get());
-    InstallService(CLSID_GWActiveDatabase, NewService<ActiveDatabase>(settings).Get());
+    InstallService(CLSID_GWActiveDatabase, NewService<Application>(settings).Get());
     InstallService(CLSID_GWNotificationService, NewService<NotificationService>(settings).Get());
     InstallService(CLSID_GWTimeManager, NewService<TimeManager>(settings).Get());
     InstallService(CLSID_GWPlayControl, NewService<PlayControl>(settings).Get());
@@ -54,6 +56,10 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWFamiliesManager, NewService<FamiliesManager>(settings).Get());
     InstallService(CLSID_GWViewManager, NewService<ViewManager>(settings).Get());
     InstallService(CLSID_GWPreferences, NewService<Preferences>(settings).Get());
+    InstallService(CLSID_GWProjectManager, NewService<InstallLocations>(settings).Get());
+    InstallService(CLSID_KXPluginRegistry, NewService<PluginRegistry>(settings).Get());
+    InstallClass(CLSID_GWFilePath,
+                 ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) FilePathFactory(settings)).Get());
 }
 
 ReferenceHost::~ReferenceHost() {
