@@ -11,3 +11,4 @@
 #include <ut/persist.h>
 #include <ut/registration.h>
 #include <ut/time.h>
+#include <ut/validate.h>
