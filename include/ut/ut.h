@@ -3,6 +3,7 @@
 
 #include <ut/catalog.h>
 #include <ut/compare.h>
+#include <ut/dataobject.h>
 #include <ut/export.h>
 #include <ut/frames.h>
 #include <ut/memory.h>
