@@ -1,6 +1,7 @@
 // Everything the library exports.
 #pragma once
 
+#include <ut/bitmap.h>
 #include <ut/catalog.h>
 #include <ut/compare.h>
 #include <ut/dataobject.h>

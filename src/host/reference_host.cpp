@@ -20,6 +20,7 @@
 #include "families_manager.h"
 #include "file_dialogs.h"
 #include "file_path.h"
+#include "image_loader.h"
 #include "install_locations.h"
 #include "notification_service.h"
 #include "preferences.h"
@@ -58,6 +59,7 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWPreferences, NewService<Preferences>(settings).Get());
     InstallService(CLSID_GWProjectManager, NewService<InstallLocations>(settings).Get());
     InstallService(CLSID_KXPluginRegistry, NewService<PluginRegistry>(settings).Get());
+    InstallService(CLSID_GWImageLoader, NewService<ImageLoader>(settings).Get());
     InstallClass(CLSID_GWFilePath,
                  ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) FilePathFactory(settings)).Get());
 }
