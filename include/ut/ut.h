@@ -1,8 +1,10 @@
 // Everything the library exports.
 #pragma once
 
+#include <ut/bitmap.h>
 #include <ut/catalog.h>
 #include <ut/compare.h>
+#include <ut/dataobject.h>
 #include <ut/export.h>
 #include <ut/families.h>
 #include <ut/frames.h>
@@ -10,8 +12,10 @@
 #include <ut/memory.h>
 #include <ut/mifile.h>
 #include <ut/notify.h>
+#include <ut/paths.h>
 #include <ut/persist.h>
 #include <ut/registration.h>
 #include <ut/scene.h>
 #include <ut/shaders.h>
 #include <ut/time.h>
+#include <ut/validate.h>

@@ -1,4 +1,5 @@
-// The reference host's active database: its mode, state flags and object-event notifier.
+// The reference host's active database and application object: its mode, state flags, saving
+// state, dump mode and object-event notifier.
 #include "active_database.h"
 
 #include <algorithm>
@@ -11,7 +12,7 @@ namespace ut::host {
 
 std::span<const CGWCOMObject::InterfaceEntry> ActiveDatabase::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {
-        ut::sdk::Entry<ActiveDatabase, IGWActiveDatabase>(IID_IGWActiveDatabase),
+        ut::sdk::Entry<ActiveDatabase, IGWApplication>(IID_IGWApplication),
         ut::sdk::Entry<ActiveDatabase, IGWActiveDatabaseNotifier>(IID_IGWActiveDatabaseNotifier)};
     return map;
 }
@@ -36,6 +37,52 @@ HRESULT ActiveDatabase::TestStateFlags(ULONG flags) {
     if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabase::TestStateFlags"); FAILED(hr))
         return hr;
     return (flags_ & flags) == flags ? S_OK : S_FALSE;
+}
+
+HRESULT ActiveDatabase::GetStateFlag(ULONG flag, LONG* value) {
+    if (!value)
+        return E_POINTER;
+    *value = 0;
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabase::GetStateFlag"); FAILED(hr))
+        return hr;
+    if (flag >= numberedFlags_.size())
+        return E_INVALIDARG;
+    *value = numberedFlags_[flag];
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::SetStateFlag(ULONG flag, LONG value) {
+    if (flag >= numberedFlags_.size())
+        return E_INVALIDARG;
+    numberedFlags_[flag] = value;
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::GetSavingState(GWSaveType* save, GWLoadType* load) {
+    if (!save || !load)
+        return E_POINTER;
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabase::GetSavingState"); FAILED(hr))
+        return hr;
+    *save = save_;
+    *load = load_;
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::SetSavingState(GWSaveType save, GWLoadType load) {
+    save_ = save;
+    load_ = load;
+    return S_OK;
+}
+
+HRESULT ActiveDatabase::AllowsDumps() {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveDatabase::AllowsDumps"); FAILED(hr))
+        return hr;
+    return dumps_ ? S_OK : S_FALSE;
+}
+
+HRESULT ActiveDatabase::SetAllowsDumps(BOOL allow) {
+    dumps_ = allow != FALSE;
+    return S_OK;
 }
 
 ActiveDatabase::Advised* ActiveDatabase::Find(IGWObjectEventSink* sink) {

@@ -1,16 +1,19 @@
-// The reference host's active database: the mode of its settings, its state flags, and the
-// notifier that tells advised sinks of object events.
+// The reference host's active database, which is also its application object: the mode of its
+// settings, its state flags (the database's masks and the application's numbered flags), the
+// saving state, the dump mode, and the notifier that tells advised sinks of object events.
 #pragma once
 
+#include <array>
 #include <vector>
 
 #include <ut/host/reference_host.h>
+#include <ut/sdk/application.h>
 #include <ut/sdk/comobject.h>
 #include <ut/sdk/database.h>
 
 namespace ut::host {
 
-class ActiveDatabase final : public ut::sdk::ComObject<IGWActiveDatabase, IGWActiveDatabaseNotifier> {
+class ActiveDatabase final : public ut::sdk::ComObject<IGWApplication, IGWActiveDatabaseNotifier> {
 public:
     explicit ActiveDatabase(const Settings& settings) : mode_(settings.activeDatabaseMode) {}
 
@@ -19,6 +22,13 @@ public:
     HRESULT STDMETHODCALLTYPE GetCurrentMode(ULONG* mode) override;
     HRESULT STDMETHODCALLTYPE SetStateFlags(ULONG flags, BOOL on) override;
     HRESULT STDMETHODCALLTYPE TestStateFlags(ULONG flags) override;
+
+    HRESULT STDMETHODCALLTYPE GetStateFlag(ULONG flag, LONG* value) override;
+    HRESULT STDMETHODCALLTYPE SetStateFlag(ULONG flag, LONG value) override;
+    HRESULT STDMETHODCALLTYPE GetSavingState(GWSaveType* save, GWLoadType* load) override;
+    HRESULT STDMETHODCALLTYPE SetSavingState(GWSaveType save, GWLoadType load) override;
+    HRESULT STDMETHODCALLTYPE AllowsDumps() override;
+    HRESULT STDMETHODCALLTYPE SetAllowsDumps(BOOL allow) override;
 
     HRESULT STDMETHODCALLTYPE Advise(IGWObjectEventSink* sink, ULONG mask) override;
     HRESULT STDMETHODCALLTYPE Unadvise(IGWObjectEventSink* sink) override;
@@ -37,6 +47,10 @@ private:
 
     ULONG mode_;
     ULONG flags_ = 0;
+    std::array<LONG, 32> numberedFlags_{};
+    GWSaveType save_ = GWSAVE_NONE;
+    GWLoadType load_ = GWLOAD_NONE;
+    bool dumps_ = false;
     std::vector<Advised> sinks_;
 };
 

@@ -6,7 +6,6 @@
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/components.h>
 #include <ut/sdk/undo.h>
-#include <ut/sdk/views.h>
 
 #include <ut/sdk/ambient.h>
 #include <ut/sdk/content.h>
@@ -19,11 +18,15 @@
 #include <ut/sdk/version.h>
 #include <ut/sdk/views.h>
 
-#include "active_database.h"
 #include "ambient_values.h"
+#include "application.h"
 #include "content_container.h"
 #include "families_manager.h"
 #include "file_dialogs.h"
+#include "active_database.h"
+#include "file_path.h"
+#include "image_loader.h"
+#include "install_locations.h"
 #include "host_support.h"
 #include "list.h"
 #include "notification_service.h"
@@ -67,6 +70,11 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWFamiliesManager, NewService<FamiliesManager>(settings).Get());
     InstallService(CLSID_GWViewManager, NewService<ViewManager>(settings).Get());
     InstallService(CLSID_GWPreferences, NewService<Preferences>(settings).Get());
+    InstallService(CLSID_GWProjectManager, NewService<InstallLocations>(settings).Get());
+    InstallService(CLSID_KXPluginRegistry, NewService<PluginRegistry>(settings).Get());
+    InstallService(CLSID_GWImageLoader, NewService<ImageLoader>(settings).Get());
+    InstallClass(CLSID_GWFilePath,
+                 ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) FilePathFactory(settings)).Get());
 }
 
 ReferenceHost::~ReferenceHost() {

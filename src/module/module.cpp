@@ -23,6 +23,10 @@ const State& Current() {
     return MutableState();
 }
 
+FileState& Files() {
+    return MutableState().files;
+}
+
 HRESULT OnAttach(HINSTANCE self) {
     State& state = MutableState();
     state = {};

@@ -16,6 +16,14 @@ struct TimeState {
     CGWTimeManagerHelper timeManager;
 };
 
+// The file helpers' process-wide state: whether the recovery file was looked for, and its name.
+struct FileState {
+    enum class Recovery { NotLooked, None, Found } recovery = Recovery::NotLooked;
+    char recoveryFile[260] = {};
+    // How deep the property-container dump is nested.
+    int dumpDepth = 0;
+};
+
 struct State {
     HINSTANCE instance = nullptr;
     // The registry key below which registrations are written; ends in a backslash.
@@ -24,11 +32,14 @@ struct State {
     bool streamCompressionDisabled = false;
     // Made by the load step, gone after the unload. The render time is written through it.
     std::unique_ptr<TimeState> time;
+    FileState files;
     // The load step completed; when false every export answers E_UNEXPECTED.
     bool loaded = false;
 };
 
 const State& Current();
+// The file helpers' state, the one part that the exports change after the load step.
+FileState& Files();
 
 inline bool Loaded() {
     return Current().loaded;
