@@ -6,6 +6,8 @@
 #include <ut/dataobject.h>
 #include <ut/detail/names.h>
 
+#include "support/wine.h"
+
 namespace {
 
 using ut::ComPtr;
@@ -69,7 +71,16 @@ TEST(DataObject, AnswersWhatADropCarries) {
         HRESULT names;
         std::vector<std::wstring> all;
     } cases[] = {
-        {"one file", Files({L"C:\\a.scn"}), S_OK, S_FALSE, S_OK, 1, S_OK, L"C:\\a.scn", S_OK, {L"C:\\a.scn", L""}},
+        {"one file",
+         Files({L"C:\\a.scn"}),
+         S_OK,
+         S_FALSE,
+         S_OK,
+         1,
+         S_OK,
+         L"C:\\a.scn",
+         S_OK,
+         {L"C:\\a.scn", L""}},
         {"two files",
          Files({L"C:\\a.scn", L"D:\\b.scn"}),
          S_OK,
@@ -113,6 +124,9 @@ TEST(DataObject, AnswersWhatADropCarries) {
          {L"", L""}},
     };
     for (const Case& c : cases) {
+        if (c.drop.hasFiles && c.drop.files.empty() &&
+            ut::test::UnderWine("wine counts an empty list as one name"))
+            continue;
         ComPtr<IDataObject> data = Make(c.drop);
         EXPECT_EQ(KXIsDataObjectFile(data.Get()), c.isFile) << c.what;
         EXPECT_EQ(KXIsURLDataObject(data.Get()), c.isUrl) << c.what;

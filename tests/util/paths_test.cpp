@@ -15,6 +15,7 @@
 #include "support/fault_plan.h"
 #include "support/registrations.h"
 #include "support/temp_folder.h"
+#include "support/wine.h"
 
 namespace {
 
@@ -154,7 +155,11 @@ TEST(OpenStorageOnFile, OpensCreatesReplacesAndMakesTemporaries) {
         ComPtr<IStorage> storage;
         ComPtr<ILockBytes> bytes;
         HRESULT hr = F3DOpenStorageOnFile(c.path, kMode, c.create, storage.Put(), bytes.Put());
-        EXPECT_EQ(hr, c.result) << (c.path ? c.path : L"(temporary)") << c.create;
+        HRESULT expected = c.result;
+        if (expected == STG_E_FILEALREADYEXISTS &&
+            ut::test::UnderWine("wine takes a file that is not compound for a missing one"))
+            expected = STG_E_FILENOTFOUND;
+        EXPECT_EQ(hr, expected) << (c.path ? c.path : L"(temporary)") << c.create;
         if (SUCCEEDED(hr)) {
             EXPECT_EQ(ut::test::ElementsOf(storage.Get()).size(), c.elements);
         }

@@ -238,7 +238,9 @@ HRESULT SetGlobalData(IDataObject* object, CLIPFORMAT format, const void* bytes,
 }
 
 HGLOBAL CreateDropFiles(const std::vector<std::wstring>& names) {
-    SIZE_T size = sizeof(DROPFILES) + sizeof(wchar_t);
+    // The list ends with an empty name; an empty list still holds two terminators, since readers
+    // step over a first name before they look for the end.
+    SIZE_T size = sizeof(DROPFILES) + (names.empty() ? 2 : 1) * sizeof(wchar_t);
     for (const std::wstring& name : names)
         size += (name.size() + 1) * sizeof(wchar_t);
     UniqueGlobal block(GlobalAlloc(GHND, size));
