@@ -268,9 +268,11 @@ std::string VersionText(std::uint32_t version) {
 std::string HexPreview(std::span<const std::uint8_t> bytes, std::size_t count) {
     std::string text;
     for (std::size_t i = 0; i < std::min(count, bytes.size()); ++i) {
-        char hex[4];
-        std::snprintf(hex, sizeof hex, "%02X", bytes[i]);
-        text += (i ? " " : "") + std::string(hex);
+        static constexpr char kDigits[] = "0123456789ABCDEF";
+        if (i)
+            text += ' ';
+        text += kDigits[bytes[i] >> 4];
+        text += kDigits[bytes[i] & 0xF];
     }
     return bytes.size() > count ? text + " ..." : text;
 }
