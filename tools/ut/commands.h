@@ -33,6 +33,10 @@ void AddHeaderCommand(CLI::App& app);
 void AddTimeCommand(CLI::App& app);
 void AddSceneCommand(CLI::App& app);
 void AddStreamCommand(CLI::App& app);
+// ut storage ls | cat.
+void AddStorageCommand(CLI::App& app);
+// ut validate, ut paths and ut bitmap.
+void AddFileCommands(CLI::App& app);
 
 // ut registry list | get | export | import; list lives in registry_list.cpp.
 void AddRegistryCommand(CLI::App& app);

@@ -9,6 +9,7 @@
 #include <ut/detail/names.h>
 #include <ut/host/reference_host.h>
 #include <ut/platform/process.h>
+#include <ut/platform/storage.h>
 #include <ut/platform/stream.h>
 #include <ut/platform/text.h>
 #include <ut/platform/variant.h>
@@ -150,7 +151,34 @@ ULONGLONG StreamSize(IStream* stream) {
     return SUCCEEDED(stream->Stat(&stat, STATFLAG_NONAME)) ? stat.cbSize.QuadPart : 0;
 }
 
-int ShowPersistence() {
+// Writes the bytes of `stream` as the stream "Scene" of a new compound file at `path`.
+int SaveSceneFile(IStream* stream, const std::string& path) {
+    std::vector<char> bytes(static_cast<std::size_t>(StreamSize(stream)));
+    LARGE_INTEGER start{};
+    ULONG read = 0;
+    ut::ComPtr<IStorage> root;
+    ut::ComPtr<IStream> scene;
+    std::wstring name = ut::platform::WideFromUtf8(path);
+    HRESULT hr = stream->Seek(start, STREAM_SEEK_SET, nullptr);
+    if (SUCCEEDED(hr))
+        hr = stream->Read(bytes.data(), static_cast<ULONG>(bytes.size()), &read);
+    if (SUCCEEDED(hr))
+        hr = StgCreateDocfile(name.c_str(), STGM_CREATE | STGM_READWRITE | STGM_SHARE_EXCLUSIVE, 0,
+                              root.Put());
+    if (SUCCEEDED(hr))
+        hr = root->CreateStream(L"Scene", STGM_CREATE | STGM_READWRITE | STGM_SHARE_EXCLUSIVE, 0, 0,
+                                scene.Put());
+    if (SUCCEEDED(hr))
+        hr = scene->Write(bytes.data(), read, nullptr);
+    scene.Reset();
+    if (SUCCEEDED(hr))
+        hr = root->Commit(STGC_DEFAULT);
+    std::printf("save        the compact stream as \"Scene\" in %s: %s\n", path.c_str(),
+                SUCCEEDED(hr) ? "written" : "NOT written");
+    return SUCCEEDED(hr) ? 0 : 1;
+}
+
+int ShowPersistence(const std::string& savePath) {
     ut::ComPtr<IStream> plain, compact, saving;
     if (FAILED(ut::platform::CreateMemoryStream(plain.Put())) ||
         FAILED(ut::platform::CreateMemoryStream(compact.Put())))
@@ -182,7 +210,8 @@ int ShowPersistence() {
                 plainBytes ? 100.0 * static_cast<double>(compactBytes) / static_cast<double>(plainBytes)
                            : 0.0,
                 found);
-    return found == kSceneObjects ? 0 : 1;
+    int saved = savePath.empty() ? 0 : SaveSceneFile(compact.Get(), savePath);
+    return found == kSceneObjects ? saved : 1;
 }
 
 // Counts the objects at and below `object`.
@@ -267,11 +296,11 @@ int ShowRegistration() {
     return registered && removed ? 0 : 1;
 }
 
-void RunDemo() {
+void RunDemo(const std::string& savePath) {
     ut::host::ReferenceHost host;
     if (FAILED(host.Status()))
         Fail(kExitNo, "the reference host did not start");
-    int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowPersistence() +
+    int failures = ShowModule() + ShowGuidRoundTrip() + ShowStreamRoundTrip() + ShowPersistence(savePath) +
                    ShowVersions() + ShowMemoryPool() + ShowRegistration() + ShowScene(host);
     if (failures)
         Fail(kExitNo, "the tour found " + std::to_string(failures) + " part(s) not working");
@@ -283,8 +312,10 @@ void AddDemoCommand(CLI::App& app) {
     CLI::App* demo = app.add_subcommand(
         "demo", "Load the library on the reference host and show what it does (module, GUIDs, streams, "
                 "persistence, versions, memory pool, registration, a scene).");
-    demo->footer("Example:\n  ut demo");
-    demo->callback(RunDemo);
+    auto savePath = std::make_shared<std::string>();
+    demo->add_option("--save", *savePath, "also write the persisted scene as a compound file");
+    demo->footer("Example:\n  ut demo --save scene.scn");
+    demo->callback([savePath] { RunDemo(*savePath); });
 }
 
 } // namespace ut::tool

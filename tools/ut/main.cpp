@@ -49,6 +49,8 @@ int main(int argc, char** argv) {
     ut::tool::AddRegistryCommand(app);
     ut::tool::AddSceneCommand(app);
     ut::tool::AddStreamCommand(app);
+    ut::tool::AddStorageCommand(app);
+    ut::tool::AddFileCommands(app);
 
     try {
         std::vector<std::string> arguments = ut::platform::Utf8Arguments(argc, argv);

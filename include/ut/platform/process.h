@@ -25,6 +25,14 @@ UT_PLATFORM_API bool RunningUnderCompatibilityLayer();
 // when there is no console).
 UT_PLATFORM_API void ReportError(const std::wstring& line);
 
+// Sends `text` as it is to the debugger's output channel: the system's debugger output on
+// Windows; standard error (in UTF-8) on POSIX, which has no such channel.
+UT_PLATFORM_API void WriteDebugOutput(const wchar_t* text);
+
+// Puts standard output in binary mode, so that the bytes written are the bytes that arrive
+// (Windows would otherwise turn "\n" into "\r\n"). POSIX has nothing to do.
+UT_PLATFORM_API void SetBinaryStandardOutput();
+
 // The program's arguments after its name, in UTF-8: argv as it is on POSIX; on Windows read from
 // the wide command line, so that names outside the ANSI code page come through.
 UT_PLATFORM_API std::vector<std::string> Utf8Arguments(int argc, char** argv);

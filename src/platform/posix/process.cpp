@@ -1,4 +1,5 @@
 // POSIX home: the process's environment, modules, error output and arguments.
+#include <cstdio>
 #include <cstdlib>
 #include <dlfcn.h>
 
@@ -34,6 +35,15 @@ std::wstring ModuleFileName(HINSTANCE module) {
 void ReportError(const std::wstring& line) {
     WriteErrorLine(line);
 }
+
+void WriteDebugOutput(const wchar_t* text) {
+    if (!text)
+        return;
+    std::fputs(Utf8FromWide(text).c_str(), stderr);
+    std::fflush(stderr);
+}
+
+void SetBinaryStandardOutput() {}
 
 std::vector<std::string> Utf8Arguments(int argc, char** argv) {
     if (argc < 1 || !argv)

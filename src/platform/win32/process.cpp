@@ -1,5 +1,9 @@
 // Windows home: the process's environment, modules, error output and command line.
+#include <cstdio>
 #include <string>
+
+#include <fcntl.h>
+#include <io.h>
 
 #include <ut/platform/process.h>
 #include <ut/platform/text.h>
@@ -64,6 +68,15 @@ std::wstring ModuleFileName(HINSTANCE module) {
 void ReportError(const std::wstring& line) {
     WriteErrorLine(line);
     OutputDebugStringW((line + L"\n").c_str());
+}
+
+void WriteDebugOutput(const wchar_t* text) {
+    if (text)
+        OutputDebugStringW(text);
+}
+
+void SetBinaryStandardOutput() {
+    (void)_setmode(_fileno(stdout), _O_BINARY); // fails only for a closed stdout
 }
 
 std::vector<std::string> Utf8Arguments(int argc, char** argv) {
