@@ -5,6 +5,7 @@
 #include <ut/catalog.h>
 #include <ut/compare.h>
 #include <ut/dataobject.h>
+#include <ut/dump.h>
 #include <ut/export.h>
 #include <ut/families.h>
 #include <ut/frames.h>

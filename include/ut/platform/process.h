@@ -1,7 +1,9 @@
 // The process as the library sees it: its environment, its modules, and its error output.
 #pragma once
 
+#include <cstdio>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <ut/platform/com.h>
@@ -28,6 +30,18 @@ UT_PLATFORM_API void ReportError(const std::wstring& line);
 // Sends `text` as it is to the debugger's output channel: the system's debugger output on
 // Windows; standard error (in UTF-8) on POSIX, which has no such channel.
 UT_PLATFORM_API void WriteDebugOutput(const wchar_t* text);
+
+// Where diagnostic dumps append their log: the file UT_DUMP_LOG names when it is set, else
+// "c:\KXDumpActiveData.log" on Windows and, on POSIX, KXDumpActiveData.log in the user's state
+// folder ($XDG_STATE_HOME/ut, or ~/.local/state/ut, made when missing).
+UT_PLATFORM_API std::wstring DumpLogPath();
+
+// Opens `path` for appending and reading (the C runtime's "a+"); null when it cannot.
+UT_PLATFORM_API std::FILE* OpenFileForAppend(const std::wstring& path);
+
+// `text` in the process's multibyte code page (the ANSI code page on Windows, UTF-8 on POSIX);
+// false when a character has no form there or the result needs more than `capacity` bytes.
+UT_PLATFORM_API bool MultibyteFromWide(std::wstring_view text, std::size_t capacity, std::string& out);
 
 // Puts standard output in binary mode, so that the bytes written are the bytes that arrive
 // (Windows would otherwise turn "\n" into "\r\n"). POSIX has nothing to do.

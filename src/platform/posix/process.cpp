@@ -2,6 +2,8 @@
 #include <cstdio>
 #include <cstdlib>
 #include <dlfcn.h>
+#include <filesystem>
+#include <system_error>
 
 #include <ut/platform/process.h>
 #include <ut/platform/text.h>
@@ -41,6 +43,32 @@ void WriteDebugOutput(const wchar_t* text) {
         return;
     std::fputs(Utf8FromWide(text).c_str(), stderr);
     std::fflush(stderr);
+}
+
+std::wstring DumpLogPath() {
+    constexpr const char* kName = "KXDumpActiveData.log";
+    if (const char* named = std::getenv("UT_DUMP_LOG"); named && *named)
+        return WideFromUtf8(named);
+    std::filesystem::path folder;
+    if (const char* state = std::getenv("XDG_STATE_HOME"); state && *state == '/')
+        folder = state;
+    else if (const char* home = std::getenv("HOME"); home && *home)
+        folder = std::filesystem::path(home) / ".local" / "state";
+    else
+        return WideFromUtf8(kName); // nowhere better: the working folder
+    folder /= "ut";
+    std::error_code ignored; // a folder that cannot be made shows when the log does not open
+    std::filesystem::create_directories(folder, ignored);
+    return WideFromUtf8((folder / kName).string());
+}
+
+std::FILE* OpenFileForAppend(const std::wstring& path) {
+    return std::fopen(Utf8FromWide(path).c_str(), "a+");
+}
+
+bool MultibyteFromWide(std::wstring_view text, std::size_t capacity, std::string& out) {
+    out = Utf8FromWide(text);
+    return out.size() <= capacity;
 }
 
 void SetBinaryStandardOutput() {}

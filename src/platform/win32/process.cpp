@@ -1,5 +1,6 @@
 // Windows home: the process's environment, modules, error output and command line.
 #include <cstdio>
+#include <cstdlib>
 #include <string>
 
 #include <fcntl.h>
@@ -73,6 +74,29 @@ void ReportError(const std::wstring& line) {
 void WriteDebugOutput(const wchar_t* text) {
     if (text)
         OutputDebugStringW(text);
+}
+
+std::wstring DumpLogPath() {
+    const wchar_t* named = _wgetenv(L"UT_DUMP_LOG");
+    return named && *named ? std::wstring(named) : std::wstring(L"c:\\KXDumpActiveData.log");
+}
+
+std::FILE* OpenFileForAppend(const std::wstring& path) {
+    return _wfopen(path.c_str(), L"a+");
+}
+
+bool MultibyteFromWide(std::wstring_view text, std::size_t capacity, std::string& out) {
+    out.clear();
+    if (text.empty())
+        return true;
+    BOOL lossy = FALSE;
+    int length = WideCharToMultiByte(CP_ACP, 0, text.data(), static_cast<int>(text.size()), nullptr, 0,
+                                     nullptr, &lossy);
+    if (length <= 0 || lossy || static_cast<std::size_t>(length) > capacity)
+        return false;
+    out.resize(static_cast<std::size_t>(length));
+    return WideCharToMultiByte(CP_ACP, 0, text.data(), static_cast<int>(text.size()), out.data(), length,
+                               nullptr, nullptr) == length;
 }
 
 void SetBinaryStandardOutput() {
