@@ -345,7 +345,9 @@ protected:
         std::ifstream in(std::filesystem::path(log_), std::ios::binary);
         std::stringstream text;
         text << in.rdbuf();
-        return text.str();
+        std::string log = text.str();
+        std::erase(log, '\r'); // the log is a text file: Windows ends its lines with "\r\n"
+        return log;
     }
 
     ut::host::ReferenceHost host_{ArmScene()};
