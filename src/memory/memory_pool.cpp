@@ -56,25 +56,22 @@ void Attach(Descriptor* descriptor, void* block) {
     descriptor->Data = static_cast<std::byte*>(block) + kHeaderBytes;
 }
 
-// The list helpers read every link before writing any: the links may alias the head.
+// The list helpers read every link before writing any: the links may alias the head. They make
+// no branch on a missing neighbour: the write that a neighbour would take goes instead to a field
+// that is written with the same value anyway, which keeps the pooled path free of taken jumps.
 void PushFront(Descriptor*& head, Descriptor* descriptor) {
     Descriptor* first = head;
     descriptor->Prev = nullptr;
     descriptor->Next = first;
-    if (first)
-        first->Prev = descriptor;
+    *(first ? &first->Prev : &head) = descriptor;
     head = descriptor;
 }
 
 void Unlink(Descriptor*& head, Descriptor* descriptor) {
     Descriptor* prev = descriptor->Prev;
     Descriptor* next = descriptor->Next;
-    if (prev)
-        prev->Next = next;
-    else
-        head = next;
-    if (next)
-        next->Prev = prev;
+    *(prev ? &prev->Next : &head) = next;
+    *(next ? &next->Prev : &descriptor->Prev) = prev;
 }
 
 // Takes the first kept block off its free list for a request of its class.
@@ -82,8 +79,8 @@ Descriptor* TakeFirst(Descriptor*& freeList, ULONG request) {
     Descriptor* descriptor = freeList;
     Descriptor* next = descriptor->Next;
     freeList = next;
-    if (next)
-        next->Prev = nullptr;
+    // The head's own Prev is already null.
+    *(next ? &next->Prev : &descriptor->Prev) = nullptr;
     descriptor->Size = request;
     return descriptor;
 }

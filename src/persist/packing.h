@@ -85,27 +85,38 @@ inline ULONG PackInt32(LONG value, BYTE* out) {
 
 namespace detail {
 
-// `a` when `condition` holds, else `b`, without a branch.
-template <class T>
-T Select(bool condition, T a, T b) {
-    return b ^ ((a ^ b) & (T{0} - static_cast<T>(condition)));
-}
-
 // Bytes of each form, by the tag's distance from kDoubleInt8 (0xFA is no form).
 inline constexpr BYTE kDoubleLengths[8] = {2, 3, 0, 5, 9, 1, 1, 1};
 
-// The forms PackDouble chooses between, in the order of its index.
+// What follows the tag of a double form.
+enum DoublePayload : BYTE { kPayloadInteger, kPayloadSingle, kPayloadDouble };
+
 struct DoubleForm {
     BYTE tag;
     BYTE length;
+    DoublePayload payload;
 };
-inline constexpr DoubleForm kDoubleForms[8] = {{kDoubleInt8, 2},     {kDoubleInt16, 3}, {kDoubleWhole, 9},
-                                               {kDoubleMinusOne, 1}, {kDoubleZero, 1},  {kDoubleOne, 1},
-                                               {kDoubleWhole, 9},    {kDoubleFloat, 5}};
 
-} // namespace detail
+// The integer forms of an integral value, by how far it fits: 0 wider than 16 bits, 1 in 16,
+// 2 in 8, and 3, 4, 5 for -1, 0 and 1.
+inline constexpr DoubleForm kIntegralForms[6] = {
+    {kDoubleWhole, 9, kPayloadDouble}, {kDoubleInt16, 3, kPayloadInteger},
+    {kDoubleInt8, 2, kPayloadInteger}, {kDoubleMinusOne, 1, kPayloadDouble},
+    {kDoubleZero, 1, kPayloadDouble},  {kDoubleOne, 1, kPayloadDouble}};
 
-namespace detail {
+// The forms PackDouble chooses between, by its key: the integer fit above times 4, plus 2 when
+// the value is float-exact below 2^31, plus 1 when it is integral. A value that is not integral
+// is written as a float or whole, whatever its truncation would fit.
+inline constexpr auto kDoubleForms = [] {
+    struct Table {
+        DoubleForm forms[24];
+    } table{};
+    for (unsigned key = 0; key < 24; ++key)
+        table.forms[key] = key & 1u   ? kIntegralForms[key >> 2]
+                           : key & 2u ? DoubleForm{kDoubleFloat, 5, kPayloadSingle}
+                                      : DoubleForm{kDoubleWhole, 9, kPayloadDouble};
+    return table;
+}();
 
 // The value truncated toward zero when it fits 32 bits; anything else (NaN included) gives
 // INT32_MIN, as the processor's own conversion answers.
@@ -117,15 +128,20 @@ inline LONG TruncatedInt32(double value) {
 #endif
 }
 
-// The value rounded to single precision and back; huge values give an infinity, never a trap.
-inline double ThroughFloat(double value, float& single) {
+// Bit 0: `whole` gives the value back. Bit 1: the value rounded to single precision (`single`)
+// gives it back; huge values round to an infinity, never a trap. Both comparisons are made at
+// once, and NaN fails both.
+inline unsigned RoundTrips(double value, LONG whole, float& single) {
 #if defined(__SSE2__)
-    __m128 rounded = _mm_cvtsd_ss(_mm_setzero_ps(), _mm_set_sd(value));
+    const __m128d x = _mm_set_sd(value);
+    const __m128 rounded = _mm_cvtsd_ss(_mm_setzero_ps(), x);
     single = _mm_cvtss_f32(rounded);
-    return _mm_cvtsd_f64(_mm_cvtss_sd(_mm_setzero_pd(), rounded));
+    const __m128d back = _mm_unpacklo_pd(_mm_cvtsi32_sd(x, whole), _mm_cvtss_sd(x, rounded));
+    return static_cast<unsigned>(_mm_movemask_pd(_mm_cmpeq_pd(back, _mm_unpacklo_pd(x, x))));
 #else
     single = std::fabs(value) <= 3.4e38 ? static_cast<float>(value) : 0.0f;
-    return static_cast<double>(single);
+    return unsigned{static_cast<double>(whole) == value} | unsigned{static_cast<double>(single) == value}
+                                                               << 1;
 #endif
 }
 
@@ -135,31 +151,24 @@ inline double ThroughFloat(double value, float& single) {
 // 8 and 16 bits; other integral values whole (on purpose, even when a float would hold them);
 // float-exact values; the rest whole. One 32-bit truncation answers every integral question:
 // outside 32 bits a non-integral value cannot be float-exact and an integral one is written
-// whole, so the float form is only open below 2^31. The tests give an index into one table of
-// forms, chosen with masks, so that a mix of values costs no mispredicted branches.
+// whole, so the float form is only open below 2^31. The tests are added up into a key of one
+// table of forms rather than chained as conditions, which the compiler would turn into branches
+// that a mix of values mispredicts.
 inline ULONG PackDouble(double value, BYTE* out) {
-    using detail::Select;
     const LONG whole = detail::TruncatedInt32(value);
-    const bool integral = static_cast<double>(whole) == value;
     float single = 0;
-    const bool exactFloat = detail::ThroughFloat(value, single) == value;
+    const unsigned trips = detail::RoundTrips(value, whole, single);
     const auto bits = static_cast<ULONG>(whole);
 
-    // Integral: 0 int8, 1 int16, 2 whole, or 3, 4, 5 for -1, 0 and 1. Otherwise 6 whole, 7 float.
-    const unsigned size = 2u - (bits + 127u <= 254u) - (bits + 32767u <= 65534u);
-    const unsigned special = bits + 1u;
-    const unsigned integralIndex = Select(special <= 2u, 3u + special, size);
-    const unsigned otherIndex = 6u + (exactFloat & (whole != INT32_MIN));
-    const unsigned index = Select(integral, integralIndex, otherIndex);
+    const unsigned special = bits + 1u <= 2u; // -1, 0 or 1
+    const unsigned fit = (bits + 127u <= 254u) + (bits + 32767u <= 65534u) + ((bits + 2u) & (0u - special));
+    const unsigned floatBelow31 = trips & (whole == INT32_MIN ? 1u : 3u);
+    const detail::DoubleForm form = detail::kDoubleForms.forms[fit * 4u + floatBelow31];
 
-    ULONGLONG payload = 0, singleBits = 0;
-    std::memcpy(&payload, &value, 8);
-    std::memcpy(&singleBits, &single, 4);
-    payload = Select<ULONGLONG>(index == 7, singleBits, payload);
-    payload = Select<ULONGLONG>(index <= 1, bits, payload);
-    out[0] = detail::kDoubleForms[index].tag;
-    std::memcpy(out + 1, &payload, 8);
-    return detail::kDoubleForms[index].length;
+    const ULONGLONG payloads[3] = {bits, std::bit_cast<ULONG>(single), std::bit_cast<ULONGLONG>(value)};
+    out[0] = form.tag;
+    std::memcpy(out + 1, &payloads[form.payload], 8);
+    return form.length;
 }
 
 // Room a decoder wants in front of it to decode any form from memory.
