@@ -5,11 +5,12 @@ ut_fuzz_target(stream stream_fuzz.cpp)
 ut_fuzz_target(mifile mifile_fuzz.cpp)
 ut_fuzz_target(compare compare_fuzz.cpp)
 # The ".reg" import writes to the registry's roots: it runs on the private store in memory that
-# only the POSIX home has. Our own compound-file reader is POSIX's too; on Windows the reader is
-# the system's, not ours to fuzz.
+# only the POSIX home has. Our own compound-file reader and dropped-file list are POSIX's too; on
+# Windows they are the system's, not ours to fuzz.
 if(NOT WIN32)
   ut_fuzz_target(regfile regfile_fuzz.cpp)
   ut_fuzz_target(storage storage_fuzz.cpp)
+  ut_fuzz_target(dataobject dataobject_fuzz.cpp)
 endif()
 # What `ut stream dump` shows of any bytes.
 ut_fuzz_target(stream_dump stream_dump_fuzz.cpp ../tools/ut/stream_decoder.cpp)
