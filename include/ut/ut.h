@@ -18,5 +18,6 @@
 #include <ut/registration.h>
 #include <ut/scene.h>
 #include <ut/shaders.h>
+#include <ut/sources.h>
 #include <ut/time.h>
 #include <ut/validate.h>

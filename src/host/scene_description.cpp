@@ -115,7 +115,8 @@ PropertySetDescription ReadPropertySet(const Json& json, const std::string& path
 
 ObjectDescription ReadObject(const Json& json, const std::string& path) {
     OnlyKeys(json, path,
-             {"name", "model", "selected", "hidden", "families", "properties", "children", "references"});
+             {"name", "model", "selected", "hidden", "families", "properties", "children", "references",
+              "operators"});
     ObjectDescription object;
     Optional(json, "name", path,
              [&](const Json& value, const std::string& at) { object.name = Text(value, at); });
@@ -130,7 +131,35 @@ ObjectDescription ReadObject(const Json& json, const std::string& path) {
     Each(json, "children", path, object.children, ReadObject);
     Optional(json, "references", path,
              [&](const Json& value, const std::string& at) { object.references = Text(value, at); });
+    Each(json, "operators", path, object.operators, Guid);
     return object;
+}
+
+// The keys a source or a clip shares: its class, name and whether it is hidden.
+template <class Media>
+void ReadMedia(const Json& json, const std::string& path, const char* link, std::wstring Media::*linked,
+               Media& media) {
+    OnlyKeys(json, path, {"class", "name", "hidden", link});
+    Optional(json, "class", path,
+             [&](const Json& value, const std::string& at) { media.clsid = Guid(value, at); });
+    Optional(json, "name", path,
+             [&](const Json& value, const std::string& at) { media.name = Text(value, at); });
+    Optional(json, "hidden", path,
+             [&](const Json& value, const std::string& at) { media.hidden = Truth(value, at); });
+    Optional(json, link, path,
+             [&](const Json& value, const std::string& at) { media.*linked = Text(value, at); });
+}
+
+SourceDescription ReadSource(const Json& json, const std::string& path) {
+    SourceDescription source;
+    ReadMedia(json, path, "path", &SourceDescription::path, source);
+    return source;
+}
+
+ClipDescription ReadClip(const Json& json, const std::string& path) {
+    ClipDescription clip;
+    ReadMedia(json, path, "source", &ClipDescription::source, clip);
+    return clip;
 }
 
 // The containers, in the order of ContainersDescription, by their JSON names.
@@ -158,7 +187,7 @@ ContainersDescription ReadContainers(const Json& json, const std::string& path) 
 }
 
 SceneDescription ReadScene(const Json& json) {
-    OnlyKeys(json, "", {"name", "properties", "objects", "containers"});
+    OnlyKeys(json, "", {"name", "properties", "objects", "containers", "sources", "clips"});
     SceneDescription scene;
     Optional(json, "name", "",
              [&](const Json& value, const std::string& at) { scene.name = Text(value, at); });
@@ -166,6 +195,8 @@ SceneDescription ReadScene(const Json& json) {
     Each(json, "objects", "", scene.objects, ReadObject);
     Optional(json, "containers", "",
              [&](const Json& value, const std::string& at) { scene.containers = ReadContainers(value, at); });
+    Each(json, "sources", "", scene.sources, ReadSource);
+    Each(json, "clips", "", scene.clips, ReadClip);
     return scene;
 }
 
@@ -222,7 +253,28 @@ Json WriteObject(const ObjectDescription& object) {
     PutEach(json, "children", object.children, WriteObject);
     if (!object.references.empty())
         json["references"] = Utf8(object.references);
+    PutEach(json, "operators", object.operators, GuidText);
     return json;
+}
+
+template <class Media>
+Json WriteMedia(const Media& media, const GUID& defaultClass, const char* link, const std::wstring& linked) {
+    Json json = {{"name", Utf8(media.name)}};
+    if (!IsEqualGUID(media.clsid, defaultClass))
+        json["class"] = GuidText(media.clsid);
+    if (!linked.empty())
+        json[link] = Utf8(linked);
+    if (media.hidden)
+        json["hidden"] = true;
+    return json;
+}
+
+Json WriteSource(const SourceDescription& source) {
+    return WriteMedia(source, CLSID_3DImageSource, "path", source.path);
+}
+
+Json WriteClip(const ClipDescription& clip) {
+    return WriteMedia(clip, CLSID_3DImageClip, "source", clip.source);
 }
 
 } // namespace
@@ -254,6 +306,8 @@ std::string FormatSceneDescription(const SceneDescription& scene) {
         PutEach(containers, container.key, scene.containers.*container.members, Utf8);
     if (!containers.empty())
         json["containers"] = std::move(containers);
+    PutEach(json, "sources", scene.sources, WriteSource);
+    PutEach(json, "clips", scene.clips, WriteClip);
     return json.dump(2) + "\n";
 }
 

@@ -53,6 +53,8 @@ ut::ComPtr<Scene> Scene::Build(const SceneDescription& description) {
             return nullptr;
         scene->containers_.emplace_back(*kind.key, std::move(folder));
     }
+    if (!BuildMedia(description, scene->sources_, scene->clips_))
+        return nullptr;
     return scene;
 }
 
@@ -64,6 +66,10 @@ SceneDescription Scene::Describe() const {
     description.properties = DescribePropertySets(Data().members);
     for (size_t i = 0; i < containers_.size(); ++i)
         description.containers.*kSceneContainers[i].members = containers_[i].second->Members();
+    for (const ut::ComPtr<MediaItem>& source : sources_->Members())
+        description.sources.push_back(source->DescribeSource());
+    for (const ut::ComPtr<MediaItem>& clip : clips_->Members())
+        description.clips.push_back(clip->DescribeClip());
     return description;
 }
 
@@ -79,6 +85,10 @@ HRESULT Scene::GetContainer(REFGUID key, REFIID iid, void** container) {
     for (const auto& [own, folder] : containers_)
         if (IsEqualGUID(own, key))
             return folder->QueryInterface(iid, container);
+    if (IsEqualGUID(key, GUID_3DSourcesContainerKey))
+        return sources_->QueryInterface(iid, container);
+    if (IsEqualGUID(key, GUID_3DClipsContainerKey))
+        return clips_->QueryInterface(iid, container);
     return DISP_E_MEMBERNOTFOUND;
 }
 

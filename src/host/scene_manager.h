@@ -40,6 +40,7 @@ public:
 private:
     ut::ComPtr<SceneObject> root_;
     std::vector<std::pair<GUID, ut::ComPtr<Folder>>> containers_;
+    ut::ComPtr<MediaContainer> sources_, clips_;
 };
 
 class SceneManager final : public ut::sdk::ComObject<I3DSceneManager, IGWManagerRegistry, IGWHierarchyRoots> {

@@ -88,6 +88,11 @@ ut::ComPtr<SceneObject> SceneObject::Build(const ObjectDescription& description)
     object->references_ = description.references;
     object->extent_ = description.extent;
     object->position_ = description.position;
+    for (const GUID& clsid : description.operators) {
+        object->operators_.push_back(Make<StackedOperator>(clsid));
+        if (!object->operators_.back())
+            return nullptr;
+    }
     if (!description.properties.empty()) {
         object->sets_ = Make<PropertySet>();
         if (!object->sets_ || !AddPropertySets(description.properties, object->Sets()))
@@ -111,7 +116,13 @@ ObjectDescription SceneObject::Describe() const {
                                   {},
                                   references_,
                                   extent_,
-                                  position_};
+                                  position_,
+                                  {}};
+    for (const ut::ComPtr<StackedOperator>& stacked : operators_) {
+        CLSID clsid = GUID_NULL;
+        (void)stacked->GetClassID(&clsid); // the host's own object: it answers
+        description.operators.push_back(clsid);
+    }
     for (const ut::ComPtr<SceneObject>& child : children_)
         description.children.push_back(child->Describe());
     return description;
@@ -346,6 +357,8 @@ HRESULT SceneObject::QueryObjects(ULONG query, ULONG, ULONG, REFGUID filter, REF
     *objects = nullptr;
     if (HRESULT hr = ut::sdk::CheckHostFault("IGWActiveData::QueryObjects"); FAILED(hr))
         return hr;
+    if (query == GWQUERY_OPERATORS || query == GWQUERY_OWNERS)
+        return ut::ExportBoundary([&] { return HandOutStacked(query, filter, iid, objects); });
     if (query != GWQUERY_NESTED)
         return E_INVALIDARG;
     return ut::ExportBoundary([&] {
@@ -363,6 +376,25 @@ HRESULT SceneObject::QueryObjects(ULONG query, ULONG, ULONG, REFGUID filter, REF
         }
         return HandOutObjects(std::move(answered), objects);
     });
+}
+
+HRESULT SceneObject::HandOutStacked(ULONG query, REFGUID filter, REFIID iid, IGWEnumObjects** objects) {
+    std::vector<ut::ComPtr<IUnknown>> answered;
+    if (query == GWQUERY_OWNERS && parent_) {
+        ut::ComPtr<IUnknown> owner;
+        if (SUCCEEDED(parent_->QueryInterface(iid, owner.PutVoid())))
+            answered.push_back(std::move(owner));
+    }
+    for (const ut::ComPtr<StackedOperator>& stacked :
+         query == GWQUERY_OPERATORS ? operators_ : decltype(operators_){}) {
+        CLSID clsid = GUID_NULL;
+        ut::ComPtr<IUnknown> one;
+        if ((IsEqualGUID(filter, GUID_NULL) ||
+             (SUCCEEDED(stacked->GetClassID(&clsid)) && IsEqualGUID(clsid, filter))) &&
+            SUCCEEDED(stacked->QueryInterface(iid, one.PutVoid())))
+            answered.push_back(std::move(one));
+    }
+    return HandOutObjects(std::move(answered), objects);
 }
 
 SceneObject* SceneObject::Referenced() {
@@ -446,10 +478,11 @@ HRESULT SceneObject::MoveComponent(const tagGWComponent& component, LONG destina
     return ut::ExportBoundary([&] {
         children_.reserve(children_.size() + 1); // the detach below cannot be undone
         moved->Detach();
-        auto at = destination == GWDEST_FIRST  ? children_.begin()
-                  : destination == GWDEST_LAST ? children_.end()
-                                               : std::find_if(children_.begin(), children_.end(),
-                                                              [&](const auto& child) { return child.Get() == anchor; });
+        auto at = destination == GWDEST_FIRST ? children_.begin()
+                  : destination == GWDEST_LAST
+                      ? children_.end()
+                      : std::find_if(children_.begin(), children_.end(),
+                                     [&](const auto& child) { return child.Get() == anchor; });
         if (destination == GWDEST_AFTER)
             ++at;
         children_.insert(at, moved);

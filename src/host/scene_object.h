@@ -16,6 +16,7 @@
 #include <ut/sdk/hierarchy.h>
 #include <ut/sdk/scene.h>
 
+#include "media.h"
 #include "property_set.h"
 
 namespace ut::host {
@@ -59,7 +60,8 @@ public:
     HRESULT STDMETHODCALLTYPE GetFlags(ULONG* flags) override;
     HRESULT STDMETHODCALLTYPE FindParameter(REFGUID id, tagGWComponent* parameter) override;
     // GWQUERY_NESTED: the objects right below this one (each a hierarchy of its own), then the
-    // model it references; `filter` keeps those of that family.
+    // model it references; `filter` keeps those of that family. GWQUERY_OPERATORS: the operator
+    // stack, top first (`filter` a class); GWQUERY_OWNERS: the parent.
     HRESULT STDMETHODCALLTYPE QueryObjects(ULONG query, ULONG scope, ULONG depth, REFGUID filter, REFIID iid,
                                            IGWEnumObjects** objects) override;
 
@@ -119,6 +121,7 @@ private:
     void AddExtents(double (&offset)[3], bool withChildren, const double* matrix, C3DBBox& box) const;
     // The model this object references; null when it references none or the name is not a model.
     SceneObject* Referenced();
+    HRESULT HandOutStacked(ULONG query, REFGUID filter, REFIID iid, IGWEnumObjects** objects);
 
     std::wstring name_;
     bool model_;
@@ -126,6 +129,7 @@ private:
     ULONG flags_ = 0;
     std::vector<GUID> families_;
     std::wstring references_;
+    std::vector<ut::ComPtr<StackedOperator>> operators_; // top first
     std::vector<double> extent_;
     std::vector<double> position_;
     ULONG serial_;

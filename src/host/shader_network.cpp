@@ -112,6 +112,11 @@ public:
         return HandOut("IGWNamedObject::GetNameSpace", nameSpace_, current);
     }
     HRESULT STDMETHODCALLTYPE GetPreferredNameSpace(I3DGenericNameSpace** preferred) override;
+    HRESULT STDMETHODCALLTYPE GetName(wchar_t** name) override {
+        if (HRESULT hr = ut::sdk::CheckHostFault("IGWNamedObject::GetName"); FAILED(hr))
+            return hr;
+        return ut::ExportBoundary([&] { return CopyToTaskMemory(name_, name); });
+    }
 
     const std::wstring name_;
     NameSpaceObject* nameSpace_ = nullptr; // the network holds its name spaces

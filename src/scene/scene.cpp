@@ -12,6 +12,7 @@
 #include <ut/sdk/views.h>
 #include <ut/time.h>
 
+#include "scene/scene_access.h"
 #include "util/host_variant.h"
 
 namespace ut::scene {
@@ -214,6 +215,15 @@ tagGWPLAYCONTROLSETTINGS ResetSettings(bool full) {
 }
 
 } // namespace
+
+HRESULT CurrentSceneContainer(REFGUID key, REFIID iid, void** out) {
+    return SceneContainer(key, iid, out);
+}
+
+HRESULT AppendToList(I3DList& list, IUnknown* target) {
+    return AppendElement(list, target);
+}
+
 } // namespace ut::scene
 
 using ut::scene::ClearOut;

@@ -11,8 +11,13 @@
 //                          "parameters": [{"id": "{...}", "name": "x", "value": 1.5}]}]}]},
 //       {"name": "Camera1", "families": ["{9F43B240-58E5-11D0-8469-00A024C7919C}"]}
 //     ],
-//     "containers": {"layers": ["Background"], "passes": ["Beauty"]}
+//     "containers": {"layers": ["Background"], "passes": ["Beauty"]},
+//     "sources": [{"name": "plate", "path": "C:\\plates\\a.pic"}],
+//     "clips": [{"name": "plate_clip", "source": "plate"}]
 //   }
+//
+// An object's "operators" lists the classes of its operator stack, top first; a source or clip
+// "class" defaults to the image source and image clip classes, and "hidden" hides it from lists.
 //
 // Every key is optional. Object names need not be unique; the first in depth-first order is the
 // one found by name. A property set's members are further property sets ("properties" again).
@@ -24,6 +29,7 @@
 #include <vector>
 
 #include <ut/platform/com.h>
+#include <ut/sdk/sources.h>
 
 namespace ut::host {
 
@@ -60,6 +66,24 @@ struct ObjectDescription {
     // position relative to its parent. Set in code only: the JSON form leaves them out.
     std::vector<double> extent = {};
     std::vector<double> position = {};
+    // The classes of the operators stacked on the object, top first.
+    std::vector<GUID> operators = {};
+};
+
+// A source of the scene: a file of images or animation.
+struct SourceDescription {
+    GUID clsid = CLSID_3DImageSource;
+    std::wstring name = {};
+    std::wstring path = {};
+    bool hidden = false;
+};
+
+// A clip of the scene: a use of the source named `source` (none when no source has the name).
+struct ClipDescription {
+    GUID clsid = CLSID_3DImageClip;
+    std::wstring name = {};
+    std::wstring source = {};
+    bool hidden = false;
 };
 
 // The member names of the scene's containers and of the content container's folders.
@@ -81,6 +105,9 @@ struct SceneDescription {
     // The objects below the root model.
     std::vector<ObjectDescription> objects = {};
     ContainersDescription containers = {};
+    // The sources and clips containers' members, in order.
+    std::vector<SourceDescription> sources = {};
+    std::vector<ClipDescription> clips = {};
 };
 
 // Reads a description. A text that is not one answers E_INVALIDARG with `error` set to one line

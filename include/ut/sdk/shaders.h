@@ -92,6 +92,8 @@ struct IGWNamedObject : IUnknown {
     // The name space the object would rather be in: S_OK with it, S_FALSE and null for no
     // preference.
     virtual HRESULT STDMETHODCALLTYPE GetPreferredNameSpace(I3DGenericNameSpace** preferred) = 0;
+    // The object's name, task-allocated (the caller frees it with CoTaskMemFree).
+    virtual HRESULT STDMETHODCALLTYPE GetName(wchar_t** name) = 0;
 
 protected:
     ~IGWNamedObject() = default;

@@ -1,0 +1,16 @@
+// What other subsystems of the library share of scene access.
+#pragma once
+
+#include <ut/platform/com.h>
+#include <ut/sdk/list.h>
+
+namespace ut::scene {
+
+// The current scene's container kept under `key`, through `iid`: E_POINTER for a null `out`,
+// which is cleared first.
+HRESULT CurrentSceneContainer(REFGUID key, REFIID iid, void** out);
+
+// Appends one element pointing at `target` to `list`; E_FAIL when any step fails.
+HRESULT AppendToList(I3DList& list, IUnknown* target);
+
+} // namespace ut::scene
