@@ -4,6 +4,8 @@
 
 #include <string>
 
+#include <ut/host/reference_scene.h>
+
 namespace CLI {
 class App;
 }
@@ -26,6 +28,11 @@ struct Exit {
     throw Exit{status, std::move(message)};
 }
 
+// The scene the scene commands set up when no description is given, and a description read from
+// a JSON file (a file that cannot be read or is no description ends the tool with status 2).
+ut::host::SceneDescription SampleScene();
+ut::host::SceneDescription ReadScene(const std::string& file);
+
 void AddDemoCommand(CLI::App& app);
 void AddFramesCommand(CLI::App& app);
 void AddSortCommand(CLI::App& app);
@@ -33,6 +40,8 @@ void AddHeaderCommand(CLI::App& app);
 void AddTimeCommand(CLI::App& app);
 void AddSceneCommand(CLI::App& app);
 void AddStreamCommand(CLI::App& app);
+// ut sources: the sources and clips of a scene.
+void AddSourcesCommand(CLI::App& app);
 // ut storage ls | cat.
 void AddStorageCommand(CLI::App& app);
 // ut validate, ut paths and ut bitmap.

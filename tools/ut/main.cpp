@@ -49,6 +49,7 @@ int main(int argc, char** argv) {
     ut::tool::AddRegistryCommand(app);
     ut::tool::AddSceneCommand(app);
     ut::tool::AddStreamCommand(app);
+    ut::tool::AddSourcesCommand(app);
     ut::tool::AddStorageCommand(app);
     ut::tool::AddFileCommands(app);
 

@@ -32,7 +32,8 @@ std::string Narrow(const wchar_t* text) {
     return text ? ut::platform::Utf8FromWide(text) : std::string();
 }
 
-// What the command shows when no file is given.
+} // namespace
+
 ut::host::SceneDescription SampleScene() {
     using namespace ut::host;
     constexpr GUID transform = {0x6E2F1C3A, 0x2B1D, 0x4C55, {0x9A, 0x11, 0x3E, 0x6B, 0x55, 0x0D, 0x2A, 0x10}};
@@ -49,6 +50,9 @@ ut::host::SceneDescription SampleScene() {
                      {.name = L"Camera1", .families = {GUID_3DCameraFamily}},
                      {.name = L"Light"}};
     scene.containers.layers = {L"Background"};
+    scene.sources = {{.name = L"plate", .path = L"C:\\plates\\plate.####.pic"},
+                     {.name = L"reference", .path = L"C:\\plates\\reference.pic"}};
+    scene.clips = {{.name = L"plate_clip", .source = L"plate"}};
     return scene;
 }
 
@@ -63,6 +67,8 @@ ut::host::SceneDescription ReadScene(const std::string& file) {
         Fail(kExitUsage, file + ": " + error);
     return scene;
 }
+
+namespace {
 
 // The names of the property sets the object owns, as one text.
 std::string PropertySetNames(I3DObject& object) {
