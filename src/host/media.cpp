@@ -7,6 +7,19 @@
 #include "list.h"
 
 namespace ut::host {
+namespace {
+
+// IPersist::GetClassID of a host object of class `own`.
+HRESULT AnswerClass(const CLSID& own, CLSID* clsid) {
+    if (HRESULT hr = ut::sdk::CheckHostFault("IPersist::GetClassID"); FAILED(hr))
+        return hr;
+    if (!clsid)
+        return E_POINTER;
+    *clsid = own;
+    return S_OK;
+}
+
+} // namespace
 
 MediaItem::MediaItem(const SourceDescription& source)
     : clip_(false), clsid_(source.clsid), name_(source.name), path_(source.path), hidden_(source.hidden) {}
@@ -33,12 +46,7 @@ ClipDescription MediaItem::DescribeClip() const {
 }
 
 HRESULT MediaItem::GetClassID(CLSID* clsid) {
-    if (HRESULT hr = ut::sdk::CheckHostFault("IPersist::GetClassID"); FAILED(hr))
-        return hr;
-    if (!clsid)
-        return E_POINTER;
-    *clsid = clsid_;
-    return S_OK;
+    return AnswerClass(clsid_, clsid);
 }
 
 HRESULT MediaItem::GetNameSpace(I3DGenericNameSpace** current) {
@@ -172,12 +180,7 @@ std::span<const CGWCOMObject::InterfaceEntry> StackedOperator::GetInterfaceMap()
 }
 
 HRESULT StackedOperator::GetClassID(CLSID* clsid) {
-    if (HRESULT hr = ut::sdk::CheckHostFault("IPersist::GetClassID"); FAILED(hr))
-        return hr;
-    if (!clsid)
-        return E_POINTER;
-    *clsid = clsid_;
-    return S_OK;
+    return AnswerClass(clsid_, clsid);
 }
 
 } // namespace ut::host
