@@ -1,12 +1,13 @@
 // The reference host's plug-in registry and its items.
 #include "application.h"
 
-#include <cstring>
 #include <cwctype>
 #include <new>
 
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/testing.h>
+
+#include "host_support.h"
 
 namespace ut::host {
 namespace {
@@ -19,16 +20,7 @@ public:
         static const InterfaceEntry map[] = {sdk::Entry<PluginItem, IKXPluginItem>(IID_IKXPluginItem)};
         return map;
     }
-    HRESULT STDMETHODCALLTYPE GetName(wchar_t** name) override {
-        if (!name)
-            return E_POINTER;
-        std::size_t bytes = (name_.size() + 1) * sizeof(wchar_t);
-        *name = static_cast<wchar_t*>(CoTaskMemAlloc(bytes));
-        if (!*name)
-            return E_OUTOFMEMORY;
-        std::memcpy(*name, name_.c_str(), bytes);
-        return S_OK;
-    }
+    HRESULT STDMETHODCALLTYPE GetName(wchar_t** name) override { return CopyToTaskMemory(name_, name); }
     HRESULT STDMETHODCALLTYPE GetKind(GUID* kind) override {
         if (!kind)
             return E_POINTER;

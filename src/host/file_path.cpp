@@ -1,12 +1,13 @@
 // The reference host's path conventions: linked, absolute and project-relative paths.
 #include "file_path.h"
 
-#include <cstring>
 #include <cwctype>
 #include <new>
 
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/testing.h>
+
+#include "host_support.h"
 
 #include "install_locations.h"
 
@@ -60,15 +61,7 @@ HRESULT FilePath::GetResolvedPath(wchar_t** path) {
         return hr;
     if (!path_)
         return E_UNEXPECTED;
-    return ExportBoundary([&] {
-        std::wstring resolved = Resolve(*path_);
-        std::size_t bytes = (resolved.size() + 1) * sizeof(wchar_t);
-        *path = static_cast<wchar_t*>(CoTaskMemAlloc(bytes));
-        if (!*path)
-            return E_OUTOFMEMORY;
-        std::memcpy(*path, resolved.c_str(), bytes);
-        return S_OK;
-    });
+    return ExportBoundary([&] { return CopyToTaskMemory(Resolve(*path_), path); });
 }
 
 HRESULT FilePath::GetPathType(tagEGWFilePathType* type) {

@@ -2,7 +2,6 @@
 #include "install_locations.h"
 
 #include <cstdlib>
-#include <cstring>
 #include <cwctype>
 
 #include <ut/platform/detail/boundary.h>
@@ -11,16 +10,15 @@
 #include <ut/sdk/preferences.h>
 #include <ut/sdk/testing.h>
 
+#include "host_support.h"
+
 namespace ut::host {
 namespace {
 
+// A copy in task memory; S_FALSE for an empty text, which is still handed out.
 HRESULT TaskText(const std::wstring& text, wchar_t** out) {
-    std::size_t bytes = (text.size() + 1) * sizeof(wchar_t);
-    *out = static_cast<wchar_t*>(CoTaskMemAlloc(bytes));
-    if (!*out)
-        return E_OUTOFMEMORY;
-    std::memcpy(*out, text.c_str(), bytes);
-    return text.empty() ? S_FALSE : S_OK;
+    HRESULT hr = CopyToTaskMemory(text, out);
+    return SUCCEEDED(hr) && text.empty() ? S_FALSE : hr;
 }
 
 std::wstring Environment(const char* name) {

@@ -1,12 +1,13 @@
 // The reference host's preferences, one registry value each.
 #include "preferences.h"
 
-#include <cstring>
 #include <string>
 
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/detail/registry.h>
 #include <ut/sdk/testing.h>
+
+#include "host_support.h"
 
 namespace ut::host {
 
@@ -29,12 +30,7 @@ HRESULT Preferences::GetText(const wchar_t* name, wchar_t** text) {
             return DISP_E_TYPEMISMATCH;
         if (read != ERROR_SUCCESS)
             return HRESULT_FROM_WIN32(static_cast<DWORD>(read));
-        std::size_t bytes = (value.size() + 1) * sizeof(wchar_t);
-        *text = static_cast<wchar_t*>(CoTaskMemAlloc(bytes));
-        if (!*text)
-            return E_OUTOFMEMORY;
-        std::memcpy(*text, value.c_str(), bytes);
-        return S_OK;
+        return CopyToTaskMemory(value, text);
     });
 }
 
