@@ -30,15 +30,6 @@ constexpr ULONG kTransientFlags = 1;
 // What the transient object container answers for an object it does not hold.
 constexpr HRESULT kNotHeld = S_FALSE;
 
-// Clears an out-parameter, or answers `ifNull` when there is none.
-template <class Out>
-HRESULT ClearOut(Out** out, HRESULT ifNull = E_POINTER) {
-    if (!out)
-        return ifNull;
-    *out = nullptr;
-    return S_OK;
-}
-
 // Any success as S_OK.
 HRESULT Normalised(HRESULT hr) {
     return FAILED(hr) ? hr : S_OK;

@@ -14,14 +14,7 @@
 namespace {
 
 using ut::ComPtr;
-
-template <class Out>
-bool Cleared(Out** out) {
-    if (!out)
-        return false;
-    *out = nullptr;
-    return true;
-}
+using ut::scene::ClearOut;
 
 // The next element of a list's enumeration; false after the last (or when the host fails).
 bool NextElement(IEnum3DElemRef& elements, ComPtr<I3DElemRef>& element) {
@@ -62,8 +55,8 @@ HRESULT ChooseContainer(REFGUID key, IGWContentContainer& content,
 }
 
 HRESULT ObjectsList(REFGUID containerKey, REFGUID classId, I3DList** out) {
-    if (!Cleared(out))
-        return E_POINTER;
+    if (HRESULT hr = ClearOut(out); FAILED(hr))
+        return hr;
     ComPtr<I3DList> list;
     ComPtr<IGWContentContainer> content;
     ComPtr<I3DSourceClipContainer> container;
@@ -95,8 +88,8 @@ HRESULT ListElements(REFGUID containerKey, REFGUID classId, ComPtr<IEnum3DElemRe
 }
 
 HRESULT FindSource(REFGUID sourceClass, const CKXString& path, REFIID iid, void** out) {
-    if (!Cleared(out))
-        return E_POINTER;
+    if (HRESULT hr = ClearOut(out); FAILED(hr))
+        return hr;
     ComPtr<IEnum3DElemRef> elements;
     if (FAILED(ListElements(GUID_3DSourcesContainerKey, sourceClass, elements)))
         return E_FAIL;
@@ -130,8 +123,8 @@ HRESULT AppendSource(I3DList& list, I3DSource& source) {
 }
 
 HRESULT FindAllSources(REFGUID sourceClass, const CKXString& path, I3DList** out) {
-    if (!Cleared(out))
-        return E_POINTER;
+    if (HRESULT hr = ClearOut(out); FAILED(hr))
+        return hr;
     if (HRESULT hr = KXCreateInstance(CLSID_3DList, IID_I3DList, reinterpret_cast<void**>(out)); FAILED(hr))
         return hr;
     if (!*out)
@@ -163,8 +156,8 @@ HRESULT FindAllSources(REFGUID sourceClass, const CKXString& path, I3DList** out
 }
 
 HRESULT FindClip(REFGUID clipClass, IUnknown* source, REFIID iid, void** out) {
-    if (!Cleared(out))
-        return E_POINTER;
+    if (HRESULT hr = ClearOut(out); FAILED(hr))
+        return hr;
     if (!source)
         return E_INVALIDARG;
     ComPtr<IEnum3DElemRef> elements;
@@ -183,8 +176,10 @@ HRESULT FindClip(REFGUID clipClass, IUnknown* source, REFIID iid, void** out) {
 }
 
 HRESULT TopMostOperator(IUnknown* object, ULONG scope, ULONG depth, REFGUID classId, REFIID iid, void** out) {
-    if (!object || !Cleared(out))
+    if (!object)
         return E_POINTER;
+    if (HRESULT hr = ClearOut(out); FAILED(hr))
+        return hr;
     ComPtr<IGWActiveData> data;
     ComPtr<IGWEnumObjects> operators;
     if (FAILED(object->QueryInterface(IID_IGWActiveData, data.PutVoid())) || !data ||
@@ -271,8 +266,8 @@ HRESULT ClipList(Entries& entries, bool sort) {
 }
 
 HRESULT PrimaryFolder(IUnknown* action, REFIID iid, void** out) {
-    if (!Cleared(out))
-        return E_POINTER;
+    if (HRESULT hr = ClearOut(out); FAILED(hr))
+        return hr;
     ComPtr<IGWActiveData> data;
     ComPtr<IGWEnumObjects> owners;
     ComPtr<IUnknown> folder;
