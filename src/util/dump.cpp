@@ -4,7 +4,6 @@
 #include <algorithm>
 #include <cinttypes>
 #include <cstdint>
-#include <cstring>
 #include <memory>
 #include <mutex>
 #include <utility>
@@ -47,14 +46,16 @@ void ToDebugger(std::wstring_view text) {
         ut::platform::WriteDebugOutput(std::wstring(text).c_str());
 }
 
-// printf-style pieces, formatted narrow (numbers and ASCII only) and widened.
+// printf-style pieces, formatted narrow (numbers and ASCII only) and widened, at any length.
 template <class... Args>
 std::wstring Format(const char* format, Args... args) {
-    char text[64];
-    int length = std::snprintf(text, sizeof text, format, args...);
-    return length > 0 ? std::wstring(text, text + std::min<std::size_t>(static_cast<std::size_t>(length),
-                                                                        sizeof text - 1))
-                      : std::wstring();
+    int length = std::snprintf(nullptr, 0, format, args...);
+    if (length <= 0)
+        return std::wstring();
+    std::string text(static_cast<std::size_t>(length) + 1, '\0');
+    std::snprintf(text.data(), text.size(), format, args...);
+    text.pop_back();
+    return std::wstring(text.begin(), text.end());
 }
 
 std::wstring Address(const void* pointer) {
@@ -88,16 +89,10 @@ std::wstring ValueLine(const VARIANT& value) {
         return Format(": INTEGER4 %d\n", static_cast<int>(value.lVal));
     case VT_UI1:
         return Format(": INTEGER1 %d\n", static_cast<int>(value.bVal));
-    case VT_R4: {
-        char text[512]; // "%f" of the largest float is 47 characters; of a double, 316
-        std::snprintf(text, sizeof text, ": FLOAT_F  %f\n", static_cast<double>(value.fltVal));
-        return std::wstring(text, text + std::strlen(text));
-    }
-    case VT_R8: {
-        char text[512];
-        std::snprintf(text, sizeof text, ": FLOAT_D  %f\n", value.dblVal);
-        return std::wstring(text, text + std::strlen(text));
-    }
+    case VT_R4:
+        return Format(": FLOAT_F  %f\n", static_cast<double>(value.fltVal));
+    case VT_R8:
+        return Format(": FLOAT_D  %f\n", value.dblVal);
     case VT_BOOL:
         return std::wstring(L": BOOL     ") + (value.boolVal ? L"true" : L"false") + L"\n";
     case VT_UNKNOWN:
@@ -246,12 +241,18 @@ class HierarchyWriter {
 public:
     HierarchyWriter(ActiveDataLog& log, int level) : log_(log), level_(level) {}
 
+    // Writes the hierarchy from its root at `depth`; one "<more...>" stands for it past the level
+    // asked for or where it is already being written further out.
     void Write(IGWComponentHierarchy* hierarchy, int depth) {
+        ut::ComPtr<IUnknown> identity;
+        (void)hierarchy->QueryInterface(IID_IUnknown, identity.PutVoid());
+        if (!Within(depth) || std::find(open_.begin(), open_.end(), identity.Get()) != open_.end()) {
+            More(depth);
+            return;
+        }
         tagGWComponent root{};
         if (FAILED(hierarchy->GetRootComponent(&root)))
             return;
-        ut::ComPtr<IUnknown> identity;
-        (void)hierarchy->QueryInterface(IID_IUnknown, identity.PutVoid());
         open_.push_back(identity.Get());
         WriteComponent(hierarchy, root, depth);
         open_.pop_back();
@@ -270,12 +271,12 @@ private:
         log_.Write(line +
                    (nested ? L": IUnknown " + Address(nested.Get()) + L"\n" : std::wstring(L": VT_EMPTY\n")));
         if (nested)
-            WriteNested(nested.Get(), depth + 1);
+            Write(nested.Get(), depth + 1);
         tagGWComponent child{};
         if (hierarchy->GetFirstChild(component, GWCOMPONENT_ANY_DEPTH, &child) != S_OK)
             return;
         if (!Within(depth + 1)) {
-            log_.Write(Indent(depth + 1) + L"<more...>\n");
+            More(depth + 1);
             return;
         }
         for (bool more = true; more;) {
@@ -286,16 +287,7 @@ private:
         }
     }
 
-    void WriteNested(IGWComponentHierarchy* nested, int depth) {
-        ut::ComPtr<IUnknown> identity;
-        (void)nested->QueryInterface(IID_IUnknown, identity.PutVoid());
-        bool cycle = std::find(open_.begin(), open_.end(), identity.Get()) != open_.end();
-        if (!Within(depth) || cycle) {
-            log_.Write(Indent(depth) + L"<more...>\n");
-            return;
-        }
-        Write(nested, depth);
-    }
+    void More(int depth) { log_.Write(Indent(depth) + L"<more...>\n"); }
 
     bool Within(int depth) const { return level_ < 0 || depth <= level_; }
 
