@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cerrno>
+#include <cstdlib>
 #include <string>
 #include <string_view>
 
@@ -16,6 +17,17 @@ inline std::string SystemPath(std::wstring_view path) {
         if (c == '\\')
             c = '/';
     return text;
+}
+
+// A file of the user's in one of the folders the desktop's base directories name: below the
+// folder the environment variable `variable` holds when it is an absolute path, else below
+// $HOME/`homeDefault` (".local/share", ".local/state"); empty when there is no home either.
+inline std::string UserFolderFile(const char* variable, const char* homeDefault, const char* relative) {
+    if (const char* folder = std::getenv(variable); folder && *folder == '/')
+        return std::string(folder) + "/" + relative;
+    if (const char* home = std::getenv("HOME"); home && *home)
+        return std::string(home) + "/" + homeDefault + "/" + relative;
+    return std::string();
 }
 
 // The storage code for a failed file operation.

@@ -9,6 +9,7 @@
 #include <ut/platform/text.h>
 
 #include "common/error_output.h"
+#include "path.h"
 
 namespace ut::platform {
 
@@ -46,20 +47,14 @@ void WriteDebugOutput(const wchar_t* text) {
 }
 
 std::wstring DumpLogPath() {
-    constexpr const char* kName = "KXDumpActiveData.log";
     if (const char* named = std::getenv("UT_DUMP_LOG"); named && *named)
         return WideFromUtf8(named);
-    std::filesystem::path folder;
-    if (const char* state = std::getenv("XDG_STATE_HOME"); state && *state == '/')
-        folder = state;
-    else if (const char* home = std::getenv("HOME"); home && *home)
-        folder = std::filesystem::path(home) / ".local" / "state";
-    else
-        return WideFromUtf8(kName); // nowhere better: the working folder
-    folder /= "ut";
-    std::error_code ignored; // a folder that cannot be made shows when the log does not open
-    std::filesystem::create_directories(folder, ignored);
-    return WideFromUtf8((folder / kName).string());
+    std::string path = posix::UserFolderFile("XDG_STATE_HOME", ".local/state", "ut/KXDumpActiveData.log");
+    if (path.empty())
+        return L"KXDumpActiveData.log"; // nowhere better: the working folder
+    std::error_code ignored;            // a folder that cannot be made shows when the log does not open
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path(), ignored);
+    return WideFromUtf8(path);
 }
 
 std::FILE* OpenFileForAppend(const std::wstring& path) {

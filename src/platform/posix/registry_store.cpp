@@ -14,16 +14,14 @@
 #include <ut/platform/process.h>
 #include <ut/platform/text.h>
 
+#include "path.h"
+
 namespace ut::platform {
 
 std::string RegistryStorePath() {
     if (const char* named = std::getenv("UT_REGISTRY"); named && *named)
         return named;
-    if (const char* data = std::getenv("XDG_DATA_HOME"); data && *data == '/')
-        return std::string(data) + "/ut/registry.db";
-    if (const char* home = std::getenv("HOME"); home && *home)
-        return std::string(home) + "/.local/share/ut/registry.db";
-    return std::string();
+    return posix::UserFolderFile("XDG_DATA_HOME", ".local/share", "ut/registry.db");
 }
 
 } // namespace ut::platform
