@@ -136,14 +136,7 @@ HRESULT MediaContainer::EnumChildren(REFGUID filter, REFIID iid, IGWEnumObjects*
         return hr;
     return ut::ExportBoundary([&] {
         std::vector<ut::ComPtr<IUnknown>> answered;
-        for (const ut::ComPtr<MediaItem>& member : members_) {
-            CLSID clsid = GUID_NULL;
-            (void)member->GetClassID(&clsid);
-            ut::ComPtr<IUnknown> one;
-            if ((IsEqualGUID(filter, GUID_NULL) || IsEqualGUID(filter, clsid)) &&
-                SUCCEEDED(member->QueryInterface(iid, one.PutVoid())))
-                answered.push_back(std::move(one));
-        }
+        AppendOfClass(members_, filter, iid, answered);
         return HandOutObjects(std::move(answered), children);
     });
 }

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <ut/host/reference_scene.h>
@@ -67,6 +68,21 @@ public:
 private:
     std::vector<ut::ComPtr<MediaItem>> members_;
 };
+
+// Appends to `answered`, through `iid`, each of `members` whose class is `filter` (GUID_NULL:
+// every one), in order.
+template <class Member>
+void AppendOfClass(const std::vector<ut::ComPtr<Member>>& members, REFGUID filter, REFIID iid,
+                   std::vector<ut::ComPtr<IUnknown>>& answered) {
+    for (const ut::ComPtr<Member>& member : members) {
+        CLSID clsid = GUID_NULL;
+        ut::ComPtr<IUnknown> one;
+        if ((IsEqualGUID(filter, GUID_NULL) ||
+             (SUCCEEDED(member->GetClassID(&clsid)) && IsEqualGUID(clsid, filter))) &&
+            SUCCEEDED(member->QueryInterface(iid, one.PutVoid())))
+            answered.push_back(std::move(one));
+    }
+}
 
 // The sources and clips containers a scene description describes; false when memory ran out.
 bool BuildMedia(const SceneDescription& description, ut::ComPtr<MediaContainer>& sources,

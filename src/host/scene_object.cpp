@@ -385,15 +385,8 @@ HRESULT SceneObject::HandOutStacked(ULONG query, REFGUID filter, REFIID iid, IGW
         if (SUCCEEDED(parent_->QueryInterface(iid, owner.PutVoid())))
             answered.push_back(std::move(owner));
     }
-    for (const ut::ComPtr<StackedOperator>& stacked :
-         query == GWQUERY_OPERATORS ? operators_ : decltype(operators_){}) {
-        CLSID clsid = GUID_NULL;
-        ut::ComPtr<IUnknown> one;
-        if ((IsEqualGUID(filter, GUID_NULL) ||
-             (SUCCEEDED(stacked->GetClassID(&clsid)) && IsEqualGUID(clsid, filter))) &&
-            SUCCEEDED(stacked->QueryInterface(iid, one.PutVoid())))
-            answered.push_back(std::move(one));
-    }
+    if (query == GWQUERY_OPERATORS)
+        AppendOfClass(operators_, filter, iid, answered);
     return HandOutObjects(std::move(answered), objects);
 }
 
