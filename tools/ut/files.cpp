@@ -1,5 +1,6 @@
 // ut validate, ut paths and ut bitmap: the file helpers on the reference host.
 #include <cstdio>
+#include <iterator>
 #include <memory>
 #include <string>
 #include <vector>
@@ -44,7 +45,7 @@ void Validate(const ValidateArguments& arguments) {
 void Paths(const std::string& kind) {
     ut::host::ReferenceHost host;
     bool any = false;
-    for (int type = 0; type < 8; ++type) {
+    for (int type = 0; type < static_cast<int>(std::size(kKinds)); ++type) {
         if (!kind.empty() && kind != kKinds[type] && kind != std::to_string(type))
             continue;
         std::vector<CKXString> paths;
@@ -99,11 +100,13 @@ void AddFileCommands(CLI::App& app) {
 
     CLI::App* paths = app.add_subcommand("paths", "Print the install folders, or those of one KIND.");
     auto kind = std::make_shared<std::string>();
-    paths
-        ->add_option("KIND", *kind,
-                     "project, user, workgroup, root, addons, user_addons, workgroup_addons, none")
-        ->check(CLI::IsMember({"project", "user", "workgroup", "root", "addons", "user_addons",
-                               "workgroup_addons", "none", "0", "1", "2", "3", "4", "5", "6", "7"}));
+    std::vector<std::string> accepted(std::begin(kKinds), std::end(kKinds));
+    std::string names;
+    for (std::size_t type = 0; type < std::size(kKinds); ++type) {
+        names += (type ? ", " : "") + std::string(kKinds[type]);
+        accepted.push_back(std::to_string(type)); // a kind by its number too
+    }
+    paths->add_option("KIND", *kind, names)->check(CLI::IsMember(accepted));
     paths->footer(
         "The reference host reads them from its preferences (\"paths.user\", ...) and the environment "
         "(UT_USER_PATH, ...). Exit status 1 when there is none.\nExample:\n  ut paths user\n  /home/me\\ut");
