@@ -26,25 +26,24 @@ struct SourcesOptions {
 
 using Entries = std::vector<std::pair<unsigned int, CKXString>>;
 
-// The member at `index` of the list `classes` make together, as the name lists count them.
-ut::ComPtr<IUnknown> MemberAt(const std::vector<GUID>& classes, bool clips, unsigned int index) {
+// The members of `classes`, one list after the other, as the name lists count them.
+std::vector<ut::ComPtr<IUnknown>> Members(const std::vector<GUID>& classes, bool clips) {
+    std::vector<ut::ComPtr<IUnknown>> members;
     for (const GUID& clsid : classes) {
         ut::ComPtr<I3DList> list;
         ULONG count = 0;
         if (FAILED(clips ? F3DGetClipsList(clsid, list.Put()) : F3DGetSourcesList(clsid, list.Put())) ||
             FAILED(list->GetCount(&count)))
             continue;
-        if (index >= count) {
-            index -= count;
-            continue;
+        for (ULONG i = 0; i < count; ++i) {
+            ut::ComPtr<I3DElemRef> element;
+            ut::ComPtr<IUnknown> member;
+            if (SUCCEEDED(list->GetItem(i, element.Put())))
+                (void)element->GetTarget(IID_IUnknown, member.PutVoid(), 1); // none shows as no detail
+            members.push_back(std::move(member));
         }
-        ut::ComPtr<I3DElemRef> element;
-        ut::ComPtr<IUnknown> member;
-        if (SUCCEEDED(list->GetItem(index, element.Put())))
-            (void)element->GetTarget(IID_IUnknown, member.PutVoid(), 1); // none shows as no detail
-        return member;
     }
-    return {};
+    return members;
 }
 
 // A source's file, or the name of the source a clip uses.
@@ -68,13 +67,13 @@ nlohmann::ordered_json List(bool clips) {
     (void)(clips ? F3DMakeClipList(entries, true) : F3DMakeSourceList(entries, true)); // none: empty
     const std::vector<GUID> classes = clips ? std::vector<GUID>{CLSID_3DImageClip}
                                             : std::vector<GUID>{CLSID_3DImageSource, CLSID_3DListedSource};
+    std::vector<ut::ComPtr<IUnknown>> members = Members(classes, clips);
     nlohmann::ordered_json list = nlohmann::ordered_json::array();
-    for (const auto& [index, name] : entries) {
-        ut::ComPtr<IUnknown> member = MemberAt(classes, clips, index);
-        list.push_back({{"index", index},
-                        {"name", ut::platform::Utf8FromWide(name.View())},
-                        {clips ? "source" : "path", Detail(member.Get())}});
-    }
+    for (const auto& [index, name] : entries)
+        list.push_back(
+            {{"index", index},
+             {"name", ut::platform::Utf8FromWide(name.View())},
+             {clips ? "source" : "path", Detail(index < members.size() ? members[index].Get() : nullptr)}});
     return list;
 }
 
@@ -89,11 +88,12 @@ void Show(const SourcesOptions& options) {
         std::printf("%s\n", shown.dump().c_str());
         return;
     }
-    for (const char* kind : {"sources", "clips"})
-        for (const auto& entry : shown[kind])
-            std::printf("%-6s %2u  %s  %s\n", kind == std::string("clips") ? "clip" : "source",
-                        entry["index"].get<unsigned>(), entry["name"].get<std::string>().c_str(),
-                        entry[kind == std::string("clips") ? "source" : "path"].get<std::string>().c_str());
+    // Each list's key, the word of its lines, and the key of its detail.
+    const char* const kinds[][3] = {{"sources", "source", "path"}, {"clips", "clip", "source"}};
+    for (const auto& [key, word, detail] : kinds)
+        for (const auto& entry : shown[key])
+            std::printf("%-6s %2u  %s  %s\n", word, entry["index"].get<unsigned>(),
+                        entry["name"].get<std::string>().c_str(), entry[detail].get<std::string>().c_str());
 }
 
 } // namespace
