@@ -15,6 +15,7 @@
 #include <ut/notify.h>
 #include <ut/paths.h>
 #include <ut/persist.h>
+#include <ut/presets.h>
 #include <ut/registration.h>
 #include <ut/scene.h>
 #include <ut/shaders.h>
