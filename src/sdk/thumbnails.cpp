@@ -105,7 +105,7 @@ bool DecodeSet(const Bytes& bytes, std::size_t at, PropertySet& set) {
     std::vector<std::pair<std::uint32_t, std::uint32_t>> byOffset = entries;
     std::sort(byOffset.begin(), byOffset.end());
     for (const auto& [offset, id] : entries) {
-        auto next = std::upper_bound(byOffset.begin(), byOffset.end(), std::pair(offset, ~0u));
+        auto next = std::upper_bound(byOffset.begin(), byOffset.end(), std::pair(offset, id));
         std::uint32_t end = next == byOffset.end() ? size : next->first;
         if (end - offset < 4) // two values at one place, or no room for the type
             return false;
