@@ -12,59 +12,10 @@
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/testing.h>
 
+#include "image_library.h"
+
 namespace ut::host {
 namespace {
-
-class Image final : public ut::sdk::ComObject<IGWImage> {
-public:
-    Image(ULONG width, ULONG height, const GUID& format, std::vector<std::uint8_t> pixels)
-        : width_(width), height_(height), format_(format), pixels_(std::move(pixels)) {}
-
-    std::span<const InterfaceEntry> GetInterfaceMap() const override {
-        static const InterfaceEntry map[] = {sdk::Entry<Image, IGWImage>(IID_IGWImage)};
-        return map;
-    }
-    HRESULT STDMETHODCALLTYPE GetSize(ULONG* width, ULONG* height) override {
-        if (!width || !height)
-            return E_POINTER;
-        if (HRESULT hr = sdk::CheckHostFault("IGWImage::GetSize"); FAILED(hr))
-            return hr;
-        *width = width_;
-        *height = height_;
-        return S_OK;
-    }
-    HRESULT STDMETHODCALLTYPE GetPixelFormat(GUID* format) override {
-        if (!format)
-            return E_POINTER;
-        if (HRESULT hr = sdk::CheckHostFault("IGWImage::GetPixelFormat"); FAILED(hr))
-            return hr;
-        *format = format_;
-        return S_OK;
-    }
-    HRESULT STDMETHODCALLTYPE GetPixels(void** pixels) override {
-        if (!pixels)
-            return E_POINTER;
-        if (HRESULT hr = sdk::CheckHostFault("IGWImage::GetPixels"); FAILED(hr))
-            return hr;
-        *pixels = pixels_.data();
-        return S_OK;
-    }
-
-private:
-    ULONG width_, height_;
-    GUID format_;
-    std::vector<std::uint8_t> pixels_;
-};
-
-std::size_t BytesPerPixel(const GUID& format) {
-    if (format == GWPIXELFORMAT_GREY8)
-        return 1;
-    if (format == GWPIXELFORMAT_GREY16)
-        return 2;
-    if (format == GWPIXELFORMAT_RGBA32)
-        return 4;
-    return format == GWPIXELFORMAT_RGBA64 ? 8 : 0;
-}
 
 std::uint32_t Le(const std::vector<std::uint8_t>& bytes, std::size_t at, int size) {
     std::uint32_t value = 0;
@@ -90,7 +41,7 @@ HRESULT DecodeBmp(const std::vector<std::uint8_t>& file, ULONG& width, ULONG& he
     if (offset > file.size() || file.size() - offset < stride * height)
         return E_INVALIDARG;
     format = bits == 8 ? GWPIXELFORMAT_GREY8 : GWPIXELFORMAT_RGBA32;
-    std::size_t out = BytesPerPixel(format);
+    std::size_t out = PixelSize(format);
     pixels.assign(std::size_t{width} * height * out, 0);
     for (ULONG y = 0; y < height; ++y) {
         const std::uint8_t* row = file.data() + offset + stride * (rawHeight < 0 ? y : height - 1 - y);
@@ -146,7 +97,7 @@ HRESULT ImageLoader::CreateImage(ULONG width, ULONG height, REFGUID format, cons
     *image = nullptr;
     if (HRESULT hr = sdk::CheckHostFault("IGWImageLoader::CreateImage"); FAILED(hr))
         return hr;
-    std::size_t size = BytesPerPixel(format);
+    std::size_t size = PixelSize(format);
     if (!size)
         size = 4; // a format the host does not know keeps 4 bytes a pixel
     return ExportBoundary([&] {

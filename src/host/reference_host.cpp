@@ -18,18 +18,20 @@
 #include <ut/sdk/version.h>
 #include <ut/sdk/views.h>
 
+#include "active_database.h"
 #include "ambient_values.h"
 #include "application.h"
 #include "content_container.h"
 #include "families_manager.h"
 #include "file_dialogs.h"
-#include "active_database.h"
 #include "file_path.h"
+#include "host_support.h"
+#include "image_library.h"
 #include "image_loader.h"
 #include "install_locations.h"
-#include "host_support.h"
 #include "list.h"
 #include "notification_service.h"
+#include "picture_source.h"
 #include "preferences.h"
 #include "property_set.h"
 #include "scene_manager.h"
@@ -73,6 +75,9 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWProjectManager, NewService<InstallLocations>(settings).Get());
     InstallService(CLSID_KXPluginRegistry, NewService<PluginRegistry>(settings).Get());
     InstallService(CLSID_GWImageLoader, NewService<ImageLoader>(settings).Get());
+    InstallClass(CLSID_GWImage, Make<ClassFactory>(&MakeImage).Get());
+    for (const auto& [clsid, service] : PictureServices(settings)) // none without a picture
+        InstallService(clsid, service.Get());
     InstallClass(CLSID_GWFilePath,
                  ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) FilePathFactory(settings)).Get());
 }

@@ -42,6 +42,8 @@ void AddSceneCommand(CLI::App& app);
 void AddStreamCommand(CLI::App& app);
 // ut sources: the sources and clips of a scene.
 void AddSourcesCommand(CLI::App& app);
+// ut thumbnail put | get.
+void AddThumbnailCommand(CLI::App& app);
 // ut storage ls | cat.
 void AddStorageCommand(CLI::App& app);
 // ut validate, ut paths and ut bitmap.

@@ -47,6 +47,10 @@ struct Settings {
     std::vector<CLSID> propertyClasses = {GUID_GWTimeMappingProperty};
     // The parameter dictionary: parameters (by id) that are also known by a second id.
     std::vector<std::pair<GUID, GUID>> parameterAliases = {};
+    // The scene viewer's picture, for thumbnails: the BMP file `thumbnailImage`, else a rendered
+    // view of the scene when `thumbnailRender` is set; with neither, there is no viewer.
+    std::wstring thumbnailImage = {};
+    bool thumbnailRender = false;
 };
 
 class SceneManager;

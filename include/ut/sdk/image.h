@@ -1,12 +1,15 @@
-// The image library as the library sees it: an image (its size, pixel format and pixels) and
-// the service that loads one from a file.
+// The image library as the library sees it: an image (its size, pixel format and pixels), the
+// service that loads one from a file, new images of the library's image class, scaling one
+// image into another, and an image as a device bitmap.
 //
 // The reference host's loader reads uncompressed BMP files of 8 (grey palette only), 24 or 32
 // bits per pixel into images of the 4-byte colour format (8-bit grey ones into the 1-byte grey
 // format), rows top first. Every operation asks ut::sdk::CheckHostFault first, under
-// "IGWImage::<method>" and "IGWImageLoader::<method>".
+// "IGWImage::<method>", "IGWImageSetup::<method>", "IGWImageLoader::<method>" and the names of the
+// three library functions at the end of this header.
 #pragma once
 
+#include <ut/platform/bitmap.h>
 #include <ut/platform/com.h>
 #include <ut/sdk/export.h>
 
@@ -31,6 +34,13 @@ inline constexpr CLSID CLSID_GWImageLoader = {
 inline constexpr IID IID_IGWImageLoader = {
     0x6D2A1F42, 0x8B3C, 0x4E5D, {0xA1, 0xF2, 0x3C, 0x4D, 0x5E, 0x6F, 0x70, 0x81}};
 
+// {26C0E591-63A1-11CE-BABC-00AA00629284}: the image library's own image, made by kxILCreateImage.
+inline constexpr CLSID CLSID_GWImage = {
+    0x26C0E591, 0x63A1, 0x11CE, {0xBA, 0xBC, 0x00, 0xAA, 0x00, 0x62, 0x92, 0x84}};
+// {6D2A1F43-8B3C-4E5D-A1F2-3C4D5E6F7081}
+inline constexpr IID IID_IGWImageSetup = {
+    0x6D2A1F43, 0x8B3C, 0x4E5D, {0xA1, 0xF2, 0x3C, 0x4D, 0x5E, 0x6F, 0x70, 0x81}};
+
 struct IGWImage : IUnknown {
     virtual HRESULT STDMETHODCALLTYPE GetSize(ULONG* width, ULONG* height) = 0;
     virtual HRESULT STDMETHODCALLTYPE GetPixelFormat(GUID* format) = 0;
@@ -39,6 +49,18 @@ struct IGWImage : IUnknown {
 
 protected:
     ~IGWImage() = default;
+};
+
+// The shape of an image of the library's image class. A new image is 0 x 0 of the 4-byte colour
+// format; either call gives it new pixels of the new shape, all bytes 0 (transparent black).
+struct IGWImageSetup : IUnknown {
+    // E_INVALIDARG for a format other than the four above.
+    virtual HRESULT STDMETHODCALLTYPE SetPixelFormat(REFGUID format) = 0;
+    // E_INVALIDARG beyond 32768 pixels on a side.
+    virtual HRESULT STDMETHODCALLTYPE SetSize(ULONG width, ULONG height) = 0;
+
+protected:
+    ~IGWImageSetup() = default;
 };
 
 struct IGWImageLoader : IUnknown {
@@ -55,7 +77,36 @@ protected:
 template <>
 struct ut::InterfaceId<IGWImage> : ut::Iid<IID_IGWImage> {};
 template <>
+struct ut::InterfaceId<IGWImageSetup> : ut::Iid<IID_IGWImageSetup> {};
+template <>
 struct ut::InterfaceId<IGWImageLoader> : ut::Iid<IID_IGWImageLoader> {};
 
 // The application's image loader (found through GWQueryGenericObject).
 UT_SDK_API HRESULT KXGetImageLoader(IGWImageLoader** loader);
+
+// A new image of `imageClass` (CLSID_GWImage), through the application's creatable classes.
+// CLASS_E_NOAGGREGATION for an `outer` object: the library's images are never aggregated.
+UT_SDK_API HRESULT kxILCreateImage(IUnknown* outer, REFCLSID imageClass, IGWImage** image);
+
+// How kxILScaleTranslateImage samples the source.
+inline constexpr int KXIL_INTERPOLATE_NEAREST = 0;  // the source pixel under the target pixel's centre
+inline constexpr int KXIL_INTERPOLATE_BILINEAR = 3; // the four source pixels around it, weighted
+
+// Draws `source` into `target`: target pixel (x, y) shows the source at
+// ((x + 0.5 - translateX) / scaleX, (y + 0.5 - translateY) / scaleY), pixel centres at +0.5.
+// Only target pixels whose centre falls inside the source are written; the others keep what they
+// hold. Bilinear sampling weighs the four nearest source pixel centres, the image's edge pixels
+// repeated beyond it, and rounds each channel to the nearest value: scale 1 copies pixels exactly,
+// scale 0.5 averages each 2 x 2 block. Formats are converted through 8-bit red, green, blue and
+// alpha (grey is the rounded 0.299 r + 0.587 g + 0.114 b; a 16-bit channel is its high byte, and
+// is written as the byte repeated). E_INVALIDARG for a scale that is not positive and finite, an
+// interpolation other than 0 and 3, or an image of another format.
+UT_SDK_API HRESULT kxILScaleTranslateImage(IGWImage* source, IGWImage* target, double scaleX, double scaleY,
+                                           double translateX, double translateY, int interpolation);
+
+struct UT_SDK_API KXImageHlp {
+    // A 32-bit device bitmap of the image's size with the image's pixels (blue, green, red, alpha
+    // in each), for the caller to delete with DeleteObject. E_INVALIDARG for an empty image or one
+    // of another format; nothing is left behind on failure.
+    static HRESULT CreateBitmapFromImage(IGWImage* image, HBITMAP* bitmap);
+};
