@@ -22,6 +22,7 @@
 #include <ut/sdk/notify.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/resources.h>
+#include <ut/sdk/thumbnails.h>
 #include <ut/ut.h>
 
 #include "commands.h"
@@ -269,6 +270,24 @@ bool ShowReload(const std::wstring& path, std::vector<std::uint8_t>& bytes, Said
     return found == kSceneObjects;
 }
 
+// The scene view's picture written into the scene file as its thumbnail, and read back.
+bool ShowThumbnail(const std::wstring& path, Said& say) {
+    int available = 0;
+    if (FAILED(KXIsThumbnailAvaiable(&available)) || !available ||
+        KXPutThumnailInFile(CKXString(path.c_str())) != S_OK)
+        return false;
+    ut::ComPtr<IStorage> root;
+    ut::ComPtr<IGWImage> image;
+    ULONG width = 0, height = 0;
+    if (FAILED(StgOpenStorage(path.c_str(), nullptr, STGM_READ | STGM_SHARE_EXCLUSIVE, nullptr, 0,
+                              root.Put())) ||
+        GWGetThumbnail(root.Get(), image.Put()) != S_OK || FAILED(image->GetSize(&width, &height)))
+        return false;
+    say("a %lux%lu picture of the rendered view in the file's summary information",
+        static_cast<unsigned long>(width), static_cast<unsigned long>(height));
+    return width == 64 && height == 64;
+}
+
 int CountChunks(const std::vector<DecodedChunk>& chunks) {
     int count = 0;
     for (const DecodedChunk& chunk : chunks)
@@ -373,6 +392,7 @@ private:
 void RunDemo(const std::string& savePath) {
     ut::host::Settings settings;
     settings.scene = SampleScene();
+    settings.thumbnailRender = true;
     ut::host::ReferenceHost host(settings);
     if (FAILED(host.Status()))
         Fail(kExitNo, "the reference host did not start");
@@ -383,6 +403,7 @@ void RunDemo(const std::string& savePath) {
     tour.Run("register", ShowRegistration);
     tour.Run("scene", [&](Said& say) { return ShowScene(host, say); });
     tour.Run("save", [&](Said& say) { return ShowSave(file.Path(), say); });
+    tour.Run("thumbnail", [&](Said& say) { return ShowThumbnail(file.Path(), say); });
     tour.Run("reload", [&](Said& say) { return ShowReload(file.Path(), saved, say); });
     tour.Run("dump", [&](Said& say) { return ShowDump(saved, say); });
     tour.Run("frames", ShowFrames);
@@ -397,7 +418,8 @@ void RunDemo(const std::string& savePath) {
 void AddDemoCommand(CLI::App& app) {
     CLI::App* demo = app.add_subcommand(
         "demo", "Tour the library on the reference host: load, register a plug-in's classes, build a scene, "
-                "save it compact into a compound scene file, read it back, dump its chunks, expand frame "
+                "save it compact into a compound scene file with its thumbnail, read it back, dump its "
+                "chunks, expand frame "
                 "patterns, list sources, use the memory pool; each step timed.");
     auto savePath = std::make_shared<std::string>();
     demo->add_option("--save", *savePath, "keep the scene file at this path (else a temporary file)");
