@@ -18,19 +18,20 @@
 #include <ut/sdk/version.h>
 #include <ut/sdk/views.h>
 
+#include "active_database.h"
 #include "ambient_values.h"
 #include "application.h"
 #include "content_container.h"
 #include "families_manager.h"
 #include "file_dialogs.h"
-#include "active_database.h"
 #include "file_path.h"
+#include "host_support.h"
 #include "image_loader.h"
 #include "install_locations.h"
-#include "host_support.h"
 #include "list.h"
 #include "notification_service.h"
 #include "preferences.h"
+#include "preset_manager.h"
 #include "property_set.h"
 #include "scene_manager.h"
 #include "scene_object.h"
@@ -73,6 +74,8 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWProjectManager, NewService<InstallLocations>(settings).Get());
     InstallService(CLSID_KXPluginRegistry, NewService<PluginRegistry>(settings).Get());
     InstallService(CLSID_GWImageLoader, NewService<ImageLoader>(settings).Get());
+    for (const auto& [command, service] : PresetCommandServices(settings))
+        InstallService(command, service.Get());
     InstallClass(CLSID_GWFilePath,
                  ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) FilePathFactory(settings)).Get());
 }
@@ -91,6 +94,8 @@ HRESULT ReferenceHost::InstallScene(const Settings& settings) {
         containerFolders_ = settings.scene.containers;
         ut::ComPtr<Scene> scene = Scene::Build(settings.scene);
         sceneManager_ = scene ? Make<SceneManager>(std::move(scene)) : nullptr;
+        if (sceneManager_)
+            sceneManager_->SetPresetManager(ut::ComPtr<IUnknown>(NewService<PresetManager>(settings)));
         return sceneManager_ ? S_OK : E_OUTOFMEMORY;
     });
     if (FAILED(Record(built)))

@@ -7,6 +7,7 @@
 #include <utility>
 #include <vector>
 
+#include <ut/host/reference_presets.h>
 #include <ut/host/reference_scene.h>
 #include <ut/platform/com.h>
 #include <ut/sdk/scene.h>
@@ -47,6 +48,10 @@ struct Settings {
     std::vector<CLSID> propertyClasses = {GUID_GWTimeMappingProperty};
     // The parameter dictionary: parameters (by id) that are also known by a second id.
     std::vector<std::pair<GUID, GUID>> parameterAliases = {};
+    // Presets: the sub-folder below "Data\GWPresets" that holds a class's presets, and the presets
+    // family commands make by name (each command is installed as a service under its id).
+    std::vector<std::pair<CLSID, std::wstring>> presetFolders = {};
+    std::vector<PresetDescription> commandPresets = {};
 };
 
 class SceneManager;
