@@ -121,14 +121,22 @@ CLSID FamilyClass(REFGUID family) {
     return clsid;
 }
 
-// Sets the preset's values on a host property set, replacing parameters of the same id.
-void SetValues(PropertySet& set, const std::vector<ParameterDescription>& values) {
+// Sets the preset's values on a host object's parameters, replacing those of the same id.
+void SetValues(PropertyData& data, const std::vector<ParameterDescription>& values) {
     for (const ParameterDescription& value : values) {
-        if (ParameterDescription* existing = set.Data().FindParameter(value.id))
+        if (ParameterDescription* existing = data.FindParameter(value.id))
             *existing = value;
         else
-            set.Data().parameters.push_back(value);
+            data.parameters.push_back(value);
     }
+}
+
+// The parameters of a host object that takes values: a plug-in object or a property set.
+PropertyData* ParametersOf(IUnknown* object, ut::ComPtr<PropertySet>& set) {
+    if (auto* plugin = dynamic_cast<PluginObject*>(static_cast<CGWCOMObject*>(object)))
+        return &plugin->Data();
+    set = OwnPropertySet(object);
+    return set ? &set->Data() : nullptr;
 }
 
 } // namespace
@@ -315,11 +323,12 @@ HRESULT PresetManager::CreateObject(IGWPreset* preset, REFIID iid, void** object
     // Only the host's own presets carry values it can read.
     auto* own = dynamic_cast<Preset*>(preset);
     if (own && !own->Description().values.empty()) {
-        ut::ComPtr<PropertySet> set = OwnPropertySet(made.Get());
-        if (!set)
+        ut::ComPtr<PropertySet> set;
+        PropertyData* data = ParametersOf(made.Get(), set);
+        if (!data)
             return E_NOINTERFACE;
         if (HRESULT hr = ExportBoundary([&] {
-                SetValues(*set, own->Description().values);
+                SetValues(*data, own->Description().values);
                 return S_OK;
             });
             FAILED(hr))
@@ -386,6 +395,31 @@ HRESULT PresetCommand::ProducePreset(REFCLSID, const wchar_t* name, IGWPreset** 
         return hr;
     const PresetDescription* found = FindCommandPreset(*presets_, command_, name);
     return found ? HandOutPreset(Make<Preset>(*found), preset) : DISP_E_MEMBERNOTFOUND;
+}
+
+std::span<const CGWCOMObject::InterfaceEntry> PluginObject::GetInterfaceMap() const {
+    static const InterfaceEntry map[] = {sdk::Entry<PluginObject, IGWProperties>(IID_IGWProperties),
+                                         sdk::Entry<PluginObject, IPersist>(IID_IPersist)};
+    return map;
+}
+
+HRESULT PluginObject::GetClassID(CLSID* clsid) {
+    if (!clsid)
+        return E_POINTER;
+    *clsid = Data().clsid;
+    return sdk::CheckHostFault("IPersist::GetClassID");
+}
+
+std::vector<std::pair<CLSID, ut::ComPtr<IClassFactory>>> PluginClassFactories(const Settings& settings) {
+    std::vector<std::pair<CLSID, ut::ComPtr<IClassFactory>>> factories;
+    for (const CLSID& clsid : settings.pluginClasses)
+        factories.emplace_back(clsid, Make<ClassFactory>([clsid](IUnknown** made) -> HRESULT {
+                                          ut::ComPtr<PluginObject> object = Make<PluginObject>(clsid);
+                                          *made =
+                                              object ? static_cast<CGWCOMObject*>(object.Detach()) : nullptr;
+                                          return *made ? S_OK : E_OUTOFMEMORY;
+                                      }).Get());
+    return factories;
 }
 
 std::vector<std::pair<CLSID, ut::ComPtr<IUnknown>>> PresetCommandServices(const Settings& settings) {

@@ -10,6 +10,8 @@
 #include <ut/sdk/comobject.h>
 #include <ut/sdk/presets.h>
 
+#include "property_set.h"
+
 namespace ut::host {
 
 // A preset with the file it was read from; a preset made by a command has no file and then
@@ -74,6 +76,19 @@ private:
     CLSID command_;
     CommandPresets presets_;
 };
+
+// A plug-in object of one of the settings' plug-in classes: its class, and parameters.
+class PluginObject final : public PropertiesObject<IPersist> {
+public:
+    explicit PluginObject(const CLSID& clsid) { Data().clsid = clsid; }
+
+    std::span<const InterfaceEntry> GetInterfaceMap() const override;
+
+    HRESULT STDMETHODCALLTYPE GetClassID(CLSID* clsid) override;
+};
+
+// The class factory of every plug-in class of the settings, with its class.
+std::vector<std::pair<CLSID, ut::ComPtr<IClassFactory>>> PluginClassFactories(const Settings& settings);
 
 // The service of every command the settings' command presets name, with its id.
 std::vector<std::pair<CLSID, ut::ComPtr<IUnknown>>> PresetCommandServices(const Settings& settings);

@@ -76,6 +76,8 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallService(CLSID_GWImageLoader, NewService<ImageLoader>(settings).Get());
     for (const auto& [command, service] : PresetCommandServices(settings))
         InstallService(command, service.Get());
+    for (const auto& [clsid, factory] : PluginClassFactories(settings))
+        InstallClass(clsid, factory.Get());
     InstallClass(CLSID_GWFilePath,
                  ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) FilePathFactory(settings)).Get());
 }

@@ -52,6 +52,8 @@ struct Settings {
     // family commands make by name (each command is installed as a service under its id).
     std::vector<std::pair<CLSID, std::wstring>> presetFolders = {};
     std::vector<PresetDescription> commandPresets = {};
+    // Plug-in classes the host can create (objects that say their class and hold parameters).
+    std::vector<CLSID> pluginClasses = {};
 };
 
 class SceneManager;
