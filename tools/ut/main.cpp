@@ -52,6 +52,7 @@ int main(int argc, char** argv) {
     ut::tool::AddSourcesCommand(app);
     ut::tool::AddStorageCommand(app);
     ut::tool::AddFileCommands(app);
+    ut::tool::AddPresetsCommand(app);
 
     try {
         std::vector<std::string> arguments = ut::platform::Utf8Arguments(argc, argv);
