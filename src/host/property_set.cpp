@@ -204,6 +204,7 @@ HRESULT PropertiesObject<Interfaces...>::EnumProperties(ULONG selection, IEnumGW
 
 template class PropertiesObject<IGWParameter>;
 template class PropertiesObject<I3DScene>;
+template class PropertiesObject<IPersist>;
 
 PropertySet::PropertySet(const PropertySetDescription& description) {
     Data().clsid = description.clsid;

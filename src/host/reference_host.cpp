@@ -33,6 +33,7 @@
 #include "notification_service.h"
 #include "picture_source.h"
 #include "preferences.h"
+#include "preset_manager.h"
 #include "property_set.h"
 #include "scene_manager.h"
 #include "scene_object.h"
@@ -78,6 +79,10 @@ ReferenceHost::ReferenceHost(const Settings& settings) {
     InstallClass(CLSID_GWImage, Make<ClassFactory>(&MakeImage).Get());
     for (const auto& [clsid, service] : PictureServices(settings)) // none without a picture
         InstallService(clsid, service.Get());
+    for (const auto& [command, service] : PresetCommandServices(settings))
+        InstallService(command, service.Get());
+    for (const auto& [clsid, factory] : PluginClassFactories(settings))
+        InstallClass(clsid, factory.Get());
     InstallClass(CLSID_GWFilePath,
                  ut::ComPtr<IClassFactory>::Adopt(new (std::nothrow) FilePathFactory(settings)).Get());
 }
@@ -96,6 +101,8 @@ HRESULT ReferenceHost::InstallScene(const Settings& settings) {
         containerFolders_ = settings.scene.containers;
         ut::ComPtr<Scene> scene = Scene::Build(settings.scene);
         sceneManager_ = scene ? Make<SceneManager>(std::move(scene)) : nullptr;
+        if (sceneManager_)
+            sceneManager_->SetPresetManager(ut::ComPtr<IUnknown>(NewService<PresetManager>(settings)));
         return sceneManager_ ? S_OK : E_OUTOFMEMORY;
     });
     if (FAILED(Record(built)))

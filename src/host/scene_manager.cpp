@@ -1,6 +1,8 @@
 // The reference host's scene and scene manager.
 #include "scene_manager.h"
 
+#include <ut/sdk/presets.h>
+
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/database.h>
 #include <ut/sdk/objects.h>
@@ -148,6 +150,12 @@ HRESULT Scene::GetModel(IUnknown** model) {
     if (HRESULT hr = Begin("I3DScene::GetModel", model); FAILED(hr))
         return hr;
     return root_->QueryInterface(IID_IUnknown, reinterpret_cast<void**>(model));
+}
+
+HRESULT SceneManager::QueryInterface(REFIID iid, void** object) {
+    if (presets_ && IsEqualGUID(iid, IID_IGWPresetManager))
+        return presets_->QueryInterface(iid, object);
+    return ComObject::QueryInterface(iid, object);
 }
 
 std::span<const CGWCOMObject::InterfaceEntry> SceneManager::GetInterfaceMap() const {

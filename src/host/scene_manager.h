@@ -48,6 +48,9 @@ public:
     explicit SceneManager(ut::ComPtr<Scene> scene) : scene_(std::move(scene)) {}
 
     std::span<const InterfaceEntry> GetInterfaceMap() const override;
+    // Also answers the preset manager's interfaces, with the preset manager (an object of its own).
+    HRESULT STDMETHODCALLTYPE QueryInterface(REFIID iid, void** object) override;
+    void SetPresetManager(ut::ComPtr<IUnknown> presets) { presets_ = std::move(presets); }
 
     HRESULT STDMETHODCALLTYPE GetCurrentScene(IUnknown** scene) override;
     HRESULT STDMETHODCALLTYPE FindObjectByName(const wchar_t* name, I3DObject** object) override;
@@ -87,6 +90,7 @@ private:
     LONG notificationMode_ = GW3DNOTIFY_NORMAL;
     std::optional<StoredCommand> stored_;
     std::vector<GUID> posted_;
+    ut::ComPtr<IUnknown> presets_;
 };
 
 } // namespace ut::host

@@ -27,6 +27,10 @@ FileState& Files() {
     return MutableState().files;
 }
 
+PresetCache& Presets() {
+    return MutableState().presets;
+}
+
 HRESULT OnAttach(HINSTANCE self) {
     State& state = MutableState();
     state = {};

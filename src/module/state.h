@@ -1,6 +1,7 @@
 // The process-wide state that the load step creates, read by every subsystem.
 #pragma once
 
+#include <map>
 #include <memory>
 
 #include <ut/platform/com.h>
@@ -24,6 +25,14 @@ struct FileState {
     int dumpDepth = 0;
 };
 
+// The presets found so far: by class, then by preset name, the preset's file and the class of
+// the object it creates.
+struct PresetEntry {
+    CKXString path;
+    CLSID objectClass = GUID_NULL;
+};
+using PresetCache = std::map<GUID, std::map<CKXString, PresetEntry>, ut::GuidLess>;
+
 struct State {
     HINSTANCE instance = nullptr;
     // The registry key below which registrations are written; ends in a backslash.
@@ -33,6 +42,7 @@ struct State {
     // Made by the load step, gone after the unload. The render time is written through it.
     std::unique_ptr<TimeState> time;
     FileState files;
+    PresetCache presets;
     // The load step completed; when false every export answers E_UNEXPECTED.
     bool loaded = false;
 };
@@ -40,6 +50,8 @@ struct State {
 const State& Current();
 // The file helpers' state, the one part that the exports change after the load step.
 FileState& Files();
+// The preset cache, filled as objects are created from presets.
+PresetCache& Presets();
 
 inline bool Loaded() {
     return Current().loaded;

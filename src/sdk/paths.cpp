@@ -1,5 +1,6 @@
 // Installation paths of the application.
 #include <ut/platform/detail/boundary.h>
+#include <ut/platform/files.h>
 #include <ut/platform/process.h>
 #include <ut/sdk/paths.h>
 
@@ -18,4 +19,8 @@ HRESULT KXGetFactoryPath(CKXString& path) {
         path = std::wstring_view(library).substr(0, prefix);
         return S_OK;
     });
+}
+
+BOOL KXIsFileExist(const wchar_t* path) {
+    return path && *path && _waccess(path, 0) == 0 ? TRUE : FALSE;
 }

@@ -244,7 +244,10 @@ using MockLayerContainer = ComMock<IKXLayerContainer>;
 using MockGroup = ComMock<I3DGroup>;
 using MockPrimitive = ComMock<I3DPrimitive>;
 using MockExecContext = ComMock<IGWExecContext>;
-using MockPreset = ComMock<IGWPreset>;
+class MockPreset : public ComMock<IGWPreset> {
+public:
+    MOCK_METHOD(HRESULT, GetObjectClass, (CLSID*), (override, Calltype(STDMETHODCALLTYPE)));
+};
 using MockViewerController = ComMock<IGWViewerController>;
 
 } // namespace ut::test

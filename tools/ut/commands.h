@@ -48,6 +48,8 @@ void AddThumbnailCommand(CLI::App& app);
 void AddStorageCommand(CLI::App& app);
 // ut validate, ut paths and ut bitmap.
 void AddFileCommands(CLI::App& app);
+// ut presets find.
+void AddPresetsCommand(CLI::App& app);
 
 // ut registry list | get | export | import; list lives in registry_list.cpp.
 void AddRegistryCommand(CLI::App& app);

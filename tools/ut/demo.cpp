@@ -38,7 +38,7 @@ std::string Narrow(std::wstring_view text) {
 // What a step did, in one line of printf-formatted text.
 class Said {
 public:
-    [[gnu::format(printf, 2, 3)]] void operator()(const char* format, ...) {
+    [[gnu::format(gnu_printf, 2, 3)]] void operator()(const char* format, ...) {
         va_list arguments;
         va_start(arguments, format);
         char line[512];

@@ -53,6 +53,7 @@ int main(int argc, char** argv) {
     ut::tool::AddStorageCommand(app);
     ut::tool::AddFileCommands(app);
     ut::tool::AddThumbnailCommand(app);
+    ut::tool::AddPresetsCommand(app);
 
     try {
         std::vector<std::string> arguments = ut::platform::Utf8Arguments(argc, argv);

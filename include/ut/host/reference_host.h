@@ -7,6 +7,7 @@
 #include <utility>
 #include <vector>
 
+#include <ut/host/reference_presets.h>
 #include <ut/host/reference_scene.h>
 #include <ut/platform/com.h>
 #include <ut/sdk/scene.h>
@@ -51,6 +52,12 @@ struct Settings {
     // view of the scene when `thumbnailRender` is set; with neither, there is no viewer.
     std::wstring thumbnailImage = {};
     bool thumbnailRender = false;
+    // Presets: the sub-folder below "Data\GWPresets" that holds a class's presets, and the presets
+    // family commands make by name (each command is installed as a service under its id).
+    std::vector<std::pair<CLSID, std::wstring>> presetFolders = {};
+    std::vector<PresetDescription> commandPresets = {};
+    // Plug-in classes the host can create (objects that say their class and hold parameters).
+    std::vector<CLSID> pluginClasses = {};
 };
 
 class SceneManager;

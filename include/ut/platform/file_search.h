@@ -4,9 +4,14 @@
 // On POSIX a name whose last part holds `*` or `?` lists the entries of its folder that match it
 // as the shell matches (case-sensitive; "." and ".." match "*", as on Windows), in no particular
 // order; any other name finds that one entry, a folder included. Attributes reported there:
-// FILE_ATTRIBUTE_DIRECTORY, FILE_ATTRIBUTE_READONLY (no write permission) and FILE_ATTRIBUTE_NORMAL when
-// neither applies.
+// FILE_ATTRIBUTE_DIRECTORY, FILE_ATTRIBUTE_READONLY (no write permission), FILE_ATTRIBUTE_REPARSE_POINT
+// (a symbolic link, described by what it leads to) and FILE_ATTRIBUTE_NORMAL when none applies. A
+// backslash separates folders as a slash does, and a listing reads its folder as it goes, so a
+// folder of any size is listed in constant memory.
 #pragma once
+
+#include <compare>
+#include <cstdint>
 
 #include <ut/platform/com.h>
 #include <ut/platform/native/file_search.h>
@@ -30,5 +35,17 @@ public:
 private:
     HANDLE search_;
 };
+
+// What tells a folder from every other one on the machine however it is reached (through links
+// too): the volume and the file number.
+struct FolderIdentity {
+    std::uint64_t volume = 0;
+    std::uint64_t file = 0;
+    friend bool operator==(const FolderIdentity&, const FolderIdentity&) = default;
+};
+
+// The identity of the folder `path` names, links followed; false when it is no folder or cannot
+// be reached.
+UT_PLATFORM_API bool IdentifyFolder(const wchar_t* path, FolderIdentity& identity);
 
 } // namespace ut::platform

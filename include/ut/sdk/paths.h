@@ -9,3 +9,5 @@
 // "<prefix>\bin\ut_sdk.dll"), without a separator at its end. E_FAIL with an empty `path` when
 // the library's file name is unknown.
 UT_SDK_API HRESULT KXGetFactoryPath(CKXString& path);
+// TRUE when a file or folder named `path` exists (a backslash separates folders on every home).
+UT_SDK_API BOOL KXIsFileExist(const wchar_t* path);

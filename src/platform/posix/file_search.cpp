@@ -1,22 +1,32 @@
-// File search over the POSIX file system: a search handle holds the entries still to hand out.
+// File search over the POSIX file system: a search handle reads its folder as it is asked for
+// entries, so a folder of any size costs one entry of memory at a time.
 #include <algorithm>
 #include <cstring>
 #include <dirent.h>
 #include <fnmatch.h>
 #include <memory>
 #include <new>
+#include <optional>
 #include <string>
 #include <sys/stat.h>
 #include <unistd.h>
-#include <vector>
 
 #include <ut/platform/file_search.h>
 #include <ut/platform/text.h>
 
+#include "posix/path.h"
+
 namespace {
 
+struct DirectoryCloser {
+    void operator()(DIR* directory) const noexcept { ::closedir(directory); }
+};
+
+// A listing in progress (`directory` set) or the one entry a name without wildcards found.
 struct Search {
-    std::vector<WIN32_FIND_DATAW> remaining; // handed out from the back
+    std::unique_ptr<DIR, DirectoryCloser> directory;
+    std::string folder, pattern;
+    std::optional<WIN32_FIND_DATAW> single;
 };
 
 // Seconds since 1970 as 100-nanosecond ticks since 1601.
@@ -36,6 +46,9 @@ bool Describe(const std::string& path, const std::string& name, WIN32_FIND_DATAW
         found.dwFileAttributes |= FILE_ATTRIBUTE_DIRECTORY;
     if (::access(path.c_str(), W_OK) != 0)
         found.dwFileAttributes |= FILE_ATTRIBUTE_READONLY;
+    struct stat link {};
+    if (::lstat(path.c_str(), &link) == 0 && S_ISLNK(link.st_mode))
+        found.dwFileAttributes |= FILE_ATTRIBUTE_REPARSE_POINT;
     if (found.dwFileAttributes == 0)
         found.dwFileAttributes = FILE_ATTRIBUTE_NORMAL;
     found.ftCreationTime = FileTimeOf(info.st_ctim);
@@ -51,19 +64,23 @@ bool Describe(const std::string& path, const std::string& name, WIN32_FIND_DATAW
     return true;
 }
 
-void ListMatches(const std::string& folder, const std::string& pattern, Search& search) {
-    DIR* directory = ::opendir(folder.empty() ? "." : folder.c_str());
-    if (!directory)
-        return;
-    while (const dirent* entry = ::readdir(directory)) {
-        std::string name = entry->d_name;
-        if (::fnmatch(pattern.c_str(), name.c_str(), 0) != 0)
-            continue;
-        WIN32_FIND_DATAW found;
-        if (Describe(folder.empty() ? name : folder + "/" + name, name, found))
-            search.remaining.push_back(found);
+// The next entry of the listing that matches its pattern; false when the folder is read through.
+bool NextMatch(Search& search, WIN32_FIND_DATAW& found) {
+    if (!search.directory) {
+        if (!search.single)
+            return false;
+        found = *search.single;
+        search.single.reset();
+        return true;
     }
-    ::closedir(directory);
+    while (const dirent* entry = ::readdir(search.directory.get())) {
+        std::string name = entry->d_name;
+        if (::fnmatch(search.pattern.c_str(), name.c_str(), 0) != 0)
+            continue;
+        if (Describe(search.folder.empty() ? name : search.folder + "/" + name, name, found))
+            return true;
+    }
+    return false;
 }
 
 } // namespace
@@ -72,22 +89,21 @@ HANDLE FindFirstFileW(LPCWSTR name, WIN32_FIND_DATAW* found) {
     if (!name || !found || !*name)
         return INVALID_HANDLE_VALUE;
     try {
-        std::string path = ut::platform::Utf8FromWide(name);
+        std::string path = ut::platform::posix::SystemPath(name);
         std::size_t slash = path.find_last_of('/');
-        std::string folder = slash == std::string::npos ? std::string() : path.substr(0, slash);
-        std::string last = slash == std::string::npos ? path : path.substr(slash + 1);
         auto search = std::make_unique<Search>();
+        search->folder = slash == std::string::npos ? std::string() : path.substr(0, slash);
+        std::string last = slash == std::string::npos ? path : path.substr(slash + 1);
         if (last.find_first_of("*?") != std::string::npos) {
-            ListMatches(folder, last, *search);
-        } else {
-            WIN32_FIND_DATAW entry;
-            if (Describe(path, last, entry))
-                search->remaining.push_back(entry);
+            search->pattern = last;
+            search->directory.reset(::opendir(search->folder.empty() ? "." : search->folder.c_str()));
+            if (!search->directory)
+                return INVALID_HANDLE_VALUE;
+        } else if (WIN32_FIND_DATAW entry; Describe(path, last, entry)) {
+            search->single = entry;
         }
-        if (search->remaining.empty())
+        if (!NextMatch(*search, *found))
             return INVALID_HANDLE_VALUE;
-        *found = search->remaining.back();
-        search->remaining.pop_back();
         return search.release();
     } catch (const std::bad_alloc&) {
         return INVALID_HANDLE_VALUE;
@@ -96,11 +112,13 @@ HANDLE FindFirstFileW(LPCWSTR name, WIN32_FIND_DATAW* found) {
 
 BOOL FindNextFileW(HANDLE handle, WIN32_FIND_DATAW* found) {
     auto* search = static_cast<Search*>(handle);
-    if (!search || handle == INVALID_HANDLE_VALUE || !found || search->remaining.empty())
+    if (!search || handle == INVALID_HANDLE_VALUE || !found)
         return FALSE;
-    *found = search->remaining.back();
-    search->remaining.pop_back();
-    return TRUE;
+    try {
+        return NextMatch(*search, *found) ? TRUE : FALSE;
+    } catch (const std::bad_alloc&) {
+        return FALSE;
+    }
 }
 
 BOOL FindClose(HANDLE handle) {
@@ -109,3 +127,15 @@ BOOL FindClose(HANDLE handle) {
     delete static_cast<Search*>(handle);
     return TRUE;
 }
+
+namespace ut::platform {
+
+bool IdentifyFolder(const wchar_t* path, FolderIdentity& identity) {
+    struct stat info {};
+    if (!path || ::stat(posix::SystemPath(path).c_str(), &info) != 0 || !S_ISDIR(info.st_mode))
+        return false;
+    identity = {static_cast<std::uint64_t>(info.st_dev), static_cast<std::uint64_t>(info.st_ino)};
+    return true;
+}
+
+} // namespace ut::platform

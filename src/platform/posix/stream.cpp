@@ -12,6 +12,7 @@
 
 #include "common/stream_base.h"
 #include "posix/descriptor.h"
+#include "posix/path.h"
 
 // A growable stream in memory. Clones share the bytes and keep their own position, as the
 // system's memory streams do.
@@ -246,7 +247,7 @@ HRESULT OpenFileStream(const wchar_t* path, DWORD mode, IStream** stream) {
     int flags = posix::OpenFlags(mode);
     if ((mode & STGM_CREATE) && (mode & 3) == STGM_READ)
         flags = (flags & ~O_ACCMODE) | O_RDWR;
-    int fd = ::open(Utf8FromWide(path).c_str(), flags, 0666);
+    int fd = ::open(posix::SystemPath(path).c_str(), flags, 0666);
     if (fd < 0)
         return posix::StorageError(errno, STG_E_ACCESSDENIED);
     // A folder opens for reading here but not on Windows: refuse it on both homes.

@@ -66,8 +66,12 @@ using HMODULE = HINSTANCE;
 inline constexpr BOOL TRUE = 1;
 inline constexpr BOOL FALSE = 0;
 
-constexpr bool SUCCEEDED(HRESULT hr) { return hr >= 0; }
-constexpr bool FAILED(HRESULT hr) { return hr < 0; }
+constexpr bool SUCCEEDED(HRESULT hr) {
+    return hr >= 0;
+}
+constexpr bool FAILED(HRESULT hr) {
+    return hr < 0;
+}
 constexpr HRESULT HRESULT_FROM_WIN32(DWORD code) {
     return static_cast<HRESULT>(code) <= 0 ? static_cast<HRESULT>(code)
                                            : static_cast<HRESULT>((code & 0x0000FFFF) | 0x80070000);
@@ -161,9 +165,15 @@ constexpr bool IsEqualGUID(REFGUID a, REFGUID b) {
             return false;
     return true;
 }
-constexpr bool IsEqualIID(REFIID a, REFIID b) { return IsEqualGUID(a, b); }
-constexpr bool IsEqualCLSID(REFCLSID a, REFCLSID b) { return IsEqualGUID(a, b); }
-constexpr bool operator==(REFGUID a, REFGUID b) { return IsEqualGUID(a, b); }
+constexpr bool IsEqualIID(REFIID a, REFIID b) {
+    return IsEqualGUID(a, b);
+}
+constexpr bool IsEqualCLSID(REFCLSID a, REFCLSID b) {
+    return IsEqualGUID(a, b);
+}
+constexpr bool operator==(REFGUID a, REFGUID b) {
+    return IsEqualGUID(a, b);
+}
 
 // The root of every interface. No virtual destructor: objects die through Release.
 struct IUnknown {
@@ -183,6 +193,19 @@ protected:
     ~IPersist() = default;
 };
 
+// An object kept in a file of its own.
+struct IPersistFile : IPersist {
+    virtual HRESULT STDMETHODCALLTYPE IsDirty() = 0;
+    virtual HRESULT STDMETHODCALLTYPE Load(LPCOLESTR name, DWORD mode) = 0;
+    virtual HRESULT STDMETHODCALLTYPE Save(LPCOLESTR name, BOOL remember) = 0;
+    virtual HRESULT STDMETHODCALLTYPE SaveCompleted(LPCOLESTR name) = 0;
+    // The file's name, task-allocated.
+    virtual HRESULT STDMETHODCALLTYPE GetCurFile(LPOLESTR* name) = 0;
+
+protected:
+    ~IPersistFile() = default;
+};
+
 struct IClassFactory : IUnknown {
     virtual HRESULT STDMETHODCALLTYPE CreateInstance(IUnknown* outer, REFIID iid, void** object) = 0;
     virtual HRESULT STDMETHODCALLTYPE LockServer(BOOL lock) = 0;
@@ -193,6 +216,7 @@ protected:
 
 inline constexpr IID IID_IUnknown = {0x00000000, 0x0000, 0x0000, {0xC0, 0, 0, 0, 0, 0, 0, 0x46}};
 inline constexpr IID IID_IPersist = {0x0000010C, 0x0000, 0x0000, {0xC0, 0, 0, 0, 0, 0, 0, 0x46}};
+inline constexpr IID IID_IPersistFile = {0x0000010B, 0x0000, 0x0000, {0xC0, 0, 0, 0, 0, 0, 0, 0x46}};
 inline constexpr IID IID_IClassFactory = {0x00000001, 0x0000, 0x0000, {0xC0, 0, 0, 0, 0, 0, 0, 0x46}};
 
 enum CLSCTX : DWORD {
@@ -235,8 +259,8 @@ UT_PLATFORM_API HRESULT CoInitializeEx(void* reserved, DWORD flags);
 UT_PLATFORM_API void CoUninitialize();
 
 // The in-process class table: a factory registered here is what CoCreateInstance finds.
-UT_PLATFORM_API HRESULT CoRegisterClassObject(REFCLSID clsid, IUnknown* factory, DWORD context,
-                                              DWORD flags, DWORD* cookie);
+UT_PLATFORM_API HRESULT CoRegisterClassObject(REFCLSID clsid, IUnknown* factory, DWORD context, DWORD flags,
+                                              DWORD* cookie);
 UT_PLATFORM_API HRESULT CoRevokeClassObject(DWORD cookie);
 UT_PLATFORM_API HRESULT CoGetClassObject(REFCLSID clsid, DWORD context, void* server, REFIID iid,
                                          void** object);

@@ -11,6 +11,8 @@ inline HANDLE const INVALID_HANDLE_VALUE = reinterpret_cast<HANDLE>(static_cast<
 inline constexpr DWORD FILE_ATTRIBUTE_READONLY = 0x00000001;
 inline constexpr DWORD FILE_ATTRIBUTE_DIRECTORY = 0x00000010;
 inline constexpr DWORD FILE_ATTRIBUTE_NORMAL = 0x00000080;
+// The entry is a symbolic link (its other attributes are those of what it leads to).
+inline constexpr DWORD FILE_ATTRIBUTE_REPARSE_POINT = 0x00000400;
 
 struct WIN32_FIND_DATAW {
     DWORD dwFileAttributes;
