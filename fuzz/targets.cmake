@@ -14,3 +14,5 @@ if(NOT WIN32)
 endif()
 # What `ut stream dump` shows of any bytes.
 ut_fuzz_target(stream_dump stream_dump_fuzz.cpp ../tools/ut/stream_decoder.cpp)
+# A scene file's summary information: the thumbnail read, replaced and read again.
+ut_fuzz_target(thumbnail thumbnail_fuzz.cpp)
