@@ -4,6 +4,7 @@
 #include <chrono>
 #include <cstdarg>
 #include <cstdio>
+#include <filesystem>
 #include <memory>
 #include <span>
 #include <string>
@@ -13,6 +14,7 @@
 
 #include <ut/detail/names.h>
 #include <ut/host/reference_host.h>
+#include <ut/host/reference_presets.h>
 #include <ut/platform/files.h>
 #include <ut/platform/process.h>
 #include <ut/platform/storage.h>
@@ -21,6 +23,7 @@
 #include <ut/platform/variant.h>
 #include <ut/sdk/notify.h>
 #include <ut/sdk/objects.h>
+#include <ut/sdk/preferences.h>
 #include <ut/sdk/resources.h>
 #include <ut/sdk/thumbnails.h>
 #include <ut/ut.h>
@@ -312,6 +315,83 @@ bool ShowDump(std::span<const std::uint8_t> bytes, Said& say) {
     return decoded.compact && CountChunks(decoded.chunks) > kSceneObjects;
 }
 
+// A light class with its presets in the "Lights" sub-folder, as a lighting plug-in would have.
+constexpr GUID kSpotLight = {0x5A3F1E10, 0xD3C2, 0x4B7A, {0x9E, 0x10, 0x6C, 0x21, 0x8D, 0x44, 0x0A, 0x01}};
+constexpr GUID kIntensity = {0x5A3F1E11, 0xD3C2, 0x4B7A, {0x9E, 0x10, 0x6C, 0x21, 0x8D, 0x44, 0x0A, 0x01}};
+
+// The user's folder of the tour: a temporary folder named in the preferences while it lives; the
+// user's own setting is put back afterwards.
+class TourUserFolder {
+public:
+    TourUserFolder() {
+        std::error_code error;
+        folder_ = std::filesystem::temp_directory_path(error) /
+                  ("ut-tour-" + std::to_string(std::chrono::steady_clock::now().time_since_epoch().count()));
+        if (error || !std::filesystem::create_directories(folder_, error) ||
+            FAILED(KXGetPreferencesMgr(preferences_.Put())))
+            return;
+        wchar_t* previous = nullptr;
+        (void)preferences_->GetText(kSetting, &previous); // none is an empty setting
+        previous_ = previous ? previous : L"";
+        CoTaskMemFree(previous);
+        set_ = SUCCEEDED(preferences_->SetText(kSetting, folder_.wstring().c_str()));
+    }
+    ~TourUserFolder() {
+        if (set_)
+            (void)preferences_->SetText(kSetting, previous_.c_str()); // best effort on the way out
+        std::error_code ignored;
+        std::filesystem::remove_all(folder_, ignored);
+    }
+    TourUserFolder(const TourUserFolder&) = delete;
+    TourUserFolder& operator=(const TourUserFolder&) = delete;
+    bool Ready() const { return set_; }
+    const std::filesystem::path& Path() const { return folder_; }
+
+private:
+    static constexpr wchar_t kSetting[] = L"paths.user";
+    std::filesystem::path folder_;
+    ut::ComPtr<IGWPreferences> preferences_;
+    std::wstring previous_;
+    bool set_ = false;
+};
+
+HRESULT WriteSpotPreset(const std::filesystem::path& presets, double intensity) {
+    std::error_code error;
+    std::filesystem::create_directories(presets / "Lights", error);
+    ut::host::PresetDescription preset;
+    preset.objectClass = kSpotLight;
+    preset.values = {{kIntensity, L"intensity", intensity}};
+    return error ? E_FAIL : ut::host::WritePresetFile((presets / "Lights" / "Spot.Preset").wstring(), preset);
+}
+
+// The preset "Spot" in the user's folder and in an add-on of the user's: found in the add-on (a
+// later kind of location wins), an object made from it, and its class found again in the cache.
+bool ShowPresets(Said& say) {
+    TourUserFolder user;
+    const std::filesystem::path presets = std::filesystem::path("Data") / "GWPresets";
+    if (!user.Ready() || FAILED(WriteSpotPreset(user.Path() / presets, 1.0)) ||
+        FAILED(WriteSpotPreset(user.Path() / "Addons" / "Studio" / presets, 2.5)))
+        return false;
+    CKXString found;
+    ut::ComPtr<IUnknown> light;
+    ut::ComPtr<IGWPreset> preset;
+    wchar_t* file = nullptr;
+    GUID made = GUID_NULL;
+    if (FAILED(KXFindPresetPath(kSpotLight, L"Spot.Preset", found)) ||
+        FAILED(KXCreateObjectFromPreset(kSpotLight, L"Spot", GUID_NULL, light.PutVoid(), preset.Put(),
+                                        nullptr)) ||
+        FAILED(KXGetFilePathFromPreset(preset.Get(), &file)) ||
+        FAILED(KXGetObjectCLSIDFromPreset(kSpotLight, L"Spot", &made)))
+        return false;
+    std::unique_ptr<wchar_t[]> created(file);
+    std::wstring where(found.View());
+    where.replace(0, std::min(where.size(), user.Path().wstring().size()), L"<user>");
+    say("Spot in the user's folder and the user's add-on Studio: the add-on's wins (%s); a light "
+        "made from it; its class %s again from the cache",
+        Narrow(where).c_str(), Narrow(ut::GuidToString(made)).c_str());
+    return IsEqualGUID(made, kSpotLight) && std::wstring(created.get()) == found.View();
+}
+
 bool ShowFrames(Said& say) {
     wchar_t one[ut::kPathCapacity], range[ut::kPathCapacity], bare[ut::kPathCapacity];
     KXExpandFramePadding(L"shot.####.pic", 42, one);
@@ -393,6 +473,8 @@ void RunDemo(const std::string& savePath) {
     ut::host::Settings settings;
     settings.scene = SampleScene();
     settings.thumbnailRender = true;
+    settings.pluginClasses = {kSpotLight};
+    settings.presetFolders = {{kSpotLight, L"Lights"}};
     ut::host::ReferenceHost host(settings);
     if (FAILED(host.Status()))
         Fail(kExitNo, "the reference host did not start");
@@ -406,6 +488,7 @@ void RunDemo(const std::string& savePath) {
     tour.Run("thumbnail", [&](Said& say) { return ShowThumbnail(file.Path(), say); });
     tour.Run("reload", [&](Said& say) { return ShowReload(file.Path(), saved, say); });
     tour.Run("dump", [&](Said& say) { return ShowDump(saved, say); });
+    tour.Run("presets", ShowPresets);
     tour.Run("frames", ShowFrames);
     tour.Run("sources", ShowSources);
     tour.Run("pool", ShowMemoryPool);
@@ -419,8 +502,8 @@ void AddDemoCommand(CLI::App& app) {
     CLI::App* demo = app.add_subcommand(
         "demo", "Tour the library on the reference host: load, register a plug-in's classes, build a scene, "
                 "save it compact into a compound scene file with its thumbnail, read it back, dump its "
-                "chunks, expand frame "
-                "patterns, list sources, use the memory pool; each step timed.");
+                "chunks, find a preset and make an object from it, expand frame patterns, list sources, use "
+                "the memory pool; each step timed.");
     auto savePath = std::make_shared<std::string>();
     demo->add_option("--save", *savePath, "keep the scene file at this path (else a temporary file)");
     demo->footer("Example:\n  ut demo --save scene.scn");
