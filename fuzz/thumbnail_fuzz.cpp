@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <cstdlib>
 
+#include <ut/host/reference_host.h>
 #include <ut/platform/storage.h>
 #include <ut/sdk/image.h>
 #include <ut/sdk/thumbnails.h>
@@ -24,7 +25,8 @@ HRESULT StorageWithSummary(const std::uint8_t* data, std::size_t size, ut::ComPt
     if (SUCCEEDED(hr))
         hr = StgCreateDocfileOnILockBytes(bytes.Get(), STGM_CREATE | kExclusive, 0, storage.Put());
     if (SUCCEEDED(hr))
-        hr = storage->CreateStream(kGWSummaryInformationStream, STGM_CREATE | kExclusive, 0, 0, summary.Put());
+        hr =
+            storage->CreateStream(kGWSummaryInformationStream, STGM_CREATE | kExclusive, 0, 0, summary.Put());
     if (SUCCEEDED(hr))
         hr = summary->Write(data, static_cast<ULONG>(size), nullptr);
     return hr;
@@ -32,24 +34,22 @@ HRESULT StorageWithSummary(const std::uint8_t* data, std::size_t size, ut::ComPt
 
 // A 3 x 2 picture to write over whatever the stream holds.
 HRESULT SmallImage(ut::ComPtr<IGWImage>& image) {
-    ut::ComPtr<IGWImageSetup> setup;
-    HRESULT hr = kxILCreateImage(nullptr, CLSID_GWImage, image.Put());
-    if (SUCCEEDED(hr))
-        hr = image.As(setup);
-    if (SUCCEEDED(hr))
-        hr = setup->SetPixelFormat(GWPIXELFORMAT_RGBA32);
-    if (SUCCEEDED(hr))
-        hr = setup->SetSize(3, 2);
-    return hr;
+    const std::uint32_t pixels[6] = {0xFF0000FF, 0xFF00FF00, 0xFFFF0000, 0xFFFFFFFF, 0xFF000000, 0xFF808080};
+    ut::ComPtr<IGWImageLoader> loader;
+    HRESULT hr = KXGetImageLoader(loader.Put());
+    return SUCCEEDED(hr) ? loader->CreateImage(3, 2, GWPIXELFORMAT_RGBA32, pixels, image.Put()) : hr;
 }
 
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+    static const ut::host::ReferenceHost host; // the image library's classes, for the whole run
     ut::ComPtr<IStorage> storage;
     ut::ComPtr<IGWImage> image;
-    if (size > (1u << 20) || FAILED(StorageWithSummary(data, size, storage)) || FAILED(SmallImage(image)))
+    if (size > (1u << 20) || FAILED(StorageWithSummary(data, size, storage)))
         return 0;
+    if (FAILED(SmallImage(image)))
+        std::abort(); // the host's image library is always there
     ut::ComPtr<IGWImage> found;
     HRESULT read = GWGetThumbnail(storage.Get(), found.Put());
     if (FAILED(read) && !IsDocumentedRefusal(read))

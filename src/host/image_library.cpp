@@ -13,16 +13,6 @@ constexpr ULONG kMaxSide = 1u << 15;
 
 } // namespace
 
-std::size_t PixelSize(const GUID& format) {
-    if (format == GWPIXELFORMAT_GREY8)
-        return 1;
-    if (format == GWPIXELFORMAT_GREY16)
-        return 2;
-    if (format == GWPIXELFORMAT_RGBA32)
-        return 4;
-    return format == GWPIXELFORMAT_RGBA64 ? 8 : 0;
-}
-
 std::span<const CGWCOMObject::InterfaceEntry> Image::GetInterfaceMap() const {
     static const InterfaceEntry map[] = {sdk::Entry<Image, IGWImage>(IID_IGWImage),
                                          sdk::Entry<Image, IGWImageSetup>(IID_IGWImageSetup)};
@@ -70,7 +60,7 @@ HRESULT Image::SetSize(ULONG width, ULONG height) {
 }
 
 HRESULT Image::Reshape(ULONG width, ULONG height, const GUID& format) {
-    std::size_t size = PixelSize(format);
+    std::size_t size = GWPixelFormatSize(format);
     if (!size || width > kMaxSide || height > kMaxSide)
         return E_INVALIDARG;
     return ExportBoundary([&] {

@@ -34,9 +34,6 @@ private:
     std::vector<std::uint8_t> pixels_;
 };
 
-// Bytes a pixel of `format` takes: 1, 2, 4 or 8, and 0 for a format the library does not know.
-std::size_t PixelSize(const GUID& format);
-
 // The image class's factory function: a new empty image.
 HRESULT MakeImage(IUnknown** made);
 

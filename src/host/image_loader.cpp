@@ -41,7 +41,7 @@ HRESULT DecodeBmp(const std::vector<std::uint8_t>& file, ULONG& width, ULONG& he
     if (offset > file.size() || file.size() - offset < stride * height)
         return E_INVALIDARG;
     format = bits == 8 ? GWPIXELFORMAT_GREY8 : GWPIXELFORMAT_RGBA32;
-    std::size_t out = PixelSize(format);
+    std::size_t out = GWPixelFormatSize(format);
     pixels.assign(std::size_t{width} * height * out, 0);
     for (ULONG y = 0; y < height; ++y) {
         const std::uint8_t* row = file.data() + offset + stride * (rawHeight < 0 ? y : height - 1 - y);
@@ -97,7 +97,7 @@ HRESULT ImageLoader::CreateImage(ULONG width, ULONG height, REFGUID format, cons
     *image = nullptr;
     if (HRESULT hr = sdk::CheckHostFault("IGWImageLoader::CreateImage"); FAILED(hr))
         return hr;
-    std::size_t size = PixelSize(format);
+    std::size_t size = GWPixelFormatSize(format);
     if (!size)
         size = 4; // a format the host does not know keeps 4 bytes a pixel
     return ExportBoundary([&] {

@@ -10,6 +10,16 @@
 
 #include "pixels.h"
 
+std::size_t GWPixelFormatSize(REFGUID format) {
+    if (format == GWPIXELFORMAT_GREY8)
+        return 1;
+    if (format == GWPIXELFORMAT_GREY16)
+        return 2;
+    if (format == GWPIXELFORMAT_RGBA32)
+        return 4;
+    return format == GWPIXELFORMAT_RGBA64 ? 8 : 0;
+}
+
 namespace ut::sdk {
 namespace {
 
@@ -55,16 +65,6 @@ bool UsableScale(double scale) {
 
 } // namespace
 
-std::size_t BytesPerPixel(const GUID& format) {
-    if (format == GWPIXELFORMAT_GREY8)
-        return 1;
-    if (format == GWPIXELFORMAT_GREY16)
-        return 2;
-    if (format == GWPIXELFORMAT_RGBA32)
-        return 4;
-    return format == GWPIXELFORMAT_RGBA64 ? 8 : 0;
-}
-
 Rgba ImageView::Read(ULONG x, ULONG y) const {
     const std::uint8_t* p = At(x, y);
     switch (bytesPerPixel) {
@@ -108,7 +108,7 @@ HRESULT ViewImage(IGWImage* image, ImageView& view) {
         return hr;
     if (HRESULT hr = image->GetPixelFormat(&view.format); FAILED(hr))
         return hr;
-    view.bytesPerPixel = BytesPerPixel(view.format);
+    view.bytesPerPixel = ::GWPixelFormatSize(view.format);
     if (!view.bytesPerPixel)
         return E_INVALIDARG;
     if (HRESULT hr = image->GetPixels(&pixels); FAILED(hr))

@@ -13,9 +13,6 @@ struct Rgba {
     std::uint8_t r = 0, g = 0, b = 0, a = 0;
 };
 
-// 1, 2, 4 or 8; 0 for a format the library does not know.
-std::size_t BytesPerPixel(const GUID& format);
-
 // An image's size, format and pixels as its interface gives them.
 struct ImageView {
     ULONG width = 0;

@@ -372,11 +372,7 @@ TEST_F(Presets, EveryExportSurvivesEveryHostFault) {
         ut::test::WalkHostFaults(
             [&] {
                 ut::ClearPresetCache();
-                auto [hr, out] = walk.run();
-                bool handedOut = out != nullptr;
-                if (out)
-                    out->Release();
-                return std::pair(hr, handedOut);
+                return ut::test::Released(walk.run());
             },
             [&](int row, const std::pair<HRESULT, bool>& outcome) {
                 if (row == 0) {

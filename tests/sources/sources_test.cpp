@@ -348,25 +348,18 @@ TEST_F(Sources, EveryExportSurvivesEveryHostFault) {
     };
     int walked = 0;
     for (const Walk& walk : walks) {
-        ut::test::WalkHostFaults(
-            [&] {
-                auto [hr, out] = walk.run();
-                bool handedOut = out != nullptr;
-                if (out)
-                    out->Release();
-                return std::pair(hr, handedOut);
-            },
-            [&](int row, const std::pair<HRESULT, bool>& outcome) {
-                if (row == 0)
-                    return;
-                ++walked;
-                EXPECT_TRUE(walk.answers.count(Result(outcome.first)))
-                    << walk.name << " at call " << row << ": " << Result(outcome.first);
-                bool keepsItsList = std::string(walk.name) == "find all sources";
-                EXPECT_TRUE(SUCCEEDED(outcome.first) || keepsItsList || !outcome.second)
-                    << walk.name << " at call " << row;
-            },
-            E_ACCESSDENIED);
+        ut::test::WalkHostFaults([&] { return ut::test::Released(walk.run()); },
+                                 [&](int row, const std::pair<HRESULT, bool>& outcome) {
+                                     if (row == 0)
+                                         return;
+                                     ++walked;
+                                     EXPECT_TRUE(walk.answers.count(Result(outcome.first)))
+                                         << walk.name << " at call " << row << ": " << Result(outcome.first);
+                                     bool keepsItsList = std::string(walk.name) == "find all sources";
+                                     EXPECT_TRUE(SUCCEEDED(outcome.first) || keepsItsList || !outcome.second)
+                                         << walk.name << " at call " << row;
+                                 },
+                                 E_ACCESSDENIED);
     }
     std::cout << "[ walked   ] " << walked << " failure paths in " << std::size(walks) << " scenarios\n";
 }

@@ -10,6 +10,7 @@
 
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include <ut/platform/com.h>
@@ -58,6 +59,14 @@ void WalkHostFaults(Run run, Check check, HRESULT code = E_FAIL) {
         if (!fired)
             return;
     }
+}
+
+// What an operation that hands out an object answered, and whether it handed one out; the object
+// is released here, so that the walk's check for live objects sees nothing left.
+inline std::pair<HRESULT, bool> Released(std::pair<HRESULT, IUnknown*> outcome) {
+    if (outcome.second)
+        outcome.second->Release();
+    return {outcome.first, outcome.second != nullptr};
 }
 
 } // namespace ut::test

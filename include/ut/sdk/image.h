@@ -9,6 +9,8 @@
 // three library functions at the end of this header.
 #pragma once
 
+#include <cstddef>
+
 #include <ut/platform/bitmap.h>
 #include <ut/platform/com.h>
 #include <ut/sdk/export.h>
@@ -80,6 +82,9 @@ template <>
 struct ut::InterfaceId<IGWImageSetup> : ut::Iid<IID_IGWImageSetup> {};
 template <>
 struct ut::InterfaceId<IGWImageLoader> : ut::Iid<IID_IGWImageLoader> {};
+
+// Bytes a pixel of `format` takes: 1, 2, 4 or 8, and 0 for a format other than the four above.
+UT_SDK_API std::size_t GWPixelFormatSize(REFGUID format);
 
 // The application's image loader (found through GWQueryGenericObject).
 UT_SDK_API HRESULT KXGetImageLoader(IGWImageLoader** loader);
