@@ -521,6 +521,10 @@ HRESULT C3DStreamCompressor::ChunkReadClose() {
         return E_UNEXPECTED;
     ULONGLONG end = readEnds_.back();
     readEnds_.pop_back();
+    // A reader that consumed its chunk exactly is where both rules put it; the ambient value
+    // is a host round trip, so it is asked only when the position would change.
+    if (buffer_->Position() == end)
+        return S_OK;
     // While a delta is imported the reader stays where the object left it.
     if (ImportingDelta())
         return S_OK;

@@ -1,7 +1,7 @@
 // C3DStreamHelper: routes values and chunks to the stream's compressor, and counts open chunks.
-#include <cstdlib>
-
 #include <ut/persist.h>
+#include <ut/platform/detail/boundary.h>
+#include <ut/sdk/detail/stream_buffer.h>
 
 namespace {
 
@@ -123,19 +123,15 @@ HRESULT C3DStreamHelper::PutString(const CKXString& text) {
     return CGWStreamHelper::PutUnicodeString(text.Length() ? text.c_str() : L"", -1);
 }
 
+// One pass over the string, decoded straight into the text that `text` then takes over: the
+// same result as asking the base for the length and then for a string of that size, without
+// decoding the string twice or copying it out of a buffer of its own.
 HRESULT C3DStreamHelper::GetString(CKXString& text) {
-    ULONG length = 0;
-    CGWStreamHelper::GetStringLength(&length);
-    auto* buffer =
-        static_cast<wchar_t*>(std::malloc((static_cast<std::size_t>(length) + 1) * sizeof(wchar_t)));
-    if (!buffer)
-        return E_OUTOFMEMORY;
-    HRESULT hr = CGWStreamHelper::GetUnicodeString(buffer, static_cast<LONG>(length + 1));
-    if (FAILED(hr)) {
-        std::free(buffer);
+    std::wstring read;
+    HRESULT hr = ut::ExportBoundary([&] { return ut::sdk::ReadWideText(Buffer(), read); });
+    if (FAILED(hr))
         return hr;
-    }
-    text.Attach_CRT(buffer);
+    text = CKXString(std::move(read));
     return S_OK;
 }
 
