@@ -3,6 +3,8 @@
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/detail/stream_buffer.h>
 
+#include "persist/stock_codec.h"
+
 namespace {
 
 constexpr ULONG kCountingOff = 0xFFFFFFFF;
@@ -23,6 +25,10 @@ C3DStreamHelper::C3DStreamHelper(IStream* stream) : CGWStreamHelper(stream) {
     if (!stream)
         return;
     (void)stream->QueryInterface(IID_I3DStreamCompressor, compressor_.PutVoid()); // none: the plain form
+    if (ut::ComPtr<I3DStreamCompressor> stock;
+        compressor_ && SUCCEEDED(stream->QueryInterface(ut::persist::IID_StockCompressor, stock.PutVoid())) &&
+        stock.Get() == compressor_.Get())
+        stock_ = static_cast<C3DStreamCompressor*>(stock.Get()); // kept alive by compressor_
     ut::ComPtr<IUnknown> counting;
     if (SUCCEEDED(stream->QueryInterface(IID_IGWChunkCountingStream, counting.PutVoid())) && counting)
         return;
@@ -78,10 +84,14 @@ HRESULT C3DStreamHelper::CountClose(HRESULT hr) {
 // Values.
 
 HRESULT C3DStreamHelper::PutUInt32(ULONG value) {
+    if (stock_)
+        return ut::persist::StockCodec::SaveUInt32(*stock_, value);
     return compressor_ ? compressor_->SavePackedVarLenUInt32(value) : CGWStreamHelper::PutUInt32(value);
 }
 
 HRESULT C3DStreamHelper::GetUInt32(ULONG& value) {
+    if (stock_)
+        return ut::persist::StockCodec::LoadUInt32(*stock_, value);
     return compressor_ ? compressor_->LoadPackedVarLenUInt32(value) : CGWStreamHelper::GetUInt32(value);
 }
 
@@ -94,10 +104,14 @@ HRESULT C3DStreamHelper::StoreUInt32(ULONG value) {
 }
 
 HRESULT C3DStreamHelper::PutInt32(LONG value) {
+    if (stock_)
+        return ut::persist::StockCodec::SaveInt32(*stock_, value);
     return compressor_ ? compressor_->SavePackedVarLenInt32(value) : CGWStreamHelper::PutInt32(value);
 }
 
 HRESULT C3DStreamHelper::GetInt32(LONG& value) {
+    if (stock_)
+        return ut::persist::StockCodec::LoadInt32(*stock_, value);
     return compressor_ ? compressor_->LoadPackedVarLenInt32(value) : CGWStreamHelper::GetInt32(value);
 }
 
@@ -106,10 +120,14 @@ HRESULT C3DStreamHelper::SkipInt32() {
 }
 
 HRESULT C3DStreamHelper::PutDouble(double value) {
+    if (stock_)
+        return ut::persist::StockCodec::SaveDouble(*stock_, value);
     return compressor_ ? compressor_->SaveVarLenDouble(value) : CGWStreamHelper::PutDouble(value);
 }
 
 HRESULT C3DStreamHelper::GetDouble(double& value) {
+    if (stock_)
+        return ut::persist::StockCodec::LoadDouble(*stock_, value);
     return compressor_ ? compressor_->LoadVarLenDouble(value) : CGWStreamHelper::GetDouble(value);
 }
 

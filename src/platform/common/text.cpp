@@ -159,6 +159,16 @@ std::size_t DecodeUtf16Le(const std::uint8_t* bytes, std::size_t units, wchar_t*
     auto unit = [bytes](std::size_t i) {
         return static_cast<char32_t>(bytes[2 * i] | (static_cast<unsigned>(bytes[2 * i + 1]) << 8));
     };
+    // Text without surrogates, nearly all of it, widens unit by unit in a loop the compiler can
+    // vectorise; the pairing below is only for the rest.
+    bool surrogates = false;
+    for (std::size_t i = 0; i < units; ++i)
+        surrogates |= IsSurrogate(unit(i));
+    if (kWideIsUtf16 || !surrogates) {
+        for (std::size_t i = 0; i < units; ++i)
+            out[i] = static_cast<wchar_t>(unit(i));
+        return units;
+    }
     wchar_t* next = out;
     for (std::size_t i = 0; i < units; ++i) {
         char32_t c = unit(i);
