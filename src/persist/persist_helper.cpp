@@ -153,7 +153,7 @@ HRESULT C3DStreamHelper::GetString(CKXString& text) {
     return S_OK;
 }
 
-// Chunks.
+// Chunks. The library's own compressor is called without the virtual dispatch, as for values.
 
 HRESULT C3DStreamHelper::ChunkPeekHeader(ULONG* id, ULONG* version) {
     return Route(
@@ -169,7 +169,11 @@ HRESULT C3DStreamHelper::SkipChunk() {
 
 HRESULT C3DStreamHelper::ChunkWriteOpen(ULONG id, ULONG version) {
     return CountWriteOpen(Route(
-        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkWriteOpen(id, version); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkWriteOpen(id, version)
+                          : c->ChunkWriteOpen(id, version);
+        },
         [&] { return CGWStreamHelper::ChunkWriteOpen(id, version); }));
 }
 
@@ -181,7 +185,11 @@ HRESULT C3DStreamHelper::ChunkSafeWriteOpen(ULONG id, ULONG version) {
 
 HRESULT C3DStreamHelper::ChunkReadOpen(ULONG id, ULONG* version) {
     return CountReadOpen(Route(
-        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkReadOpen(id, version); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkReadOpen(id, version)
+                          : c->ChunkReadOpen(id, version);
+        },
         [&] { return CGWStreamHelper::ChunkReadOpen(id, version); }));
 }
 
@@ -201,12 +209,18 @@ HRESULT C3DStreamHelper::ChunkReadClose() {
 
 HRESULT C3DStreamHelper::RawChunkWriteClose() {
     return Route(
-        compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkWriteClose(); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkWriteClose() : c->ChunkWriteClose();
+        },
         [&] { return CGWStreamHelper::ChunkWriteClose(); });
 }
 
 HRESULT C3DStreamHelper::RawChunkReadClose() {
     return Route(
-        compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkReadClose(); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkReadClose() : c->ChunkReadClose();
+        },
         [&] { return CGWStreamHelper::ChunkReadClose(); });
 }

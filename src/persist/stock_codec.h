@@ -53,8 +53,12 @@ inline HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, 
 inline HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
     if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
         ULONG length = UnpackDouble(bytes, value);
-        buffer.Advance(length ? length : 1);
-        return length ? S_OK : E_FAIL;
+        if (length == 0) [[unlikely]] {
+            buffer.Advance(1);
+            return E_FAIL;
+        }
+        buffer.Advance(length); // a branch, not a select: keeps the position's chain short
+        return S_OK;
     }
     BYTE bytes[kDecodeWindow] = {};
     (void)buffer.ReadValue(bytes[0]); // as above

@@ -161,10 +161,10 @@ std::size_t DecodeUtf16Le(const std::uint8_t* bytes, std::size_t units, wchar_t*
     };
     // Text without surrogates, nearly all of it, widens unit by unit in a loop the compiler can
     // vectorise; the pairing below is only for the rest.
-    bool surrogates = false;
+    unsigned surrogates = 0;
     for (std::size_t i = 0; i < units; ++i)
-        surrogates |= IsSurrogate(unit(i));
-    if (kWideIsUtf16 || !surrogates) {
+        surrogates |= static_cast<unsigned>(unit(i) - 0xD800u < 0x800u);
+    if (kWideIsUtf16 || surrogates == 0) {
         for (std::size_t i = 0; i < units; ++i)
             out[i] = static_cast<wchar_t>(unit(i));
         return units;
