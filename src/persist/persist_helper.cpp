@@ -81,18 +81,21 @@ HRESULT C3DStreamHelper::CountClose(HRESULT hr) {
     return hr;
 }
 
-// Values.
+// Values. A plain stream pays one test, as before; the library's own compressor is called
+// directly and any other one through its interface.
 
 HRESULT C3DStreamHelper::PutUInt32(ULONG value) {
-    if (stock_)
-        return ut::persist::StockCodec::SaveUInt32(*stock_, value);
-    return compressor_ ? compressor_->SavePackedVarLenUInt32(value) : CGWStreamHelper::PutUInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::PutUInt32(value);
+    return stock_ ? ut::persist::StockCodec::SaveUInt32(*stock_, value)
+                  : compressor_->SavePackedVarLenUInt32(value);
 }
 
 HRESULT C3DStreamHelper::GetUInt32(ULONG& value) {
-    if (stock_)
-        return ut::persist::StockCodec::LoadUInt32(*stock_, value);
-    return compressor_ ? compressor_->LoadPackedVarLenUInt32(value) : CGWStreamHelper::GetUInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::GetUInt32(value);
+    return stock_ ? ut::persist::StockCodec::LoadUInt32(*stock_, value)
+                  : compressor_->LoadPackedVarLenUInt32(value);
 }
 
 HRESULT C3DStreamHelper::SkipUInt32() {
@@ -104,15 +107,17 @@ HRESULT C3DStreamHelper::StoreUInt32(ULONG value) {
 }
 
 HRESULT C3DStreamHelper::PutInt32(LONG value) {
-    if (stock_)
-        return ut::persist::StockCodec::SaveInt32(*stock_, value);
-    return compressor_ ? compressor_->SavePackedVarLenInt32(value) : CGWStreamHelper::PutInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::PutInt32(value);
+    return stock_ ? ut::persist::StockCodec::SaveInt32(*stock_, value)
+                  : compressor_->SavePackedVarLenInt32(value);
 }
 
 HRESULT C3DStreamHelper::GetInt32(LONG& value) {
-    if (stock_)
-        return ut::persist::StockCodec::LoadInt32(*stock_, value);
-    return compressor_ ? compressor_->LoadPackedVarLenInt32(value) : CGWStreamHelper::GetInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::GetInt32(value);
+    return stock_ ? ut::persist::StockCodec::LoadInt32(*stock_, value)
+                  : compressor_->LoadPackedVarLenInt32(value);
 }
 
 HRESULT C3DStreamHelper::SkipInt32() {
@@ -120,15 +125,17 @@ HRESULT C3DStreamHelper::SkipInt32() {
 }
 
 HRESULT C3DStreamHelper::PutDouble(double value) {
-    if (stock_)
-        return ut::persist::StockCodec::SaveDouble(*stock_, value);
-    return compressor_ ? compressor_->SaveVarLenDouble(value) : CGWStreamHelper::PutDouble(value);
+    if (!compressor_)
+        return CGWStreamHelper::PutDouble(value);
+    return stock_ ? ut::persist::StockCodec::SaveDouble(*stock_, value)
+                  : compressor_->SaveVarLenDouble(value);
 }
 
 HRESULT C3DStreamHelper::GetDouble(double& value) {
-    if (stock_)
-        return ut::persist::StockCodec::LoadDouble(*stock_, value);
-    return compressor_ ? compressor_->LoadVarLenDouble(value) : CGWStreamHelper::GetDouble(value);
+    if (!compressor_)
+        return CGWStreamHelper::GetDouble(value);
+    return stock_ ? ut::persist::StockCodec::LoadDouble(*stock_, value)
+                  : compressor_->LoadVarLenDouble(value);
 }
 
 HRESULT C3DStreamHelper::SkipDouble() {
