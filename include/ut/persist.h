@@ -27,6 +27,9 @@ enum : ULONG { eFeatureNumber = 0, eFeatureCurrent = 1, eFeatureLoaded = 2 };
 UT_API extern ULONG g_uiFeaturesVersion[eFeaturesVersionCount][3];
 
 class C3DStreamHelper;
+namespace ut::persist {
+struct StockCodec;
+}
 
 // Fills the loaded column of g_uiFeaturesVersion from the stream's feature-version chunk. A stream
 // without one reports loaded version 0 for the scene feature. S_OK whatever the stream holds.
@@ -224,6 +227,8 @@ public:
     HRESULT Term(IStream* stream, int skip);
 
 private:
+    friend struct ut::persist::StockCodec; // the value operations, also called directly by the helper
+
     struct HeaderRow {
         ULONG version;
         ULONG id;
@@ -231,6 +236,9 @@ private:
 
     HRESULT PutChunkHeader(ULONG id, ULONG version);
     HRESULT GetChunkHeader(ULONG& id, ULONG& version, bool record);
+    // Opens a chunk whose header refers to a known row, when the window holds it; false when
+    // the general path has to decide (`hr` is then untouched).
+    bool OpenReferencedChunk(ULONG id, ULONG* version, HRESULT& hr);
     // Drops the rows recorded after `lastKept` (by an open that then failed).
     void ForgetRowsAfter(int lastKept);
 
@@ -304,6 +312,9 @@ private:
     HRESULT CountClose(HRESULT hr);
 
     ut::ComPtr<I3DStreamCompressor> compressor_;
+    // The same compressor when it is the library's own: its value operations are then called
+    // directly, without a virtual call per value. Null otherwise.
+    C3DStreamCompressor* stock_ = nullptr;
     BYTE lastOpenWasRead_ = 1;
     ULONG openDepth_ = 0;
 };

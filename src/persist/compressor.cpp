@@ -10,10 +10,9 @@
 
 #include "module/state.h"
 #include "persist/packing.h"
+#include "persist/stock_codec.h"
 
 namespace {
-
-using ut::persist::kMaxPacked;
 
 // "IGAM": a compact stream starts with this empty chunk.
 constexpr ULONG kMarkerId = 0x4D414749;
@@ -173,70 +172,10 @@ HRESULT C3DStreamCompressor::GetStartCount(ULONG& hostVersionKnown, ULONG& start
     return S_OK;
 }
 
-// Packed values. Encoders write straight into the window when it has room at its end, and
-// decoders read straight from it when it holds a whole form; otherwise the bytes go through a
-// local copy and the same code.
-
-namespace {
-
-using ut::persist::kDecodeWindow;
-
-template <class T>
-HRESULT WritePacked(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T value) {
-    if (BYTE* room = buffer.Reserve(kMaxPacked)) {
-        buffer.Commit(pack(value, room));
-        return S_OK;
-    }
-    BYTE bytes[kMaxPacked];
-    return buffer.Write(bytes, pack(value, bytes));
-}
-
-// Decodes one integer form whose tag is at least `lowestTag`.
-HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, ULONG& value) {
-    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
-        if (bytes[0] < lowestTag) {
-            buffer.Advance(1);
-            return E_FAIL;
-        }
-        buffer.Advance(ut::persist::UnpackInteger(bytes, value));
-        return S_OK;
-    }
-    BYTE bytes[kDecodeWindow] = {};
-    (void)buffer.ReadValue(bytes[0]); // a missing tag stays 0, which no form has
-    if (bytes[0] < lowestTag)
-        return E_FAIL;
-    if (HRESULT hr = buffer.Read(bytes + 1, ut::persist::PayloadBytes(bytes[0])); FAILED(hr))
-        return hr;
-    ut::persist::UnpackInteger(bytes, value);
-    return S_OK;
-}
-
-HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
-    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
-        ULONG length = ut::persist::UnpackDouble(bytes, value);
-        buffer.Advance(length ? length : 1);
-        return length ? S_OK : E_FAIL;
-    }
-    BYTE bytes[kDecodeWindow] = {};
-    (void)buffer.ReadValue(bytes[0]); // as above
-    double probe = 0;
-    ULONG length = ut::persist::UnpackDouble(bytes, probe);
-    if (!length)
-        return E_FAIL;
-    if (HRESULT hr = buffer.Read(bytes + 1, length - 1); FAILED(hr))
-        return hr;
-    ut::persist::UnpackDouble(bytes, value);
-    return S_OK;
-}
-
-} // namespace
+// Packed values: the bodies are shared with C3DStreamHelper's direct calls.
 
 HRESULT C3DStreamCompressor::SavePackedVarLenUInt32(const ULONG& value) {
-    if (!buffer_)
-        return E_UNEXPECTED;
-    if (!Packing(packUInt32_))
-        return buffer_->WriteValue(value);
-    return WritePacked(*buffer_, &ut::persist::PackUInt32, value);
+    return ut::persist::StockCodec::SaveUInt32(*this, value);
 }
 
 HRESULT C3DStreamCompressor::SavePackedVarLenUInt32ForPatchBack(const ULONG& value) {
@@ -250,12 +189,7 @@ HRESULT C3DStreamCompressor::SavePackedVarLenUInt32ForPatchBack(const ULONG& val
 }
 
 HRESULT C3DStreamCompressor::LoadPackedVarLenUInt32(ULONG& value) {
-    value = 0;
-    if (!buffer_)
-        return E_UNEXPECTED;
-    if (!Packing(packUInt32_))
-        return buffer_->ReadValue(value);
-    return ReadPackedInteger(*buffer_, ut::persist::kTagWhole, value);
+    return ut::persist::StockCodec::LoadUInt32(*this, value);
 }
 
 HRESULT C3DStreamCompressor::SkipPackedVarLenUInt32() {
@@ -268,11 +202,7 @@ HRESULT C3DStreamCompressor::SkipPackedVarLenUInt32() {
 }
 
 HRESULT C3DStreamCompressor::SavePackedVarLenInt32(const LONG& value) {
-    if (!buffer_)
-        return E_UNEXPECTED;
-    if (!Packing(packInt32_))
-        return buffer_->WriteValue(value);
-    return WritePacked(*buffer_, &ut::persist::PackInt32, value);
+    return ut::persist::StockCodec::SaveInt32(*this, value);
 }
 
 HRESULT C3DStreamCompressor::SavePackedVarLenInt32ForPatchBack(const LONG&) {
@@ -280,15 +210,7 @@ HRESULT C3DStreamCompressor::SavePackedVarLenInt32ForPatchBack(const LONG&) {
 }
 
 HRESULT C3DStreamCompressor::LoadPackedVarLenInt32(LONG& value) {
-    value = 0;
-    if (!buffer_)
-        return E_UNEXPECTED;
-    if (!Packing(packInt32_))
-        return buffer_->ReadValue(value);
-    ULONG bits = 0;
-    HRESULT hr = ReadPackedInteger(*buffer_, ut::persist::kTagNegWhole, bits);
-    value = static_cast<LONG>(bits);
-    return hr;
+    return ut::persist::StockCodec::LoadInt32(*this, value);
 }
 
 HRESULT C3DStreamCompressor::SkipPackedVarLenInt32() {
@@ -298,19 +220,11 @@ HRESULT C3DStreamCompressor::SkipPackedVarLenInt32() {
 }
 
 HRESULT C3DStreamCompressor::SaveVarLenDouble(const double& value) {
-    if (!buffer_)
-        return E_UNEXPECTED;
-    if (!Packing(packDouble_))
-        return buffer_->WriteValue(value);
-    return WritePacked(*buffer_, &ut::persist::PackDouble, value);
+    return ut::persist::StockCodec::SaveDouble(*this, value);
 }
 
 HRESULT C3DStreamCompressor::LoadVarLenDouble(double& value) {
-    if (!buffer_)
-        return E_UNEXPECTED;
-    if (!Packing(packDouble_))
-        return buffer_->ReadValue(value);
-    return ReadPackedDouble(*buffer_, value);
+    return ut::persist::StockCodec::LoadDouble(*this, value);
 }
 
 // A plain double takes 8 bytes, but the skip moves 4 like the integer skips: streams written so
@@ -401,7 +315,13 @@ HRESULT C3DStreamCompressor::GetChunkHeader(ULONG& id, ULONG& version, bool reco
 
 // Chunks.
 
+// Pushes that fit the stacks' capacity cannot throw; only growing goes through the boundary,
+// which keeps the exception machinery out of the path taken for nearly every chunk.
 HRESULT C3DStreamCompressor::PushReadEnd(ULONGLONG end) {
+    if (readEnds_.size() < readEnds_.capacity()) {
+        readEnds_.push_back(end);
+        return S_OK;
+    }
     return ut::ExportBoundary([&] {
         readEnds_.push_back(end);
         return S_OK;
@@ -409,8 +329,13 @@ HRESULT C3DStreamCompressor::PushReadEnd(ULONGLONG end) {
 }
 
 HRESULT C3DStreamCompressor::PushWriteStart() {
+    const ULONGLONG start = buffer_->Position();
+    if (writeStarts_.size() < writeStarts_.capacity()) {
+        writeStarts_.push_back(start);
+        return S_OK;
+    }
     return ut::ExportBoundary([&] {
-        writeStarts_.push_back(buffer_->Position());
+        writeStarts_.push_back(start);
         return S_OK;
     });
 }
@@ -452,9 +377,35 @@ HRESULT C3DStreamCompressor::ChunkWriteClose() {
     return ut::sdk::CloseWrittenChunk(*buffer_, writeStarts_);
 }
 
+// Most headers refer to a row defined earlier; with the index byte and the size field in the
+// window such a chunk opens in one step, with the same outcome as the general path below.
+bool C3DStreamCompressor::OpenReferencedChunk(ULONG id, ULONG* version, HRESULT& hr) {
+    if (!packHeaders_)
+        return false;
+    const BYTE* bytes = buffer_->Peek(1 + sizeof(ULONG));
+    if (!bytes)
+        return false;
+    const BYTE index = bytes[0];
+    const ULONGLONG start = buffer_->Position();
+    const ULONG definedAt = headerPos_[index];
+    if (definedAt == 0 || definedAt == static_cast<ULONG>(start + 1) || headerTable_[index].id != id)
+        return false; // a definition, or another chunk: the general path decides
+    ULONG size = 0;
+    std::memcpy(&size, bytes + 1, sizeof size);
+    hr = PushReadEnd(start + 1 + sizeof size + size);
+    if (FAILED(hr))
+        return true; // nothing consumed yet
+    buffer_->Advance(1 + sizeof size);
+    if (version)
+        *version = headerTable_[index].version;
+    return true;
+}
+
 HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
     if (!active_)
         return STG_E_OLDFORMAT;
+    if (HRESULT hr = S_OK; OpenReferencedChunk(id, version, hr))
+        return hr;
     ut::sdk::Rewind rewind(*buffer_);
     // A header that cannot be read reports an id of its own, so that a reader probing for an
     // optional last chunk is told "another chunk" at the end of the stream too.
@@ -521,6 +472,10 @@ HRESULT C3DStreamCompressor::ChunkReadClose() {
         return E_UNEXPECTED;
     ULONGLONG end = readEnds_.back();
     readEnds_.pop_back();
+    // A reader that consumed its chunk exactly is where both rules put it; the ambient value
+    // is a host round trip, so it is asked only when the position would change.
+    if (buffer_->Position() == end)
+        return S_OK;
     // While a delta is imported the reader stays where the object left it.
     if (ImportingDelta())
         return S_OK;

@@ -1,7 +1,9 @@
 // C3DStreamHelper: routes values and chunks to the stream's compressor, and counts open chunks.
-#include <cstdlib>
-
 #include <ut/persist.h>
+#include <ut/platform/detail/boundary.h>
+#include <ut/sdk/detail/stream_buffer.h>
+
+#include "persist/stock_codec.h"
 
 namespace {
 
@@ -23,6 +25,10 @@ C3DStreamHelper::C3DStreamHelper(IStream* stream) : CGWStreamHelper(stream) {
     if (!stream)
         return;
     (void)stream->QueryInterface(IID_I3DStreamCompressor, compressor_.PutVoid()); // none: the plain form
+    if (ut::ComPtr<I3DStreamCompressor> stock;
+        compressor_ && SUCCEEDED(stream->QueryInterface(ut::persist::IID_StockCompressor, stock.PutVoid())) &&
+        stock.Get() == compressor_.Get())
+        stock_ = static_cast<C3DStreamCompressor*>(stock.Get()); // kept alive by compressor_
     ut::ComPtr<IUnknown> counting;
     if (SUCCEEDED(stream->QueryInterface(IID_IGWChunkCountingStream, counting.PutVoid())) && counting)
         return;
@@ -75,14 +81,21 @@ HRESULT C3DStreamHelper::CountClose(HRESULT hr) {
     return hr;
 }
 
-// Values.
+// Values. A plain stream pays one test, as before; the library's own compressor is called
+// directly and any other one through its interface.
 
 HRESULT C3DStreamHelper::PutUInt32(ULONG value) {
-    return compressor_ ? compressor_->SavePackedVarLenUInt32(value) : CGWStreamHelper::PutUInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::PutUInt32(value);
+    return stock_ ? ut::persist::StockCodec::SaveUInt32(*stock_, value)
+                  : compressor_->SavePackedVarLenUInt32(value);
 }
 
 HRESULT C3DStreamHelper::GetUInt32(ULONG& value) {
-    return compressor_ ? compressor_->LoadPackedVarLenUInt32(value) : CGWStreamHelper::GetUInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::GetUInt32(value);
+    return stock_ ? ut::persist::StockCodec::LoadUInt32(*stock_, value)
+                  : compressor_->LoadPackedVarLenUInt32(value);
 }
 
 HRESULT C3DStreamHelper::SkipUInt32() {
@@ -94,11 +107,17 @@ HRESULT C3DStreamHelper::StoreUInt32(ULONG value) {
 }
 
 HRESULT C3DStreamHelper::PutInt32(LONG value) {
-    return compressor_ ? compressor_->SavePackedVarLenInt32(value) : CGWStreamHelper::PutInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::PutInt32(value);
+    return stock_ ? ut::persist::StockCodec::SaveInt32(*stock_, value)
+                  : compressor_->SavePackedVarLenInt32(value);
 }
 
 HRESULT C3DStreamHelper::GetInt32(LONG& value) {
-    return compressor_ ? compressor_->LoadPackedVarLenInt32(value) : CGWStreamHelper::GetInt32(value);
+    if (!compressor_)
+        return CGWStreamHelper::GetInt32(value);
+    return stock_ ? ut::persist::StockCodec::LoadInt32(*stock_, value)
+                  : compressor_->LoadPackedVarLenInt32(value);
 }
 
 HRESULT C3DStreamHelper::SkipInt32() {
@@ -106,11 +125,17 @@ HRESULT C3DStreamHelper::SkipInt32() {
 }
 
 HRESULT C3DStreamHelper::PutDouble(double value) {
-    return compressor_ ? compressor_->SaveVarLenDouble(value) : CGWStreamHelper::PutDouble(value);
+    if (!compressor_)
+        return CGWStreamHelper::PutDouble(value);
+    return stock_ ? ut::persist::StockCodec::SaveDouble(*stock_, value)
+                  : compressor_->SaveVarLenDouble(value);
 }
 
 HRESULT C3DStreamHelper::GetDouble(double& value) {
-    return compressor_ ? compressor_->LoadVarLenDouble(value) : CGWStreamHelper::GetDouble(value);
+    if (!compressor_)
+        return CGWStreamHelper::GetDouble(value);
+    return stock_ ? ut::persist::StockCodec::LoadDouble(*stock_, value)
+                  : compressor_->LoadVarLenDouble(value);
 }
 
 HRESULT C3DStreamHelper::SkipDouble() {
@@ -123,23 +148,19 @@ HRESULT C3DStreamHelper::PutString(const CKXString& text) {
     return CGWStreamHelper::PutUnicodeString(text.Length() ? text.c_str() : L"", -1);
 }
 
+// One pass over the string, decoded straight into the text that `text` then takes over: the
+// same result as asking the base for the length and then for a string of that size, without
+// decoding the string twice or copying it out of a buffer of its own.
 HRESULT C3DStreamHelper::GetString(CKXString& text) {
-    ULONG length = 0;
-    CGWStreamHelper::GetStringLength(&length);
-    auto* buffer =
-        static_cast<wchar_t*>(std::malloc((static_cast<std::size_t>(length) + 1) * sizeof(wchar_t)));
-    if (!buffer)
-        return E_OUTOFMEMORY;
-    HRESULT hr = CGWStreamHelper::GetUnicodeString(buffer, static_cast<LONG>(length + 1));
-    if (FAILED(hr)) {
-        std::free(buffer);
+    std::wstring read;
+    HRESULT hr = ut::ExportBoundary([&] { return ut::sdk::ReadWideText(Buffer(), read); });
+    if (FAILED(hr))
         return hr;
-    }
-    text.Attach_CRT(buffer);
+    text = CKXString(std::move(read));
     return S_OK;
 }
 
-// Chunks.
+// Chunks. The library's own compressor is called without the virtual dispatch, as for values.
 
 HRESULT C3DStreamHelper::ChunkPeekHeader(ULONG* id, ULONG* version) {
     return Route(
@@ -155,7 +176,11 @@ HRESULT C3DStreamHelper::SkipChunk() {
 
 HRESULT C3DStreamHelper::ChunkWriteOpen(ULONG id, ULONG version) {
     return CountWriteOpen(Route(
-        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkWriteOpen(id, version); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkWriteOpen(id, version)
+                          : c->ChunkWriteOpen(id, version);
+        },
         [&] { return CGWStreamHelper::ChunkWriteOpen(id, version); }));
 }
 
@@ -167,7 +192,11 @@ HRESULT C3DStreamHelper::ChunkSafeWriteOpen(ULONG id, ULONG version) {
 
 HRESULT C3DStreamHelper::ChunkReadOpen(ULONG id, ULONG* version) {
     return CountReadOpen(Route(
-        compressor_.Get(), [&](I3DStreamCompressor* c) { return c->ChunkReadOpen(id, version); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkReadOpen(id, version)
+                          : c->ChunkReadOpen(id, version);
+        },
         [&] { return CGWStreamHelper::ChunkReadOpen(id, version); }));
 }
 
@@ -187,12 +216,18 @@ HRESULT C3DStreamHelper::ChunkReadClose() {
 
 HRESULT C3DStreamHelper::RawChunkWriteClose() {
     return Route(
-        compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkWriteClose(); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkWriteClose() : c->ChunkWriteClose();
+        },
         [&] { return CGWStreamHelper::ChunkWriteClose(); });
 }
 
 HRESULT C3DStreamHelper::RawChunkReadClose() {
     return Route(
-        compressor_.Get(), [](I3DStreamCompressor* c) { return c->ChunkReadClose(); },
+        compressor_.Get(),
+        [&](I3DStreamCompressor* c) {
+            return stock_ ? stock_->C3DStreamCompressor::ChunkReadClose() : c->ChunkReadClose();
+        },
         [&] { return CGWStreamHelper::ChunkReadClose(); });
 }

@@ -10,6 +10,7 @@
 #include <ut/sdk/detail/stream_buffer.h>
 
 #include "module/state.h"
+#include "persist/stock_codec.h"
 
 namespace ut::persist {
 namespace {
@@ -49,6 +50,7 @@ public:
             ut::sdk::Entry<PersistStream, IStream>(IID_IGWChunkCountingStream),
             ut::sdk::Entry<PersistStream, PersistStream>(IID_PersistStream),
             {&IID_I3DStreamCompressor, &CompressorOf},
+            {&IID_StockCompressor, &CompressorOf}, // EmbeddedCompressor keeps the stock value operations
         };
         return map;
     }

@@ -1,4 +1,5 @@
 // CGWStreamHelper: the fixed-width, string, array and chunk encodings of the base helper.
+#include <cstdlib>
 #include <cstring>
 #include <string>
 
@@ -13,6 +14,8 @@ using ut::sdk::Rewind;
 
 constexpr ULONG kNullString = 0xFFFFFFFF;
 const HRESULT kBufferTooSmall = HRESULT_FROM_WIN32(ERROR_INSUFFICIENT_BUFFER);
+// Longest string encoded in place in the window (four bytes a character at most).
+constexpr std::size_t kMaxInPlaceCharacters = 4096;
 
 struct ChunkHeader {
     ULONG id;
@@ -23,6 +26,49 @@ static_assert(sizeof(ChunkHeader) == 12);
 
 std::size_t MeasureWide(const wchar_t* text, LONG length) {
     return length >= 0 ? static_cast<std::size_t>(length) : std::char_traits<wchar_t>::length(text);
+}
+
+HRESULT ReadStringUnits(ut::sdk::StreamBuffer& buffer, ULONG& units) {
+    Rewind rewind(buffer);
+    HRESULT hr = buffer.ReadValue(units);
+    if (SUCCEEDED(hr) && units != kNullString)
+        hr = buffer.EnsureReadable(ULONGLONG{units} * 2);
+    return rewind(hr);
+}
+
+HRESULT ReadUtf16Units(ut::sdk::StreamBuffer& buffer, ULONG units, wchar_t* out, std::size_t& characters) {
+    const ULONG bytes = units * 2; // below 2^32: EnsureReadable saw them inside the stream
+    if (const BYTE* window = buffer.Peek(bytes)) {
+        characters = ut::platform::DecodeUtf16Le(window, units, out);
+        buffer.Advance(bytes);
+        return S_OK;
+    }
+    std::string spill(bytes, '\0');
+    if (HRESULT hr = buffer.Read(spill.data(), bytes); FAILED(hr))
+        return hr;
+    characters = ut::platform::DecodeUtf16Le(reinterpret_cast<const std::uint8_t*>(spill.data()), units, out);
+    return S_OK;
+}
+
+// Reads a wide string (its count, then its code units) into the memory that `allocate(units)`
+// answers (room for `units` characters, or null), and tells `finish` how many characters it
+// holds. A null string allocates nothing. Consumes nothing on failure.
+template <class Allocate, class Finish>
+HRESULT ReadWideString(ut::sdk::StreamBuffer& buffer, bool& isNull, Allocate allocate, Finish finish) {
+    Rewind rewind(buffer);
+    ULONG units = 0;
+    HRESULT hr = ReadStringUnits(buffer, units);
+    isNull = SUCCEEDED(hr) && units == kNullString;
+    if (FAILED(hr) || isNull)
+        return hr;
+    wchar_t* out = allocate(units);
+    if (!out)
+        return rewind(E_OUTOFMEMORY);
+    std::size_t characters = 0;
+    hr = ReadUtf16Units(buffer, units, out, characters);
+    if (SUCCEEDED(hr))
+        finish(characters);
+    return rewind(hr);
 }
 
 } // namespace
@@ -38,6 +84,23 @@ ULONG ChunkIdFromName(const char* name) {
     for (int i = 0; i < 4; ++i)
         id |= static_cast<LONG>(static_cast<signed char>(name[i])) * (1 << (8 * i));
     return static_cast<ULONG>(id);
+}
+
+HRESULT ReadWideText(StreamBuffer& buffer, std::wstring& text) {
+    text.clear();
+    bool isNull = false;
+    HRESULT hr = ReadWideString(
+        buffer, isNull,
+        [&text](std::size_t units) {
+            return ut::ExportBoundary(
+                [&] {
+                    text.resize(units);
+                    return text.data();
+                },
+                static_cast<wchar_t*>(nullptr)); // no room: E_OUTOFMEMORY, nothing consumed
+        },
+        [&text](std::size_t characters) { text.resize(characters); });
+    return SUCCEEDED(hr) && isNull ? S_FALSE : hr;
 }
 
 HRESULT CloseWrittenChunk(StreamBuffer& buffer, std::vector<ULONGLONG>& bodyStarts) {
@@ -236,8 +299,20 @@ HRESULT CGWStreamHelper::SkipCounted(ULONGLONG unitBytes) {
 HRESULT CGWStreamHelper::PutWide(const wchar_t* text, std::size_t length) {
     if (!text)
         return buffer_->WriteValue(kNullString);
+    const std::wstring_view view(text, length);
+    // Encoded straight into the window when it has room for the longest encoding (two units a
+    // character), which spares building the bytes apart and copying them.
+    if (length < kMaxInPlaceCharacters) {
+        const auto room = static_cast<ULONG>(sizeof(ULONG) + 4 * length);
+        if (BYTE* out = buffer_->Reserve(room)) {
+            auto units = static_cast<ULONG>(ut::platform::WriteUtf16Le(view, out + sizeof(ULONG)));
+            std::memcpy(out, &units, sizeof units);
+            buffer_->Commit(static_cast<ULONG>(sizeof(ULONG) + 2 * units));
+            return S_OK;
+        }
+    }
     std::string bytes;
-    ut::platform::AppendUtf16Le(std::wstring_view(text, length), bytes);
+    ut::platform::AppendUtf16Le(view, bytes);
     if (bytes.size() / 2 >= kNullString)
         return E_INVALIDARG;
     Rewind rewind(*buffer_);
@@ -248,18 +323,9 @@ HRESULT CGWStreamHelper::PutWide(const wchar_t* text, std::size_t length) {
 }
 
 HRESULT CGWStreamHelper::ReadWide(std::wstring& text, bool& isNull) {
-    Rewind rewind(*buffer_);
-    ULONG units = 0;
-    HRESULT hr = ReadCount(units, 2);
-    isNull = SUCCEEDED(hr) && units == kNullString;
-    text.clear();
-    if (FAILED(hr) || isNull)
-        return hr;
-    std::string bytes(static_cast<std::size_t>(units) * 2, '\0');
-    hr = buffer_->Read(bytes.data(), static_cast<ULONG>(bytes.size()));
-    if (SUCCEEDED(hr))
-        text = ut::platform::WideFromUtf16Le(reinterpret_cast<const std::uint8_t*>(bytes.data()), units);
-    return rewind(hr);
+    HRESULT hr = ut::sdk::ReadWideText(*buffer_, text);
+    isNull = hr == S_FALSE;
+    return isNull ? S_OK : hr;
 }
 
 HRESULT CGWStreamHelper::ReadAnsi(std::string& text, bool& isNull) {

@@ -1,5 +1,6 @@
 // CGWStreamHelper: the host encodings byte for byte, failures that consume nothing, and a
 // buffer that keeps positions exact across its window and between helpers sharing it.
+#include <algorithm>
 #include <cstring>
 #include <functional>
 #include <string>
@@ -9,6 +10,7 @@
 #include <gtest/gtest.h>
 
 #include <ut/platform/stream.h>
+#include <ut/platform/text.h>
 #include <ut/sdk/stream_helper.h>
 #include <ut/sdk/variant.h>
 
@@ -291,6 +293,57 @@ TEST(StreamBuffer, PositionsStayExactAcrossTheWindow) {
     EXPECT_EQ(value, 0x11111111u);
     EXPECT_EQ(h.ChunkReadClose(), S_OK);
     EXPECT_EQ(h.Buffer().Position(), content.size());
+}
+
+// Strings are encoded into and decoded from the window in place when it holds them; the same
+// bytes must come out where a string straddles the window's end or is too long for that.
+TEST(StreamBuffer, StringsAcrossTheWindowEdgeKeepTheirBytes) {
+    constexpr ULONG kWindow = ut::sdk::StreamBuffer::kCapacity;
+    const std::wstring pair = L"a\U0001F600b"; // 4 code units
+    struct Case {
+        ULONG lead; // bytes before the string
+        std::wstring text;
+    };
+    const Case cases[] = {
+        {kWindow - 6, L"abcdef"},             // count inside, text across the edge
+        {kWindow - 2, L"xy"},                 // count across the edge
+        {kWindow - 7, pair},                  // a surrogate pair split by the edge
+        {10, std::wstring(5000, L'\u00E9')},  // longer than the in-place limit
+        {kWindow - 4, std::wstring(3, L'q')}, // count fills the window exactly
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.lead);
+        const std::vector<BYTE> lead(c.lead, 0x11);
+        Bytes bytes = Written([&](CGWStreamHelper& h) {
+            for (BYTE b : lead)
+                h.PutUInt8(b);
+            EXPECT_EQ(h.PutUnicodeString(c.text.c_str()), S_OK);
+            EXPECT_EQ(h.PutUnicodeString(c.text.c_str()), S_OK);
+        });
+        std::string units;
+        ut::platform::AppendUtf16Le(c.text, units);
+        Bytes one(4 + units.size());
+        auto count = static_cast<ULONG>(units.size() / 2);
+        std::memcpy(one.data(), &count, 4);
+        std::memcpy(one.data() + 4, units.data(), units.size());
+        ASSERT_EQ(bytes.size(), c.lead + 2 * one.size());
+        EXPECT_TRUE(std::equal(one.begin(), one.end(), bytes.begin() + c.lead));
+        EXPECT_TRUE(std::equal(one.begin(), one.end(), bytes.begin() + c.lead + one.size()));
+
+        ComPtr<IStream> stream = StreamOf(bytes);
+        CGWStreamHelper h(stream.Get());
+        for (BYTE b = 0; h.Buffer().Position() < c.lead;) // read, so that the window starts at 0
+            h.GetUInt8(b);
+        ULONG length = 0;
+        EXPECT_EQ(h.GetStringLength(&length), S_OK);
+        EXPECT_EQ(length, c.text.size());
+        std::vector<wchar_t> back(c.text.size() + 1);
+        EXPECT_EQ(h.GetUnicodeString(back.data(), static_cast<LONG>(back.size())), S_OK);
+        EXPECT_EQ(std::wstring(back.data()), c.text);
+        EXPECT_EQ(h.GetUnicodeString(back.data(), static_cast<LONG>(c.text.size())),
+                  HRESULT_FROM_WIN32(ERROR_INSUFFICIENT_BUFFER));
+        EXPECT_EQ(h.Buffer().Position(), c.lead + one.size()) << "a refused read consumes nothing";
+    }
 }
 
 TEST(StreamBuffer, HelpersOnOneBufferedStreamInterleave) {

@@ -122,49 +122,66 @@ std::size_t Utf16Length(std::wstring_view text) {
 }
 
 void AppendUtf16Le(std::wstring_view text, std::string& out) {
-    auto put = [&out](char32_t unit) {
-        out.push_back(static_cast<char>(unit & 0xFF));
-        out.push_back(static_cast<char>((unit >> 8) & 0xFF));
+    std::size_t start = out.size();
+    out.resize(start + 2 * Utf16Length(text));
+    WriteUtf16Le(text, reinterpret_cast<std::uint8_t*>(out.data() + start));
+}
+
+std::size_t WriteUtf16Le(std::wstring_view text, std::uint8_t* out) {
+    std::uint8_t* next = out;
+    auto put = [&next](char32_t unit) {
+        next[0] = static_cast<std::uint8_t>(unit & 0xFF);
+        next[1] = static_cast<std::uint8_t>((unit >> 8) & 0xFF);
+        next += 2;
     };
-    if constexpr (kWideIsUtf16) {
-        for (wchar_t c : text)
-            put(static_cast<char32_t>(c));
-        return;
-    }
     for (wchar_t wide : text) {
         char32_t c = static_cast<char32_t>(wide);
-        if (c > 0x10FFFF) {
+        if (kWideIsUtf16 || c <= 0xFFFF) {
+            put(c);
+        } else if (c > 0x10FFFF) {
             put(kReplacement);
-        } else if (c > 0xFFFF) {
+        } else {
             c -= 0x10000;
             put(0xD800 + (c >> 10));
             put(0xDC00 + (c & 0x3FF));
-        } else {
-            put(c);
         }
     }
+    return static_cast<std::size_t>(next - out) / 2;
 }
 
 std::wstring WideFromUtf16Le(const std::uint8_t* bytes, std::size_t units) {
-    std::wstring out;
-    out.reserve(units);
+    std::wstring out(units, L'\0');
+    out.resize(DecodeUtf16Le(bytes, units, out.data()));
+    return out;
+}
+
+std::size_t DecodeUtf16Le(const std::uint8_t* bytes, std::size_t units, wchar_t* out) {
     auto unit = [bytes](std::size_t i) {
         return static_cast<char32_t>(bytes[2 * i] | (static_cast<unsigned>(bytes[2 * i + 1]) << 8));
     };
+    // Text without surrogates, nearly all of it, widens unit by unit in a loop the compiler can
+    // vectorise; the pairing below is only for the rest.
+    unsigned surrogates = 0;
+    for (std::size_t i = 0; i < units; ++i)
+        surrogates |= static_cast<unsigned>(unit(i) - 0xD800u < 0x800u);
+    if (kWideIsUtf16 || surrogates == 0) {
+        for (std::size_t i = 0; i < units; ++i)
+            out[i] = static_cast<wchar_t>(unit(i));
+        return units;
+    }
+    wchar_t* next = out;
     for (std::size_t i = 0; i < units; ++i) {
         char32_t c = unit(i);
-        if constexpr (kWideIsUtf16) {
-            out.push_back(static_cast<wchar_t>(c));
-            continue;
-        }
-        if (IsHighSurrogate(c) && i + 1 < units && IsLowSurrogate(unit(i + 1))) {
-            out.push_back(static_cast<wchar_t>(0x10000 + ((c - 0xD800) << 10) + (unit(i + 1) - 0xDC00)));
+        if (kWideIsUtf16 || !IsSurrogate(c)) {
+            *next++ = static_cast<wchar_t>(c);
+        } else if (IsHighSurrogate(c) && i + 1 < units && IsLowSurrogate(unit(i + 1))) {
+            *next++ = static_cast<wchar_t>(0x10000 + ((c - 0xD800) << 10) + (unit(i + 1) - 0xDC00));
             ++i;
         } else {
-            out.push_back(static_cast<wchar_t>(IsSurrogate(c) ? kReplacement : c));
+            *next++ = static_cast<wchar_t>(kReplacement);
         }
     }
-    return out;
+    return static_cast<std::size_t>(next - out);
 }
 
 } // namespace ut::platform

@@ -22,6 +22,7 @@
 #include <bit>
 #include <cstring>
 #include <memory>
+#include <string>
 #include <vector>
 
 #include <ut/platform/stream.h>
@@ -181,6 +182,9 @@ private:
 
 // The chunk id of a four-character name: the bytes in written order, each sign-extended.
 UT_SDK_API ULONG ChunkIdFromName(const char* name);
+// Reads the wide string at the position into `text`, decoded straight from the window. A null
+// string reads as an empty one with S_FALSE. On failure nothing is consumed.
+UT_SDK_API HRESULT ReadWideText(StreamBuffer& buffer, std::wstring& text);
 // Closes the innermost chunk open for writing: pops the start of its body and writes the body's
 // size into the 4 bytes before it (an empty body keeps the 0 written at the open).
 UT_SDK_API HRESULT CloseWrittenChunk(StreamBuffer& buffer, std::vector<ULONGLONG>& bodyStarts);
