@@ -40,6 +40,19 @@ const ut::module::PresetEntry* Cached(REFGUID clsid, const CKXString& name) {
     return entry == byClass->second.end() ? nullptr : &entry->second;
 }
 
+// The class's favourite preset sub-folder; the host's failure as it came (and an empty folder).
+HRESULT FavouriteFolder(REFGUID clsid, CKXString& folder) {
+    wchar_t* text = nullptr;
+    HRESULT hr = GWGetFavoritePresetPath(clsid, &text);
+    if (FAILED(hr)) {
+        CoTaskMemFree(text);
+        folder = L"";
+        return hr;
+    }
+    folder.Attach_OLE(text);
+    return hr;
+}
+
 // A folder being listed by the search, and the entry its listing gave last.
 struct Level {
     CKXString folder;
@@ -107,12 +120,8 @@ CKXString FindBelow(int kind, const CKXString& location, const CKXString& inPres
 HRESULT Search(REFGUID clsid, const wchar_t* presetName, CKXString& path,
                std::vector<ut::PresetCandidate>* examined) {
     path = L"";
-    wchar_t* text = nullptr;
     CKXString folder;
-    if (SUCCEEDED(GWGetFavoritePresetPath(clsid, &text)))
-        folder.Attach_OLE(text);
-    else
-        CoTaskMemFree(text); // a class without a known folder has its presets at the top
+    (void)FavouriteFolder(clsid, folder); // a class without a known folder has its presets at the top
     const CKXString inPresets = CKXString(kPresetFolder) + L"\\" + folder + L"\\" + presetName;
     for (int kind = E3D_INSTALL_PATH_PROJECT; kind <= E3D_INSTALL_PATH_NONE; ++kind) {
         std::vector<CKXString> locations;
@@ -189,13 +198,9 @@ HRESULT ClassPresetFile(REFGUID clsid, const CKXString& name, const std::vector<
         file = entry->path;
         return S_OK;
     }
-    wchar_t* text = nullptr;
-    if (HRESULT hr = GWGetFavoritePresetPath(clsid, &text); FAILED(hr)) {
-        CoTaskMemFree(text);
-        return hr;
-    }
     CKXString favourite;
-    favourite.Attach_OLE(text);
+    if (HRESULT hr = FavouriteFolder(clsid, favourite); FAILED(hr))
+        return hr;
     for (const CKXString& folder : folders ? *folders : std::vector<CKXString>()) {
         CKXString resolved;
         if (CKXPathHelper::GetResolvedPath(folder + L"\\" + favourite + L"\\" + name, resolved) == S_OK) {
