@@ -69,6 +69,8 @@ struct PresetCandidate {
 // order; the result and `path` are KXFindPresetPath's.
 UT_API HRESULT TracePresetSearch(const GUID& clsid, const wchar_t* presetName, CKXString& path,
                                  std::vector<PresetCandidate>& examined);
+// `presetName` as a preset file's name: with ".Preset" appended unless it already ends so.
+UT_API CKXString PresetFileName(const wchar_t* presetName);
 // Forgets every cached preset, for when preset files were moved or removed.
 UT_API void ClearPresetCache();
 

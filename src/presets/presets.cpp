@@ -24,13 +24,6 @@ constexpr const wchar_t* kPresetFolder = L"Data\\GWPresets";
 constexpr const wchar_t* kExtension = L".Preset";
 constexpr int kExtensionLength = 7;
 
-CKXString WithExtension(const wchar_t* name) {
-    CKXString full(name);
-    if (!full.Right(kExtensionLength).CaseLessEqual(kExtension))
-        full += kExtension;
-    return full;
-}
-
 const ut::module::PresetEntry* Cached(REFGUID clsid, const CKXString& name) {
     const ut::module::PresetCache& cache = ut::module::Presets();
     auto byClass = cache.find(clsid);
@@ -160,7 +153,7 @@ HRESULT ObjectClassOfPreset(REFGUID clsid, const wchar_t* presetName, GUID* obje
     *objectClsid = GUID_NULL;
     if (!presetName)
         return E_POINTER;
-    CKXString name = WithExtension(presetName);
+    CKXString name = ut::PresetFileName(presetName);
     if (const ut::module::PresetEntry* entry = Cached(clsid, name)) {
         *objectClsid = entry->objectClass;
         return S_OK;
@@ -274,7 +267,7 @@ HRESULT CreateFromPreset(REFGUID clsid, const wchar_t* presetName, REFIID iid, v
     ComPtr<IGWFilePath> filePath;
     if (FAILED(KXCreateInstance(CLSID_GWFilePath, IID_IGWFilePath, filePath.PutVoid())) || !filePath)
         return E_OUTOFMEMORY;
-    const CKXString name = WithExtension(presetName);
+    const CKXString name = ut::PresetFileName(presetName);
     const bool ofClass = !IsEqualGUID(clsid, GUID_NULL);
     CKXString file;
     if (HRESULT hr = ofClass ? ClassPresetFile(clsid, name, folders, file) : NamedPresetFile(name, file);
@@ -399,6 +392,13 @@ HRESULT TracePresetSearch(const GUID& clsid, const wchar_t* presetName, CKXStrin
     if (!presetName)
         return E_POINTER;
     return ExportBoundary([&] { return Search(clsid, presetName, path, &examined); });
+}
+
+CKXString PresetFileName(const wchar_t* presetName) {
+    CKXString full(presetName);
+    if (!full.Right(kExtensionLength).CaseLessEqual(kExtension))
+        full += kExtension;
+    return full;
 }
 
 void ClearPresetCache() {

@@ -32,12 +32,10 @@ void Find(const FindOptions& options) {
     ut::host::ReferenceHost host;
     if (FAILED(host.Status()))
         Fail(kExitUsage, "the reference host did not start");
-    std::wstring name = ut::platform::WideFromUtf8(options.name);
-    if (name.size() < 7 || !CKXString(name).Right(7).CaseLessEqual(L".Preset"))
-        name += L".Preset";
+    const CKXString name = ut::PresetFileName(ut::platform::WideFromUtf8(options.name).c_str());
     CKXString path;
     std::vector<ut::PresetCandidate> examined;
-    HRESULT hr = ut::TracePresetSearch(clsid, name.c_str(), path, examined);
+    HRESULT hr = ut::TracePresetSearch(clsid, name, path, examined);
     if (FAILED(hr) && hr != E_FAIL)
         Fail(kExitUsage, "the install locations could not be listed");
     nlohmann::ordered_json locations = nlohmann::ordered_json::array();
@@ -49,14 +47,14 @@ void Find(const FindOptions& options) {
              {"wins", !candidate.found.IsEmpty() && candidate.found == path}});
     // A "no" prints nothing but its one line.
     if (path.IsEmpty())
-        Fail(kExitNo, "no preset " + Utf8(CKXString(name)) + " of that class in the " +
-                          std::to_string(examined.size()) + " install locations examined");
+        Fail(kExitNo, "no preset " + Utf8(name) + " of that class in the " + std::to_string(examined.size()) +
+                          " install locations examined");
     if (options.json) {
-        std::printf("%s\n", nlohmann::ordered_json{{"name", Utf8(CKXString(name))},
-                                                   {"locations", locations},
-                                                   {"path", Utf8(path)}}
-                                .dump()
-                                .c_str());
+        std::printf(
+            "%s\n",
+            nlohmann::ordered_json{{"name", Utf8(name)}, {"locations", locations}, {"path", Utf8(path)}}
+                .dump()
+                .c_str());
     } else {
         for (const auto& location : locations)
             std::printf(
