@@ -61,9 +61,10 @@ void Attach(Descriptor* descriptor, void* block) {
 // that is written with the same value anyway, which keeps the pooled path free of taken jumps.
 void PushFront(Descriptor*& head, Descriptor* descriptor) {
     Descriptor* first = head;
+    // Without a first block the link goes to the descriptor itself, and is cleared just after.
+    (first ? first : descriptor)->Prev = descriptor;
     descriptor->Prev = nullptr;
     descriptor->Next = first;
-    *(first ? &first->Prev : &head) = descriptor;
     head = descriptor;
 }
 
@@ -152,12 +153,15 @@ CMemoryPool::~CMemoryPool() {
 }
 
 void* CMemoryPool::Allocate(LONG size) {
-    // The pooled path (registered, and a block of the class is kept) makes no call at all.
-    ULONG request = Request(size);
-    ULONG sizeClass = SizeClass(request);
-    if (sizeClass >= kSizeClasses || !notifier_ || !freeLists_[sizeClass]) [[unlikely]]
+    // The pooled path (registered, and a block of the class is kept) makes no call at all. One
+    // unsigned compare sends sizes of 0, negative ones and unpooled ones to the slow path.
+    ULONG request = static_cast<ULONG>(size);
+    if (request - 1 >= static_cast<ULONG>(kLargestPooled) || !notifier_) [[unlikely]]
         return AllocateSlowPath(size);
-    return HandOut(inUse_, TakeFirst(freeLists_[sizeClass], request));
+    Descriptor*& freeList = freeLists_[SizeClass(request)];
+    if (!freeList) [[unlikely]]
+        return AllocateSlowPath(size);
+    return HandOut(inUse_, TakeFirst(freeList, request));
 }
 
 void* CMemoryPool::AllocateSlowPath(LONG size) {
