@@ -19,7 +19,7 @@ namespace codec {
 
 // Encoders write straight into the window when it has room at its end, and decoders read
 // straight from it when it holds a whole form; otherwise the bytes go through a local copy and
-// the same code.
+// the same code, out of line, so that the direct path needs no stack frame.
 template <class T>
 HRESULT WritePacked(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T value) {
     if (BYTE* room = buffer.Reserve(kMaxPacked)) {
@@ -30,16 +30,8 @@ HRESULT WritePacked(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T va
     return buffer.Write(bytes, pack(value, bytes));
 }
 
-// Decodes one integer form whose tag is at least `lowestTag`.
-inline HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, ULONG& value) {
-    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
-        if (bytes[0] < lowestTag) {
-            buffer.Advance(1);
-            return E_FAIL;
-        }
-        buffer.Advance(UnpackInteger(bytes, value));
-        return S_OK;
-    }
+[[gnu::noinline]] inline HRESULT ReadPackedIntegerCopied(ut::sdk::StreamBuffer& buffer, BYTE lowestTag,
+                                                         ULONG& value) {
     BYTE bytes[kDecodeWindow] = {};
     (void)buffer.ReadValue(bytes[0]); // a missing tag stays 0, which no form has
     if (bytes[0] < lowestTag)
@@ -50,16 +42,20 @@ inline HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, 
     return S_OK;
 }
 
-inline HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
-    if (const BYTE* bytes = buffer.Peek(kDecodeWindow)) {
-        ULONG length = UnpackDouble(bytes, value);
-        if (length == 0) [[unlikely]] {
-            buffer.Advance(1);
-            return E_FAIL;
-        }
-        buffer.Advance(length); // a branch, not a select: keeps the position's chain short
-        return S_OK;
+// Decodes one integer form whose tag is at least `lowestTag`.
+inline HRESULT ReadPackedInteger(ut::sdk::StreamBuffer& buffer, BYTE lowestTag, ULONG& value) {
+    if (!buffer.Holds(kDecodeWindow)) [[unlikely]]
+        return ReadPackedIntegerCopied(buffer, lowestTag, value);
+    const BYTE* bytes = buffer.Cursor();
+    if (bytes[0] < lowestTag) [[unlikely]] {
+        buffer.Advance(1);
+        return E_FAIL;
     }
+    buffer.Advance(UnpackInteger(bytes, value));
+    return S_OK;
+}
+
+[[gnu::noinline]] inline HRESULT ReadPackedDoubleCopied(ut::sdk::StreamBuffer& buffer, double& value) {
     BYTE bytes[kDecodeWindow] = {};
     (void)buffer.ReadValue(bytes[0]); // as above
     double probe = 0;
@@ -69,6 +65,18 @@ inline HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
     if (HRESULT hr = buffer.Read(bytes + 1, length - 1); FAILED(hr))
         return hr;
     UnpackDouble(bytes, value);
+    return S_OK;
+}
+
+inline HRESULT ReadPackedDouble(ut::sdk::StreamBuffer& buffer, double& value) {
+    if (!buffer.Holds(kDecodeWindow)) [[unlikely]]
+        return ReadPackedDoubleCopied(buffer, value);
+    ULONG length = UnpackDouble(buffer.Cursor(), value);
+    if (length == 0) [[unlikely]] {
+        buffer.Advance(1);
+        return E_FAIL;
+    }
+    buffer.Advance(length); // a branch, not a select: keeps the position's chain short
     return S_OK;
 }
 

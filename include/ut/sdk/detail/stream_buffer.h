@@ -110,9 +110,10 @@ public:
         valid_ = dirtyEnd_ = cursor_;
     }
     // `count` readable bytes at the position, or null; Advance(n) then consumes n of them.
-    const BYTE* Peek(ULONG count) const {
-        return count <= valid_ - cursor_ ? data_.get() + cursor_ : nullptr;
-    }
+    const BYTE* Peek(ULONG count) const { return Holds(count) ? Cursor() : nullptr; }
+    // The same in two steps, for decoders that would otherwise test the pointer again.
+    bool Holds(ULONG count) const { return count <= valid_ - cursor_; }
+    const BYTE* Cursor() const { return data_.get() + cursor_; }
     void Advance(ULONG count) { cursor_ += count; }
 
     // Up to `count` bytes; fewer only at the end of the stream. For IStream::Read.
