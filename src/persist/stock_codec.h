@@ -21,13 +21,18 @@ namespace codec {
 // straight from it when it holds a whole form; otherwise the bytes go through a local copy and
 // the same code, out of line, so that the direct path needs no stack frame.
 template <class T>
-HRESULT WritePacked(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T value) {
-    if (BYTE* room = buffer.Reserve(kMaxPacked)) {
-        buffer.Commit(pack(value, room));
-        return S_OK;
-    }
+[[gnu::noinline]] HRESULT WritePackedCopied(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T value) {
     BYTE bytes[kMaxPacked];
     return buffer.Write(bytes, pack(value, bytes));
+}
+
+template <class T>
+HRESULT WritePacked(ut::sdk::StreamBuffer& buffer, ULONG (*pack)(T, BYTE*), T value) {
+    BYTE* room = buffer.Reserve(kMaxPacked);
+    if (!room) [[unlikely]]
+        return WritePackedCopied(buffer, pack, value);
+    buffer.Commit(pack(value, room));
+    return S_OK;
 }
 
 [[gnu::noinline]] inline HRESULT ReadPackedIntegerCopied(ut::sdk::StreamBuffer& buffer, BYTE lowestTag,
