@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cstring>
 #include <map>
+#include <new>
 
 #include <ut/platform/detail/boundary.h>
 #include <ut/sdk/testing.h>
@@ -45,10 +46,15 @@ ULONG FlagsOf(const ObjectDescription& description) {
 
 namespace {
 
-// Every live object by its serial number, for moves to address objects by number.
-std::map<ULONG, SceneObject*>& Serials() {
-    static std::map<ULONG, SceneObject*> serials;
-    return serials;
+// Every live object by its serial number, for moves to address objects by number. Never
+// destroyed: a host kept in a static of the application releases its objects at exit, possibly
+// after this file's statics are gone. Built in static storage, so nothing is left on the heap
+// once the objects are.
+using SerialMap = std::map<ULONG, SceneObject*>;
+SerialMap& Serials() {
+    alignas(SerialMap) static unsigned char storage[sizeof(SerialMap)];
+    static SerialMap* serials = new (storage) SerialMap;
+    return *serials;
 }
 ULONG nextSerial = 1;
 constexpr BYTE kMovedObject = 4;

@@ -1,4 +1,5 @@
 // The reference host installs and revokes its services and answers as its settings say.
+#include <cstdlib>
 #include <memory>
 #include <string>
 #include <utility>
@@ -174,6 +175,24 @@ TEST(FileDialogs, AnswerCancelledForThereIsNoDesktop) {
     }
     EXPECT_EQ(dialogs->ShowOpenDialog(nullptr), E_POINTER);
     EXPECT_EQ(dialogs->GetExtendedError(nullptr), E_POINTER);
+}
+
+// An application may keep its host in a static; at exit it then goes after the host's own
+// statics, which must still hold for its objects.
+[[noreturn]] void ExitWithAHostInAStatic() {
+    static std::unique_ptr<ut::host::ReferenceHost> kept;
+    ut::host::Settings settings;
+    ut::host::ObjectDescription model{.name = L"Model", .model = true};
+    model.children.push_back({.name = L"Object"});
+    settings.scene.objects.push_back(std::move(model));
+    kept = std::make_unique<ut::host::ReferenceHost>(settings);
+    std::exit(0);
+}
+
+// A process of its own, so that the host's statics are made after the application's.
+TEST(ReferenceHost, KeptInAStaticEndsCleanlyAtExit) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(ExitWithAHostInAStatic(), ::testing::ExitedWithCode(0), "");
 }
 
 } // namespace
