@@ -68,11 +68,16 @@ struct Scene {
     ut::ComPtr<IGWComponentHierarchy> root;
 };
 
+// One scene at a time, as there is one reference host at a time: the old one (and its host) goes
+// before a scene of another size is made.
 Scene& SceneOf(int components) {
-    static std::unordered_map<int, std::unique_ptr<Scene>> scenes;
-    auto& scene = scenes[components];
-    if (!scene)
+    static std::unique_ptr<Scene> scene;
+    static int made = 0;
+    if (!scene || made != components) {
+        scene.reset();
         scene = std::make_unique<Scene>(components);
+        made = components;
+    }
     return *scene;
 }
 
