@@ -164,7 +164,10 @@ HRESULT C3DWatchMap::Add(GUID* guid) {
     return S_OK;
 }
 
-int C3DWatchMap::Find(REFGUID guid) const {
+// Called for every parameter of a scene walk. Started on a cache line of its own so that its loop
+// never straddles two: where the rest of the library happens to put it otherwise moved a whole
+// cache build by a fifth.
+[[gnu::aligned(64)]] int C3DWatchMap::Find(REFGUID guid) const {
     for (unsigned int i = 0; i < count_; ++i)
         if (std::memcmp(guids_[i], &guid, sizeof(GUID)) == 0)
             return 1;
