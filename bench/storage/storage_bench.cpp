@@ -21,6 +21,8 @@
 #include <gsf/gsf-infile-msole.h>
 #include <gsf/gsf-outfile-msole.h>
 #include <gsf/gsf.h>
+// After the library's headers, whose names some of its macros would take.
+#include <fcntl.h>
 
 namespace {
 
@@ -117,8 +119,18 @@ std::size_t FaceRead(const std::string& path, int first, int count) {
 
 // --- libgsf ----------------------------------------------------------------------------------
 
+// Flushes a folder's entries (a rename in it) to the disk, as the face does after its rename.
+void SyncFolder(const std::string& path) {
+    std::string folder = std::filesystem::path(path).parent_path().string();
+    int fd = ::open(folder.empty() ? "." : folder.c_str(), O_RDONLY | O_DIRECTORY);
+    if (fd >= 0) {
+        ::fsync(fd);
+        ::close(fd);
+    }
+}
+
 // Writes with libgsf; `durable` adds what the face does for crash safety: a temporary file
-// beside, flushed to the disk and renamed over the file.
+// beside, flushed to the disk and renamed over the file, and the rename flushed as well.
 bool GsfWrite(const std::string& path, int streams, std::size_t size, bool durable) {
     std::string target = durable ? path + ".XXXXXX" : path;
     std::FILE* file = nullptr;
@@ -148,6 +160,7 @@ bool GsfWrite(const std::string& path, int streams, std::size_t size, bool durab
         ::fdatasync(::fileno(file));
         std::fclose(file);
         closed = closed && ::rename(target.c_str(), path.c_str()) == 0;
+        SyncFolder(path);
     }
     return closed;
 }
