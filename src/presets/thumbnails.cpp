@@ -1,9 +1,8 @@
 // A 64 x 64 picture of the current scene, as a device bitmap or inside a scene file.
 #include <ut/presets.h>
 
-#include <utility>
-
 #include <ut/paths.h>
+#include <ut/platform/bitmap.h>
 #include <ut/sdk/image.h>
 #include <ut/sdk/objects.h>
 #include <ut/sdk/thumbnails.h>
@@ -13,26 +12,8 @@ namespace {
 using ut::ComPtr;
 
 constexpr ULONG kThumbnailSide = 64;
-// STGM_READWRITE | STGM_SHARE_EXCLUSIVE: the scene file is ours alone while the picture goes in.
-constexpr unsigned long kOpenForUpdate = 0x12;
-
-// Owns a device bitmap until it is handed on.
-class OwnedBitmap {
-public:
-    OwnedBitmap() = default;
-    OwnedBitmap(const OwnedBitmap&) = delete;
-    OwnedBitmap& operator=(const OwnedBitmap&) = delete;
-    ~OwnedBitmap() {
-        if (bitmap_)
-            (void)DeleteObject(bitmap_); // nothing to do about a bitmap that will not go
-    }
-    HBITMAP* Put() { return &bitmap_; }
-    HBITMAP Get() const { return bitmap_; }
-    HBITMAP Detach() { return std::exchange(bitmap_, nullptr); }
-
-private:
-    HBITMAP bitmap_ = nullptr;
-};
+// The scene file is ours alone while the picture goes in.
+constexpr unsigned long kOpenForUpdate = STGM_READWRITE | STGM_SHARE_EXCLUSIVE;
 
 // The application's picture source: its scene viewer first, then the source itself.
 HRESULT FindPictureSource(ComPtr<IGWPictureSource>& source) {
@@ -86,7 +67,7 @@ HRESULT KXGetThumbnail(HBITMAP* bitmap) {
     if (HRESULT hr = CreateThumbnailImage(target); FAILED(hr))
         return hr;
     double scale = FitScale(width, height);
-    OwnedBitmap made;
+    ut::platform::UniqueBitmap made;
     if (FAILED(kxILScaleTranslateImage(picture.Get(), target.Get(), scale, scale, 0.0, 0.0,
                                        KXIL_INTERPOLATE_BILINEAR)) ||
         FAILED(KXImageHlp::CreateBitmapFromImage(target.Get(), made.Put())) || !made.Get())
@@ -100,7 +81,7 @@ HRESULT KXPutThumnailInFile(const CKXString& fileName) {
     ComPtr<ILockBytes> lockBytes;
     ComPtr<IGWImage> image;
     {
-        OwnedBitmap bitmap;
+        ut::platform::UniqueBitmap bitmap;
         // No picture is no reason to refuse the save: the file simply gets no thumbnail.
         if (FAILED(KXGetThumbnail(bitmap.Put())) ||
             FAILED(GWGetGwImageFromThumbnail(bitmap.Get(), kThumbnailSide, kThumbnailSide,

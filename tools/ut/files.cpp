@@ -72,12 +72,10 @@ void Bitmap(const std::string& image, const std::string& size, const std::string
         FAILED(loader->LoadFile(platform::WideFromUtf8(image).c_str(), loaded.Put())))
         Fail(kExitUsage, image + ": not an image the host can read");
     RECT rect{0, 0, width, height};
-    HBITMAP bitmap = nullptr;
-    HRESULT hr = KXGetGWImageAsHBitmap(loaded.Get(), &rect, &bitmap);
+    platform::UniqueBitmap bitmap;
+    HRESULT hr = KXGetGWImageAsHBitmap(loaded.Get(), &rect, bitmap.Put());
     if (SUCCEEDED(hr))
-        hr = platform::WriteBitmapFile(bitmap, platform::WideFromUtf8(out).c_str());
-    if (bitmap)
-        (void)DeleteObject(bitmap); // written or not, the bitmap is done with
+        hr = platform::WriteBitmapFile(bitmap.Get(), platform::WideFromUtf8(out).c_str());
     if (FAILED(hr))
         Fail(kExitUsage, out + ": the bitmap could not be made or written");
     std::printf("%s %dx%d\n", out.c_str(), width, height);

@@ -57,14 +57,12 @@ void Get(const ThumbnailOptions& options) {
     if (FAILED(hr))
         Fail(kExitUsage, options.scene + ": the thumbnail cannot be read");
     ULONG width = 0, height = 0;
-    HBITMAP bitmap = nullptr;
+    platform::UniqueBitmap bitmap;
     hr = image->GetSize(&width, &height);
     if (SUCCEEDED(hr))
-        hr = KXImageHlp::CreateBitmapFromImage(image.Get(), &bitmap);
+        hr = KXImageHlp::CreateBitmapFromImage(image.Get(), bitmap.Put());
     if (SUCCEEDED(hr))
-        hr = platform::WriteBitmapFile(bitmap, platform::WideFromUtf8(options.image).c_str());
-    if (bitmap)
-        (void)DeleteObject(bitmap); // written or not, the bitmap is done with
+        hr = platform::WriteBitmapFile(bitmap.Get(), platform::WideFromUtf8(options.image).c_str());
     if (FAILED(hr))
         Fail(kExitUsage, options.image + ": the bitmap could not be written");
     std::printf("%s %lux%lu\n", options.image.c_str(), static_cast<unsigned long>(width),

@@ -5,6 +5,7 @@
 #pragma once
 
 #include <cstdint>
+#include <utility>
 #include <vector>
 
 #include <ut/platform/com.h>
@@ -18,6 +19,24 @@ struct BitmapPixels {
     LONG width = 0;
     LONG height = 0;
     std::vector<std::uint32_t> pixels;
+};
+
+// Owns a device bitmap until it is handed on; a bitmap that will not go is left alone.
+class UniqueBitmap {
+public:
+    UniqueBitmap() = default;
+    UniqueBitmap(const UniqueBitmap&) = delete;
+    UniqueBitmap& operator=(const UniqueBitmap&) = delete;
+    ~UniqueBitmap() {
+        if (bitmap_)
+            (void)DeleteObject(bitmap_); // nothing to do about a bitmap that will not go
+    }
+    HBITMAP* Put() noexcept { return &bitmap_; }
+    HBITMAP Get() const noexcept { return bitmap_; }
+    HBITMAP Detach() noexcept { return std::exchange(bitmap_, nullptr); }
+
+private:
+    HBITMAP bitmap_ = nullptr;
 };
 
 // Reads the pixels of a bitmap that is not selected into a device context.
