@@ -5,7 +5,7 @@
 #include <algorithm>
 #include <cstring>
 #include <memory>
-#include <optional>
+#include <string_view>
 
 #include <ut/paths.h>
 #include <ut/platform/detail/boundary.h>
@@ -21,8 +21,7 @@ namespace {
 using ut::ComPtr;
 
 constexpr const wchar_t* kPresetFolder = L"Data\\GWPresets";
-constexpr const wchar_t* kExtension = L".Preset";
-constexpr int kExtensionLength = 7;
+constexpr std::wstring_view kExtension = L".Preset";
 
 const ut::module::PresetEntry* Cached(REFGUID clsid, const CKXString& name) {
     const ut::module::PresetCache& cache = ut::module::Presets();
@@ -194,7 +193,8 @@ HRESULT ClassPresetFile(REFGUID clsid, const CKXString& name, const std::vector<
     CKXString favourite;
     if (HRESULT hr = FavouriteFolder(clsid, favourite); FAILED(hr))
         return hr;
-    for (const CKXString& folder : folders ? *folders : std::vector<CKXString>()) {
+    static const std::vector<CKXString> none;
+    for (const CKXString& folder : folders ? *folders : none) {
         CKXString resolved;
         if (CKXPathHelper::GetResolvedPath(folder + L"\\" + favourite + L"\\" + name, resolved) == S_OK) {
             file = resolved;
@@ -246,14 +246,6 @@ void Remember(REFGUID clsid, const CKXString& name, IGWPreset& preset) {
     ut::module::Presets()[clsid][name] = std::move(entry);
 }
 
-struct OutInterface {
-    void* pointer = nullptr;
-    ~OutInterface() {
-        if (pointer)
-            static_cast<IUnknown*>(pointer)->Release();
-    }
-};
-
 HRESULT CreateFromPreset(REFGUID clsid, const wchar_t* presetName, REFIID iid, void** object,
                          IGWPreset** preset, const std::vector<CKXString>* folders) {
     if (object)
@@ -286,18 +278,19 @@ HRESULT CreateFromPreset(REFGUID clsid, const wchar_t* presetName, REFIID iid, v
         return hr;
     if (!loaded)
         return E_UNEXPECTED;
-    OutInterface made;
+    // Held as IUnknown whatever `iid` it was asked for: released, if it is not handed out, as any.
+    ComPtr<IUnknown> made;
     if (object) {
         if (hr = manager->CreateObject(loaded.Get(), IsEqualGUID(iid, GUID_NULL) ? IID_IUnknown : iid,
-                                       &made.pointer);
+                                       made.PutVoid());
             FAILED(hr))
             return hr;
-        if (!made.pointer)
+        if (!made)
             return E_UNEXPECTED;
     }
     Remember(clsid, name, *loaded);
     if (object)
-        std::swap(*object, made.pointer);
+        *object = made.Detach();
     if (preset)
         *preset = loaded.Detach();
     return S_OK;
@@ -396,8 +389,8 @@ HRESULT TracePresetSearch(const GUID& clsid, const wchar_t* presetName, CKXStrin
 
 CKXString PresetFileName(const wchar_t* presetName) {
     CKXString full(presetName);
-    if (!full.Right(kExtensionLength).CaseLessEqual(kExtension))
-        full += kExtension;
+    if (!full.Right(static_cast<int>(kExtension.size())).CaseLessEqual(kExtension.data()))
+        full += kExtension.data();
     return full;
 }
 
