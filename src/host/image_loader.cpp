@@ -10,6 +10,7 @@
 #include <vector>
 
 #include <ut/platform/detail/boundary.h>
+#include <ut/platform/detail/little_endian.h>
 #include <ut/sdk/testing.h>
 
 #include "image_library.h"
@@ -17,23 +18,20 @@
 namespace ut::host {
 namespace {
 
-std::uint32_t Le(const std::vector<std::uint8_t>& bytes, std::size_t at, int size) {
-    std::uint32_t value = 0;
-    for (int i = size - 1; i >= 0; --i)
-        value = value << 8 | bytes[at + static_cast<std::size_t>(i)];
-    return value;
-}
+using ut::platform::ReadLittleEndian;
 
 // An uncompressed BMP of 8 (grey), 24 or 32 bits per pixel, rows turned top first.
 HRESULT DecodeBmp(const std::vector<std::uint8_t>& file, ULONG& width, ULONG& height, GUID& format,
                   std::vector<std::uint8_t>& pixels) {
     if (file.size() < 54 || file[0] != 'B' || file[1] != 'M')
         return E_INVALIDARG;
-    std::uint32_t offset = Le(file, 10, 4), header = Le(file, 14, 4), bits = Le(file, 28, 2);
-    auto rawWidth = static_cast<std::int32_t>(Le(file, 18, 4)),
-         rawHeight = static_cast<std::int32_t>(Le(file, 22, 4));
-    if (header < 40 || Le(file, 30, 4) != 0 || (bits != 8 && bits != 24 && bits != 32) || rawWidth <= 0 ||
-        rawHeight == 0 || rawWidth > 1 << 15 || rawHeight > 1 << 15 || rawHeight < -(1 << 15))
+    std::uint32_t offset = ReadLittleEndian(file, 10, 4), header = ReadLittleEndian(file, 14, 4),
+                  bits = ReadLittleEndian(file, 28, 2);
+    auto rawWidth = static_cast<std::int32_t>(ReadLittleEndian(file, 18, 4)),
+         rawHeight = static_cast<std::int32_t>(ReadLittleEndian(file, 22, 4));
+    if (header < 40 || ReadLittleEndian(file, 30, 4) != 0 || (bits != 8 && bits != 24 && bits != 32) ||
+        rawWidth <= 0 || rawHeight == 0 || rawWidth > 1 << 15 || rawHeight > 1 << 15 ||
+        rawHeight < -(1 << 15))
         return E_INVALIDARG;
     width = static_cast<ULONG>(rawWidth);
     height = static_cast<ULONG>(rawHeight < 0 ? -rawHeight : rawHeight);

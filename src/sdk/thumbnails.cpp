@@ -8,6 +8,7 @@
 #include <vector>
 
 #include <ut/platform/detail/boundary.h>
+#include <ut/platform/detail/little_endian.h>
 #include <ut/sdk/testing.h>
 
 #include "pixels.h"
@@ -15,6 +16,7 @@
 namespace {
 
 using ut::ComPtr;
+using ut::platform::ReadLittleEndian;
 using ut::sdk::ImageView;
 using ut::sdk::Rgba;
 using Bytes = std::vector<std::uint8_t>;
@@ -53,22 +55,15 @@ struct PropertyStream {
     std::vector<PropertySet> sets;
 };
 
-std::uint32_t Le(const Bytes& bytes, std::size_t at, int size = 4) {
-    std::uint32_t value = 0;
-    for (int i = size - 1; i >= 0; --i)
-        value = value << 8 | bytes[at + static_cast<std::size_t>(i)];
-    return value;
-}
-
 void Put(Bytes& out, std::uint32_t value, int size = 4) {
     for (int i = 0; i < size; ++i, value >>= 8)
         out.push_back(static_cast<std::uint8_t>(value & 0xFF));
 }
 
 GUID GuidAt(const Bytes& bytes, std::size_t at) {
-    GUID guid{Le(bytes, at),
-              static_cast<std::uint16_t>(Le(bytes, at + 4, 2)),
-              static_cast<std::uint16_t>(Le(bytes, at + 6, 2)),
+    GUID guid{ReadLittleEndian(bytes, at),
+              static_cast<std::uint16_t>(ReadLittleEndian(bytes, at + 4, 2)),
+              static_cast<std::uint16_t>(ReadLittleEndian(bytes, at + 6, 2)),
               {}};
     std::copy_n(bytes.begin() + static_cast<std::ptrdiff_t>(at + 8), 8, guid.Data4);
     return guid;
@@ -91,13 +86,14 @@ void PadToFour(Bytes& out) {
 bool DecodeSet(const Bytes& bytes, std::size_t at, PropertySet& set) {
     if (at > bytes.size() || bytes.size() - at < 8)
         return false;
-    std::uint32_t size = Le(bytes, at), count = Le(bytes, at + 4);
+    std::uint32_t size = ReadLittleEndian(bytes, at), count = ReadLittleEndian(bytes, at + 4);
     if (size < 8 || size > bytes.size() - at || count > (size - 8) / 8)
         return false;
     std::vector<std::pair<std::uint32_t, std::uint32_t>> entries; // (offset, identifier)
     std::set<std::uint32_t> ids;
     for (std::uint32_t i = 0; i < count; ++i) {
-        std::uint32_t id = Le(bytes, at + 8 + 8 * i), offset = Le(bytes, at + 12 + 8 * i);
+        std::uint32_t id = ReadLittleEndian(bytes, at + 8 + 8 * i),
+                      offset = ReadLittleEndian(bytes, at + 12 + 8 * i);
         if (offset < 8 + 8 * count || offset >= size || !ids.insert(id).second)
             return false;
         entries.emplace_back(offset, id);
@@ -116,19 +112,20 @@ bool DecodeSet(const Bytes& bytes, std::size_t at, PropertySet& set) {
 }
 
 bool DecodeStream(const Bytes& bytes, PropertyStream& stream) {
-    if (bytes.size() < kStreamHeaderSize || Le(bytes, 0, 2) != kByteOrderMark || Le(bytes, 2, 2) > 1)
+    if (bytes.size() < kStreamHeaderSize || ReadLittleEndian(bytes, 0, 2) != kByteOrderMark ||
+        ReadLittleEndian(bytes, 2, 2) > 1)
         return false;
-    stream.version = Le(bytes, 2, 2);
-    stream.system = Le(bytes, 4);
+    stream.version = ReadLittleEndian(bytes, 2, 2);
+    stream.system = ReadLittleEndian(bytes, 4);
     stream.clsid = GuidAt(bytes, 8);
-    std::uint32_t count = Le(bytes, 24);
+    std::uint32_t count = ReadLittleEndian(bytes, 24);
     if (count < 1 || count > kMaxSets || bytes.size() < kStreamHeaderSize + kSetEntrySize * count)
         return false;
     stream.sets.resize(count);
     for (std::uint32_t i = 0; i < count; ++i) {
         std::size_t entry = kStreamHeaderSize + kSetEntrySize * i;
         stream.sets[i].fmtid = GuidAt(bytes, entry);
-        std::uint32_t offset = Le(bytes, entry + 16);
+        std::uint32_t offset = ReadLittleEndian(bytes, entry + 16);
         if (offset < kStreamHeaderSize + kSetEntrySize * count || !DecodeSet(bytes, offset, stream.sets[i]))
             return false;
     }
@@ -200,13 +197,15 @@ Bytes EncodeDib(const ImageView& image) {
 HRESULT DecodeDib(const Bytes& dib, ComPtr<IGWImage>& image) {
     if (dib.size() < kInfoHeaderSize)
         return STG_E_INVALIDHEADER;
-    std::uint32_t headerSize = Le(dib, 0), bits = Le(dib, 14, 2), colours = Le(dib, 32);
-    auto width = static_cast<std::int32_t>(Le(dib, 4)), height = static_cast<std::int32_t>(Le(dib, 8));
-    if (headerSize < kInfoHeaderSize || headerSize > dib.size() || Le(dib, 12, 2) != 1 || width < 1 ||
-        width > kMaxThumbnailSide || height == 0 || height > kMaxThumbnailSide ||
+    std::uint32_t headerSize = ReadLittleEndian(dib, 0), bits = ReadLittleEndian(dib, 14, 2),
+                  colours = ReadLittleEndian(dib, 32);
+    auto width = static_cast<std::int32_t>(ReadLittleEndian(dib, 4)),
+         height = static_cast<std::int32_t>(ReadLittleEndian(dib, 8));
+    if (headerSize < kInfoHeaderSize || headerSize > dib.size() || ReadLittleEndian(dib, 12, 2) != 1 ||
+        width < 1 || width > kMaxThumbnailSide || height == 0 || height > kMaxThumbnailSide ||
         height < -kMaxThumbnailSide || colours > 256)
         return STG_E_INVALIDHEADER;
-    if ((bits != 24 && bits != 32) || Le(dib, 16) != 0)
+    if ((bits != 24 && bits != 32) || ReadLittleEndian(dib, 16) != 0)
         return E_NOTIMPL;
     auto rows = static_cast<ULONG>(height < 0 ? -height : height);
     std::size_t stride = (std::size_t{static_cast<ULONG>(width)} * bits / 8 + 3) / 4 * 4;
@@ -242,12 +241,12 @@ Bytes ThumbnailValue(const Bytes& dib) {
 HRESULT DecodeThumbnail(const Bytes& value, ComPtr<IGWImage>& image) {
     if (value.size() < 8)
         return STG_E_INVALIDHEADER;
-    if (Le(value, 0, 2) != kTypeClipboard)
+    if (ReadLittleEndian(value, 0, 2) != kTypeClipboard)
         return E_NOTIMPL;
-    std::uint32_t size = Le(value, 4);
+    std::uint32_t size = ReadLittleEndian(value, 4);
     if (size < 8 || size > value.size() - 8)
         return STG_E_INVALIDHEADER;
-    if (Le(value, 8) != kSystemClipboardTag || Le(value, 12) != kClipboardBitmap)
+    if (ReadLittleEndian(value, 8) != kSystemClipboardTag || ReadLittleEndian(value, 12) != kClipboardBitmap)
         return E_NOTIMPL;
     return DecodeDib(Bytes(value.begin() + 16, value.begin() + 8 + size), image);
 }
