@@ -1,10 +1,10 @@
 // The reference host's plug-in registry and its items.
 #include "application.h"
 
-#include <cwctype>
 #include <new>
 
 #include <ut/platform/detail/boundary.h>
+#include <ut/platform/strings.h>
 #include <ut/sdk/testing.h>
 
 #include "host_support.h"
@@ -34,11 +34,7 @@ private:
 };
 
 bool SameName(const std::wstring& a, const wchar_t* b) {
-    std::size_t i = 0;
-    for (; i < a.size() && b[i]; ++i)
-        if (std::towlower(a[i]) != std::towlower(b[i]))
-            return false;
-    return i == a.size() && !b[i];
+    return ut::platform::CompareWideNoCase(a.c_str(), b) == 0;
 }
 
 } // namespace

@@ -2,13 +2,13 @@
 // and command presets.
 #include "preset_manager.h"
 
-#include <cwctype>
 #include <string>
 
 #include <nlohmann/json.hpp>
 
 #include <ut/platform/detail/boundary.h>
 #include <ut/platform/stream.h>
+#include <ut/platform/strings.h>
 #include <ut/platform/text.h>
 #include <ut/sdk/detail/registry.h>
 #include <ut/sdk/families.h>
@@ -85,12 +85,7 @@ std::string FormatPreset(const PresetDescription& preset) {
 
 // Names of presets are compared as file names: letter case ignored.
 bool SameName(const std::wstring& a, const std::wstring& b) {
-    if (a.size() != b.size())
-        return false;
-    for (std::size_t i = 0; i < a.size(); ++i)
-        if (std::towlower(static_cast<wint_t>(a[i])) != std::towlower(static_cast<wint_t>(b[i])))
-            return false;
-    return true;
+    return ut::platform::CompareWideNoCase(a.c_str(), b.c_str()) == 0;
 }
 
 // The command preset `name` of `command`, ".Preset" optional; null when there is none.
