@@ -93,4 +93,6 @@ public:
 private:
     // The service the pool is advised with, or null.
     ut::ComPtr<IGWNotificationService> notifier_;
+    // The caller's part of each free list's first block, where the list is not empty.
+    void* headData_[kSizeClasses] = {};
 };

@@ -72,16 +72,20 @@ void Unlink(Descriptor*& head, Descriptor* descriptor) {
     Descriptor* prev = descriptor->Prev;
     Descriptor* next = descriptor->Next;
     *(prev ? &prev->Next : &head) = next;
-    *(next ? &next->Prev : &descriptor->Prev) = prev;
+    (next ? next : descriptor)->Prev = prev;
 }
 
-// Takes the first kept block off its free list for a request of its class.
-Descriptor* TakeFirst(Descriptor*& freeList, ULONG request) {
+// Takes the first kept block off its free list for a request of its class, and records where the
+// new first block's caller part is.
+Descriptor* TakeFirst(Descriptor*& freeList, void*& headData, ULONG request) {
     Descriptor* descriptor = freeList;
     Descriptor* next = descriptor->Next;
     freeList = next;
-    // The head's own Prev is already null.
-    *(next ? &next->Prev : &descriptor->Prev) = nullptr;
+    // Without a successor the list is now empty, and both go to the descriptor itself: its Prev
+    // is null already, and the recorded caller part is not read while the list is empty.
+    Descriptor* first = next ? next : descriptor;
+    first->Prev = nullptr;
+    headData = first->Data;
     descriptor->Size = request;
     return descriptor;
 }
@@ -141,6 +145,7 @@ CMemoryPool::CMemoryPool(const CMemoryPool& other)
     : IGwNotifySink(other), inUse_(other.inUse_), InUseBytes(other.InUseBytes), InUseCount(other.InUseCount),
       TotalFreeBytes(other.TotalFreeBytes), TotalFreeCount(other.TotalFreeCount),
       notifier_(ut::ComPtr<IGWNotificationService>::Adopt(other.notifier_.Get())) {
+    std::copy(std::begin(other.headData_), std::end(other.headData_), headData_);
     std::copy(std::begin(other.freeLists_), std::end(other.freeLists_), freeLists_);
     std::copy(std::begin(other.FreeBytes), std::end(other.FreeBytes), FreeBytes);
     std::copy(std::begin(other.FreeCounts), std::end(other.FreeCounts), FreeCounts);
@@ -152,16 +157,21 @@ CMemoryPool::~CMemoryPool() {
     Unregister();
 }
 
-void* CMemoryPool::Allocate(LONG size) {
+[[gnu::aligned(64)]] void* CMemoryPool::Allocate(LONG size) {
     // The pooled path (registered, and a block of the class is kept) makes no call at all. One
     // unsigned compare sends sizes of 0, negative ones and unpooled ones to the slow path.
     ULONG request = static_cast<ULONG>(size);
     if (request - 1 >= static_cast<ULONG>(kLargestPooled) || !notifier_) [[unlikely]]
         return AllocateSlowPath(size);
-    Descriptor*& freeList = freeLists_[SizeClass(request)];
+    ULONG sizeClass = SizeClass(request);
+    Descriptor*& freeList = freeLists_[sizeClass];
     if (!freeList) [[unlikely]]
         return AllocateSlowPath(size);
-    return HandOut(inUse_, TakeFirst(freeList, request));
+    // The answer is read from beside the heads, not from the descriptor: a block freed just
+    // before is handed out again without waiting for its descriptor to be found first.
+    void* data = headData_[sizeClass];
+    HandOut(inUse_, TakeFirst(freeList, headData_[sizeClass], request));
+    return data;
 }
 
 void* CMemoryPool::AllocateSlowPath(LONG size) {
@@ -171,7 +181,7 @@ void* CMemoryPool::AllocateSlowPath(LONG size) {
     ULONG request = Request(size);
     ULONG sizeClass = SizeClass(request);
     if (sizeClass < kSizeClasses && freeLists_[sizeClass])
-        return HandOut(inUse_, TakeFirst(freeLists_[sizeClass], request));
+        return HandOut(inUse_, TakeFirst(freeLists_[sizeClass], headData_[sizeClass], request));
     Descriptor* descriptor = NewBlock(request);
     return descriptor ? HandOut(inUse_, descriptor) : nullptr;
 }
@@ -199,7 +209,7 @@ void* CMemoryPool::Reallocate(void* p, LONG size) {
     return descriptor->Data;
 }
 
-void CMemoryPool::Deallocate(void* p) {
+[[gnu::aligned(64)]] void CMemoryPool::Deallocate(void* p) {
     if (!p)
         return;
     Descriptor* descriptor = DescriptorOf(p);
@@ -210,7 +220,9 @@ void CMemoryPool::Deallocate(void* p) {
     }
     // The class of the last size asked for, not of the capacity: a block grown in place to a
     // small size waits on that size's list.
-    PushFront(freeLists_[SizeClass(descriptor->Size)], descriptor);
+    ULONG sizeClass = SizeClass(descriptor->Size);
+    PushFront(freeLists_[sizeClass], descriptor);
+    headData_[sizeClass] = p;
     descriptor->Size = 0;
 }
 

@@ -1,6 +1,7 @@
 // Random allocate, reallocate and free steps against a plain model of the live blocks: blocks
-// keep their alignment, never overlap, keep their contents across reallocation, and are all
-// released when the pool goes (the sanitizers' and valgrind's leak checks see to that part).
+// keep their alignment, never overlap, keep their contents across reallocation, a request is
+// served by the block freed last into its class while one is kept, and all are released when the
+// pool goes (the sanitizers' and valgrind's leak checks see to that part).
 #include <algorithm>
 #include <cstdint>
 #include <map>
@@ -19,6 +20,7 @@ struct LiveBlock {
     unsigned char* data;
     LONG size;
     unsigned char seed;
+    LONG capacity;
 
     unsigned char Expected(LONG i) const { return static_cast<unsigned char>(seed + i * 31); }
     void Fill(LONG from) const {
@@ -40,9 +42,17 @@ public:
     int Percent() { return std::uniform_int_distribution<int>(0, 99)(random_); }
 
     void Allocate() {
-        LiveBlock block{nullptr, RandomSize(), static_cast<unsigned char>(random_())};
+        LiveBlock block{nullptr, RandomSize(), static_cast<unsigned char>(random_()), 0};
+        LONG request = std::max<LONG>(block.size, 16);
+        std::vector<LiveBlock>& kept = kept_[ClassOf(request)];
         block.data = static_cast<unsigned char*>(pool_.Allocate(block.size));
         ASSERT_NE(block.data, nullptr);
+        block.capacity = RoundUp(request);
+        if (request <= 4096 && !kept.empty()) {
+            EXPECT_EQ(block.data, kept.back().data) << "not the block freed last into its class";
+            block.capacity = kept.back().capacity;
+            kept.pop_back();
+        }
         Add(block);
     }
 
@@ -55,8 +65,10 @@ public:
         void* moved = pool_.Reallocate(block.data, newSize);
         if (newSize == 0) {
             EXPECT_EQ(moved, nullptr);
+            Keep(block);
             return;
         }
+        block.capacity = std::max(block.capacity, RoundUp(newSize));
         LONG kept = std::min(block.size, newSize);
         block.data = static_cast<unsigned char*>(moved);
         ASSERT_TRUE(block.Intact(kept)) << "contents lost resizing " << block.size << " to " << newSize;
@@ -64,7 +76,15 @@ public:
         Add(block, kept);
     }
 
-    void Free() { pool_.Deallocate(TakeRandom().data); }
+    void Free() {
+        LiveBlock block = TakeRandom();
+        pool_.Deallocate(block.data);
+        if (block.data)
+            Keep(block);
+    }
+
+    // A state change empties the free lists.
+    void ForgetKept() { kept_.clear(); }
 
     void CheckCount() {
         pool_.Diagnostics();
@@ -72,6 +92,17 @@ public:
     }
 
 private:
+    static LONG RoundUp(LONG size) { return (size + 15) / 16 * 16; }
+    static std::size_t ClassOf(LONG size) {
+        return static_cast<std::size_t>(std::max<LONG>(size, 1) - 1) / 16;
+    }
+
+    // A freed block waits on the list of the size last asked for, unless it grew past 4096.
+    void Keep(const LiveBlock& block) {
+        if (block.capacity <= 4096)
+            kept_[ClassOf(std::max<LONG>(block.size, 16))].push_back(block);
+    }
+
     // Mostly pooled sizes, some class edges and some large sizes.
     LONG RandomSize() {
         int pick = Percent();
@@ -112,6 +143,7 @@ private:
     CMemoryPool pool_;
     std::vector<LiveBlock> live_;
     std::map<std::uintptr_t, std::uintptr_t> byAddress_; // start -> end
+    std::map<std::size_t, std::vector<LiveBlock>> kept_; // class -> blocks freed into it, last at the back
 };
 
 // State changes go through the host as the application sends them; after a termination the
@@ -141,8 +173,10 @@ TEST(MemoryPoolModel, RandomStepsKeepBlocksApartAndIntact) {
                 model.Reallocate();
             else
                 model.Free();
-            if (step % 500 == 0)
+            if (step % 500 == 0) {
                 BroadcastStateChange(model.Percent() < 25 ? ut::sdk::kAppStateTerminate : 3);
+                model.ForgetKept();
+            }
             if (step % 250 == 0)
                 model.CheckCount();
         }
