@@ -157,6 +157,9 @@ CMemoryPool::~CMemoryPool() {
     Unregister();
 }
 
+// Allocate and Deallocate each start a cache line of their own. Where the linker happened to put
+// them, across line boundaries, fetching them held a pair back, and the early answer from
+// headData_ gained nothing (650 against 715 million operations a second).
 [[gnu::aligned(64)]] void* CMemoryPool::Allocate(LONG size) {
     // The pooled path (registered, and a block of the class is kept) makes no call at all. One
     // unsigned compare sends sizes of 0, negative ones and unpooled ones to the slow path.
