@@ -43,12 +43,12 @@ public:
 
     void Allocate() {
         LiveBlock block{nullptr, RandomSize(), static_cast<unsigned char>(random_()), 0};
-        LONG request = std::max<LONG>(block.size, 16);
+        LONG request = Request(block.size);
         std::vector<LiveBlock>& kept = kept_[ClassOf(request)];
         block.data = static_cast<unsigned char*>(pool_.Allocate(block.size));
         ASSERT_NE(block.data, nullptr);
         block.capacity = RoundUp(request);
-        if (request <= 4096 && !kept.empty()) {
+        if (request <= CMemoryPool::kLargestPooled && !kept.empty()) {
             EXPECT_EQ(block.data, kept.back().data) << "not the block freed last into its class";
             block.capacity = kept.back().capacity;
             kept.pop_back();
@@ -92,15 +92,17 @@ public:
     }
 
 private:
+    // A zero request is served as 16 bytes.
+    static LONG Request(LONG size) { return std::max<LONG>(size, 16); }
     static LONG RoundUp(LONG size) { return (size + 15) / 16 * 16; }
     static std::size_t ClassOf(LONG size) {
         return static_cast<std::size_t>(std::max<LONG>(size, 1) - 1) / 16;
     }
 
-    // A freed block waits on the list of the size last asked for, unless it grew past 4096.
+    // A freed block waits on the list of the size last asked for, unless it grew past the pooled sizes.
     void Keep(const LiveBlock& block) {
-        if (block.capacity <= 4096)
-            kept_[ClassOf(std::max<LONG>(block.size, 16))].push_back(block);
+        if (block.capacity <= CMemoryPool::kLargestPooled)
+            kept_[ClassOf(Request(block.size))].push_back(block);
     }
 
     // Mostly pooled sizes, some class edges and some large sizes.
