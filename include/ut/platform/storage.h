@@ -1,6 +1,6 @@
 // Structured storage on both homes: IStorage, ILockBytes and IEnumSTATSTG over compound files,
 // the format the system writes and standard tools read. On Windows these are the system's own;
-// on POSIX they are ours, over libgsf, and answer as the system does:
+// on POSIX they are ours (read through libgsf) and answer as the system does:
 // - a file that is not a compound file (too short, another signature) is refused with
 //   STG_E_FILEALREADYEXISTS, a damaged header with STG_E_INVALIDHEADER, damaged tables or a
 //   damaged directory with STG_E_DOCFILECORRUPT, a missing file with STG_E_FILENOTFOUND;
@@ -9,10 +9,11 @@
 //   are opened with STGM_SHARE_EXCLUSIVE and once at a time;
 // - destroying an open element, or reverting a transacted root, leaves its holders answering
 //   STG_E_REVERTED.
-// On POSIX a writable storage keeps its changes in memory and writes the whole file when the
-// root commits (and, unless transacted, when the root is released): into a temporary file
-// beside the original, flushed to the disk, then renamed over it, so that a crash leaves the
-// old file or the new one, never a mix. Storages inside the root are part of its transaction.
+// On POSIX a writable storage builds the next file in a temporary file beside the original: a
+// stream of 4096 bytes or more goes there as it is written (a few bytes at a time are gathered
+// in memory first), shorter ones stay in memory. The root's commit (and, unless transacted, its
+// release) adds the rest, flushes the file to the disk and renames it over the original, so
+// that a crash leaves the old file or the new one, never a mix. Storages inside the root are part of its transaction.
 // POSIX takes no share locks: a second open of the same file is not refused.
 #pragma once
 

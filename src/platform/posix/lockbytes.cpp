@@ -9,6 +9,7 @@
 #include <new>
 #include <sys/stat.h>
 #include <unistd.h>
+#include <utility>
 
 #include <ut/platform/detail/boundary.h>
 
@@ -36,9 +37,8 @@ void SyncFolderOf(const std::string& path) {
 
 class FileLockBytes final : public LockBytesBase, public FileBytes {
 public:
-    FileLockBytes(int fd, std::string path, std::wstring shownPath, DWORD mode, bool ownsDescriptor = true)
-        : fd_(fd), path_(std::move(path)), shownPath_(std::move(shownPath)), mode_(mode),
-          ownsDescriptor_(ownsDescriptor) {}
+    FileLockBytes(int fd, std::string path, std::wstring shownPath, DWORD mode)
+        : fd_(fd), path_(std::move(path)), shownPath_(std::move(shownPath)), mode_(mode) {}
 
     HRESULT STDMETHODCALLTYPE ReadAt(ULARGE_INTEGER offset, void* buffer, ULONG count, ULONG* read) override {
         if (HRESULT hr = BeginTransfer(buffer, count, read); FAILED(hr))
@@ -85,10 +85,45 @@ public:
                               mode_);
     }
 
-    HRESULT ReplaceContent(const ContentWriter& write, bool durable) override {
+    HRESULT BeginReplacement(int& fd) override {
         if (!CanWrite(mode_))
             return STG_E_ACCESSDENIED;
-        return ut::ExportBoundary([&] { return Replace(write, durable); });
+        if (replacement_ < 0) {
+            std::string temporary = path_ + ".XXXXXX";
+            int created = ::mkostemp(temporary.data(), O_CLOEXEC);
+            if (created < 0)
+                return StorageError(errno, STG_E_WRITEFAULT);
+            replacement_ = created;
+            replacementPath_ = std::move(temporary);
+        }
+        fd = replacement_;
+        return S_OK;
+    }
+
+    HRESULT FinishReplacement(bool durable) override {
+        if (replacement_ < 0)
+            return E_UNEXPECTED;
+        struct stat info {};
+        if (::fstat(fd_, &info) == 0)
+            (void)::fchmod(replacement_, info.st_mode & 07777); // the owner's default is only less open
+        if (durable && ::fdatasync(replacement_) != 0)
+            return StorageError(errno, STG_E_WRITEFAULT);
+        if (::rename(replacementPath_.c_str(), path_.c_str()) != 0)
+            return StorageError(errno, STG_E_WRITEFAULT);
+        if (durable)
+            SyncFolderOf(path_);
+        ::close(fd_);
+        fd_ = std::exchange(replacement_, -1);
+        replacementPath_.clear();
+        return S_OK;
+    }
+
+    void AbandonReplacement() override {
+        if (replacement_ < 0)
+            return;
+        (void)::unlink(replacementPath_.c_str()); // the old file stays as it was
+        ::close(std::exchange(replacement_, -1));
+        replacementPath_.clear();
     }
 
     const std::wstring& Path() const override { return shownPath_; }
@@ -97,62 +132,20 @@ public:
 
 private:
     ~FileLockBytes() override {
-        if (ownsDescriptor_)
-            ::close(fd_);
+        AbandonReplacement();
+        ::close(fd_);
         if (deleteOnRelease_)
             (void)::unlink(path_.c_str()); // nothing to report to at the last release
-    }
-
-    HRESULT Replace(const ContentWriter& write, bool durable) {
-        std::string temporary = path_ + ".XXXXXX";
-        int fd = ::mkostemp(temporary.data(), O_CLOEXEC);
-        if (fd < 0)
-            return StorageError(errno, STG_E_WRITEFAULT);
-        HRESULT hr = WriteAndSync(fd, write, durable);
-        if (SUCCEEDED(hr) && ::rename(temporary.c_str(), path_.c_str()) != 0)
-            hr = StorageError(errno, STG_E_WRITEFAULT);
-        if (FAILED(hr)) {
-            (void)::unlink(temporary.c_str()); // the old file stays as it was
-            ::close(fd);
-            return hr;
-        }
-        if (durable)
-            SyncFolderOf(path_);
-        ::close(fd_);
-        fd_ = fd;
-        return S_OK;
-    }
-
-    // Writes the content through a stdio stream on a duplicate of `fd`, gives it the file's
-    // permissions and, when asked, flushes it to the disk.
-    HRESULT WriteAndSync(int fd, const ContentWriter& write, bool durable) {
-        int duplicate = ::dup(fd);
-        std::FILE* file = duplicate >= 0 ? ::fdopen(duplicate, "w+b") : nullptr;
-        if (!file) {
-            if (duplicate >= 0)
-                ::close(duplicate);
-            return STG_E_INSUFFICIENTMEMORY;
-        }
-        HRESULT hr = write(file);
-        if (std::fflush(file) != 0 && SUCCEEDED(hr))
-            hr = StorageError(errno, STG_E_WRITEFAULT);
-        std::fclose(file);
-        if (FAILED(hr))
-            return hr;
-        struct stat info {};
-        if (::fstat(fd_, &info) == 0)
-            (void)::fchmod(fd, info.st_mode & 07777); // the owner's default is only less open
-        if (durable && ::fdatasync(fd) != 0)
-            return StorageError(errno, STG_E_WRITEFAULT);
-        return S_OK;
     }
 
     int fd_;
     std::string path_;
     std::wstring shownPath_;
     DWORD mode_;
-    bool ownsDescriptor_;
     bool deleteOnRelease_ = false;
+    // The temporary file beside that is to replace the file, while there is one.
+    int replacement_ = -1;
+    std::string replacementPath_;
 };
 
 // A byte array over a global memory block: the block's size is the array's size, and the
@@ -262,14 +255,14 @@ HRESULT OpenFileBytes(const std::string& path, DWORD mode, Disposition dispositi
     });
 }
 
-HRESULT WrapDescriptor(int fd, ILockBytes** bytes) {
-    *bytes = new (std::nothrow) FileLockBytes(fd, std::string(), std::wstring(), STGM_READWRITE, false);
-    return *bytes ? S_OK : E_OUTOFMEMORY;
-}
-
-HRESULT CreateScratchFile(std::FILE** file) {
-    *file = std::tmpfile();
-    return *file ? S_OK : StorageError(errno, STG_E_WRITEFAULT);
+HRESULT CreateScratchFile(int& fd) {
+    std::error_code error;
+    std::string pattern = (std::filesystem::temp_directory_path(error) / "ut-scratch-XXXXXX").string();
+    fd = ::mkostemp(pattern.data(), O_CLOEXEC);
+    if (fd < 0)
+        return StorageError(errno, STG_E_WRITEFAULT);
+    (void)::unlink(pattern.c_str()); // nameless from now on, it goes when closed
+    return S_OK;
 }
 
 } // namespace ut::platform::posix

@@ -2,25 +2,23 @@
 // atomically, and one over a global memory block.
 #pragma once
 
-#include <cstdio>
-#include <functional>
 #include <string>
 
 #include <ut/platform/storage.h>
 
 namespace ut::platform::posix {
 
-// Writes a whole new content into `file`, positioned at its start.
-using ContentWriter = std::function<HRESULT(std::FILE* file)>;
-
 // What a byte array over a file offers beyond ILockBytes.
 class FileBytes {
 public:
-    // Writes a new content into a temporary file beside the file and renames it over the file,
-    // so that a crash at any moment leaves the old content or the new one; `durable` flushes
-    // both to the disk first, so that a power loss does too. The byte array then reads the new
-    // file.
-    virtual HRESULT ReplaceContent(const ContentWriter& write, bool durable) = 0;
+    // A new content is written into a temporary file beside the file, whose descriptor (kept
+    // by the byte array) BeginReplacement gives, then renamed over the file by
+    // FinishReplacement, so that a crash at any moment leaves the old content or the new one;
+    // `durable` flushes both to the disk first, so that a power loss does too. The byte array
+    // then reads the new file. AbandonReplacement removes the temporary file.
+    virtual HRESULT BeginReplacement(int& fd) = 0;
+    virtual HRESULT FinishReplacement(bool durable) = 0;
+    virtual void AbandonReplacement() = 0;
     // The file's absolute path.
     virtual const std::wstring& Path() const = 0;
 
@@ -39,10 +37,7 @@ enum class Disposition { Existing, OpenOrCreate, CreateNew, Truncate };
 // access and STGM_DELETEONRELEASE.
 HRESULT OpenFileBytes(const std::string& path, DWORD mode, Disposition disposition, ILockBytes** bytes);
 
-// A byte array over an open descriptor that it neither owns nor closes.
-HRESULT WrapDescriptor(int fd, ILockBytes** bytes);
-
 // A new temporary file in the temporary folder, created with mkstemp; it goes when closed.
-HRESULT CreateScratchFile(std::FILE** file);
+HRESULT CreateScratchFile(int& fd);
 
 } // namespace ut::platform::posix

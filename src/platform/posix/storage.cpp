@@ -72,30 +72,6 @@ HRESULT FillElementStat(const Node& node, const std::wstring& name, DWORD mode, 
     return hr;
 }
 
-// Reads a stream node's bytes in order, from memory or from the file, handing them to `sink`.
-template <class Sink>
-HRESULT ReadContent(Document& document, Node& stream, Sink&& sink) {
-    if (stream.bytes)
-        return stream.bytes->empty() ? S_OK : sink(stream.bytes->data(), stream.bytes->size());
-    if (stream.size == 0)
-        return S_OK;
-    if (HRESULT hr = document.CheckSource(stream); FAILED(hr))
-        return hr;
-    GsfOwner<GsfInput> source = document.OpenSource(stream);
-    if (!source)
-        return STG_E_DOCFILECORRUPT;
-    std::vector<std::uint8_t> chunk(std::min<ULONGLONG>(stream.size, 1 << 20));
-    for (ULONGLONG at = 0; at < stream.size;) {
-        std::size_t count = std::min<ULONGLONG>(chunk.size(), stream.size - at);
-        if (HRESULT hr = GsfReadAt(source.get(), at, chunk.data(), count); FAILED(hr))
-            return hr;
-        if (HRESULT hr = sink(chunk.data(), count); FAILED(hr))
-            return hr;
-        at += count;
-    }
-    return S_OK;
-}
-
 bool Excluded(const std::wstring& name, SNB exclude) {
     for (; exclude && *exclude; ++exclude)
         if (NameEqual(name, *exclude))
@@ -130,9 +106,9 @@ public:
         if (position_ >= node_->size || count == 0)
             return S_OK;
         ULONG wanted = static_cast<ULONG>(std::min<ULONGLONG>(count, node_->size - position_));
-        if (node_->bytes)
-            std::memcpy(buffer, node_->bytes->data() + position_, wanted);
-        else if (HRESULT hr = ReadFromFile(buffer, wanted); FAILED(hr))
+        if (HRESULT hr = node_->Changed() ? document_->ReadChanged(*node_, position_, buffer, wanted)
+                                          : ReadFromFile(buffer, wanted);
+            FAILED(hr))
             return hr;
         position_ += wanted;
         if (read)
@@ -155,14 +131,11 @@ public:
             return STG_E_MEDIUMFULL;
         if (HRESULT hr = document_->Materialize(*node_); FAILED(hr))
             return hr;
-        HRESULT hr = ut::ExportBoundary(
-            [&] {
-                Put(static_cast<const std::uint8_t*>(buffer), count);
-                return S_OK;
-            },
-            HRESULT{STG_E_INSUFFICIENTMEMORY});
-        if (FAILED(hr))
+        if (HRESULT hr =
+                document_->WriteChanged(*node_, position_, static_cast<const std::uint8_t*>(buffer), count);
+            FAILED(hr))
             return hr;
+        position_ += count;
         if (written)
             *written = count;
         return S_OK;
@@ -212,39 +185,17 @@ public:
     }
 
 private:
-    ~StorageStream() override { --node_->holders; }
+    ~StorageStream() override {
+        if (--node_->holders == 0)
+            document_->Settle(*node_);
+    }
 
     HRESULT Usable() const { return document_->Closed() || node_->gone ? STG_E_REVERTED : S_OK; }
-
-    // Writes over what is at the position and appends the rest, with zeros for a gap before it:
-    // appended bytes are copied once, never cleared first.
-    void Put(const std::uint8_t* data, ULONG count) {
-        std::vector<std::uint8_t>& bytes = *node_->bytes;
-        if (position_ > bytes.size())
-            bytes.resize(position_);
-        std::size_t over = std::min<std::size_t>(count, bytes.size() - position_);
-        if (over)
-            std::memcpy(bytes.data() + position_, data, over);
-        bytes.insert(bytes.end(), data + over, data + count);
-        node_->size = bytes.size();
-        position_ += count;
-        document_->Touch();
-    }
 
     HRESULT Resize(ULONGLONG size) {
         if (HRESULT hr = document_->Materialize(*node_); FAILED(hr))
             return hr;
-        HRESULT hr = ut::ExportBoundary(
-            [&] {
-                node_->bytes->resize(size);
-                return S_OK;
-            },
-            HRESULT{STG_E_INSUFFICIENTMEMORY});
-        if (SUCCEEDED(hr)) {
-            node_->size = size;
-            document_->Touch();
-        }
-        return hr;
+        return document_->ResizeChanged(*node_, size);
     }
 
     // Reads from the stream's bytes in the file, through an input kept while the file stays.
@@ -599,7 +550,7 @@ private:
             ComPtr<IStream> copy;
             if (HRESULT hr = target->CreateStream(name, kWriting | STGM_CREATE, 0, 0, copy.Put()); FAILED(hr))
                 return hr;
-            return ReadContent(*document_, element, [&](const std::uint8_t* data, std::size_t count) {
+            return document_->ReadAll(element, [&](const std::uint8_t* data, std::size_t count) {
                 return copy->Write(data, static_cast<ULONG>(count), nullptr);
             });
         }

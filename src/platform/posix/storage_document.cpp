@@ -1,12 +1,10 @@
-// The POSIX compound-file document: reading the tree, writing it back through libgsf, and
-// giving the written directory balanced trees and the attributes libgsf does not write.
+// The POSIX compound-file document: reading the tree through libgsf, keeping the changed
+// streams' bytes, and committing the tree as a new file that replaces the old one at once.
 #include "posix/storage_document.h"
 
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
-#include <gsf/gsf-outfile-msole.h>
-#include <gsf/gsf-output-stdio.h>
 #include <unistd.h>
 
 #include <ut/platform/detail/boundary.h>
@@ -19,97 +17,6 @@ namespace ut::platform::posix {
 namespace {
 
 constexpr std::size_t kCopyChunk = 1 << 20;
-
-HRESULT WriteFailure() {
-    return errno == ENOSPC || errno == EFBIG ? STG_E_MEDIUMFULL : STG_E_WRITEFAULT;
-}
-
-void PutLe32(std::uint8_t* p, std::uint32_t value) {
-    for (int i = 0; i < 4; ++i)
-        p[i] = static_cast<std::uint8_t>(value >> (8 * i));
-}
-
-// The fields of a directory entry that the document writes itself.
-struct EntryPatch {
-    std::uint32_t left = kNoEntry;
-    std::uint32_t right = kNoEntry;
-    std::uint32_t child = kNoEntry;
-    bool red = false;
-    const Node* node = nullptr;
-};
-
-void ApplyPatch(const EntryPatch& patch, std::uint8_t* raw) {
-    raw[67] = patch.red ? 0 : 1;
-    PutLe32(raw + 68, patch.left);
-    PutLe32(raw + 72, patch.right);
-    PutLe32(raw + 76, patch.child);
-    std::memcpy(raw + 80, &patch.node->clsid, sizeof(CLSID));
-    PutLe32(raw + 96, patch.node->stateBits);
-    PutLe32(raw + 100, patch.node->created.dwLowDateTime);
-    PutLe32(raw + 104, patch.node->created.dwHighDateTime);
-    PutLe32(raw + 108, patch.node->modified.dwLowDateTime);
-    PutLe32(raw + 112, patch.node->modified.dwHighDateTime);
-}
-
-// Links the sorted `entries[first, last)` as a balanced red-black tree and returns its root.
-// Splitting at the middle leaves every path to a leaf within one level of the others, so the
-// tree is valid with the nodes of an incomplete last level red and all others black.
-std::uint32_t Balance(const std::vector<std::uint32_t>& entries, std::size_t first, std::size_t last,
-                      std::size_t level, std::size_t redLevel, std::vector<EntryPatch>& patches) {
-    if (first >= last)
-        return kNoEntry;
-    std::size_t middle = first + (last - first) / 2;
-    EntryPatch& patch = patches[entries[middle]];
-    patch.red = level == redLevel;
-    patch.left = Balance(entries, first, middle, level + 1, redLevel, patches);
-    patch.right = Balance(entries, middle + 1, last, level + 1, redLevel, patches);
-    return entries[middle];
-}
-
-std::uint32_t BalancedTree(const std::vector<std::uint32_t>& entries, std::vector<EntryPatch>& patches) {
-    std::size_t levels = 0;
-    while ((std::size_t{1} << levels) - 1 < entries.size())
-        ++levels;
-    bool complete = entries.size() == (std::size_t{1} << levels) - 1;
-    std::size_t redLevel = complete ? levels : levels - 1;
-    return Balance(entries, 0, entries.size(), 0, redLevel, patches);
-}
-
-// Collects the patches of a storage's elements, matching the written entries to the nodes.
-HRESULT PlanStorage(const CompoundFile& layout, std::uint32_t entry, const Node& storage,
-                    std::vector<EntryPatch>& patches) {
-    patches[entry].node = &storage;
-    const std::vector<std::uint32_t>& elements = layout.Children(entry);
-    patches[entry].child = BalancedTree(elements, patches);
-    for (std::uint32_t element : elements) {
-        std::shared_ptr<Node> node = storage.Find(layout.Entry(element).key);
-        if (!node)
-            return STG_E_DOCFILECORRUPT;
-        if (!node->IsStorage()) {
-            patches[element].node = node.get();
-            continue;
-        }
-        if (HRESULT hr = PlanStorage(layout, element, *node, patches); FAILED(hr))
-            return hr;
-    }
-    return S_OK;
-}
-
-// Reads or writes all of `count` bytes; a short read means the written file lost its end.
-HRESULT ReadFull(int fd, ULONGLONG offset, std::uint8_t* buffer, std::size_t count) {
-    std::size_t done = 0;
-    HRESULT hr = PreadFully(fd, offset, buffer, count, done);
-    return FAILED(hr) || done == count ? hr : STG_E_READFAULT;
-}
-
-HRESULT WriteFull(int fd, ULONGLONG offset, const std::uint8_t* buffer, std::size_t count) {
-    std::size_t done = 0;
-    return PwriteFully(fd, offset, buffer, count, done);
-}
-
-} // namespace
-
-namespace {
 
 auto Place(const std::vector<std::shared_ptr<Node>>& children, const NameKey& key) {
     return std::lower_bound(
@@ -227,6 +134,7 @@ void Document::Rebase(Node& node) {
     node.inFile = true;
     node.reader.reset();
     if (!node.IsStorage()) {
+        node.chain.reset(); // its sectors are the file's now
         if (node.holders == 0)
             node.bytes.reset();
         return;
@@ -264,6 +172,7 @@ void Document::Exclude(Node& storage, SNB names) {
             MarkGone(*child);
         node->children.clear();
         node->bytes = std::make_unique<std::vector<std::uint8_t>>();
+        node->chain.reset();
         node->size = 0;
         dirty_ = true;
     }
@@ -295,22 +204,160 @@ GsfOwner<GsfInput> Document::OpenSource(Node& stream) {
 }
 
 HRESULT Document::Materialize(Node& stream) {
-    if (stream.bytes)
+    if (stream.Changed())
         return S_OK;
     return ut::ExportBoundary([&] {
-        auto bytes = std::make_unique<std::vector<std::uint8_t>>(stream.size);
-        if (stream.size > 0) {
-            if (HRESULT hr = CheckSource(stream); FAILED(hr))
+        if (stream.size < kMiniStreamCutoff) {
+            auto bytes = std::make_unique<std::vector<std::uint8_t>>();
+            bytes->reserve(stream.size);
+            if (HRESULT hr = ReadAll(stream,
+                                     [&](const std::uint8_t* data, std::size_t count) {
+                                         bytes->insert(bytes->end(), data, data + count);
+                                         return S_OK;
+                                     });
+                FAILED(hr))
                 return hr;
-            GsfOwner<GsfInput> source = OpenSource(stream);
-            if (!source)
-                return STG_E_DOCFILECORRUPT;
-            if (HRESULT hr = GsfReadAt(source.get(), 0, bytes->data(), bytes->size()); FAILED(hr))
-                return hr;
+            stream.bytes = std::move(bytes);
+            return S_OK;
         }
-        stream.bytes = std::move(bytes);
+        std::shared_ptr<SectorFile> image;
+        if (HRESULT hr = Image(image); FAILED(hr))
+            return hr;
+        auto chain = std::make_unique<SectorChain>(image);
+        if (HRESULT hr =
+                ReadAll(stream, [&](const std::uint8_t* data,
+                                    std::size_t count) { return chain->Write(chain->Size(), data, count); });
+            FAILED(hr))
+            return hr;
+        stream.chain = std::move(chain);
         return S_OK;
     });
+}
+
+HRESULT Document::ReadAll(Node& stream, const ByteSink& sink) {
+    if (stream.bytes)
+        return stream.bytes->empty() ? S_OK : sink(stream.bytes->data(), stream.bytes->size());
+    if (stream.size == 0)
+        return S_OK;
+    GsfOwner<GsfInput> source;
+    if (!stream.chain) {
+        if (HRESULT hr = CheckSource(stream); FAILED(hr))
+            return hr;
+        source = OpenSource(stream);
+        if (!source)
+            return STG_E_DOCFILECORRUPT;
+    }
+    std::vector<std::uint8_t> chunk(std::min<ULONGLONG>(stream.size, kCopyChunk));
+    for (ULONGLONG at = 0; at < stream.size;) {
+        std::size_t count = std::min<ULONGLONG>(chunk.size(), stream.size - at);
+        HRESULT hr = source ? GsfReadAt(source.get(), at, chunk.data(), count)
+                            : stream.chain->Read(at, chunk.data(), count);
+        if (FAILED(hr) || FAILED(hr = sink(chunk.data(), count)))
+            return hr;
+        at += count;
+    }
+    return S_OK;
+}
+
+HRESULT Document::ReadChanged(Node& stream, ULONGLONG at, void* buffer, std::size_t count) {
+    if (stream.chain)
+        return stream.chain->Read(at, buffer, count);
+    std::memcpy(buffer, stream.bytes->data() + at, count);
+    return S_OK;
+}
+
+// Writes over what is at `at` and appends the rest, with zeros for a gap before it: appended
+// bytes are copied once, never cleared first.
+HRESULT Document::WriteChanged(Node& stream, ULONGLONG at, const std::uint8_t* data, std::size_t count) {
+    return ut::ExportBoundary(
+        [&] {
+            if (!stream.chain && at + count >= kMiniStreamCutoff)
+                if (HRESULT hr = Spill(stream); FAILED(hr))
+                    return hr;
+            dirty_ = true;
+            if (stream.chain) {
+                HRESULT hr = stream.chain->Write(at, data, count);
+                stream.size = stream.chain->Size();
+                return hr;
+            }
+            std::vector<std::uint8_t>& bytes = *stream.bytes;
+            if (at > bytes.size())
+                bytes.resize(at);
+            std::size_t over = std::min<std::size_t>(count, bytes.size() - at);
+            if (over)
+                std::memcpy(bytes.data() + at, data, over);
+            bytes.insert(bytes.end(), data + over, data + count);
+            stream.size = bytes.size();
+            return S_OK;
+        },
+        HRESULT{STG_E_INSUFFICIENTMEMORY});
+}
+
+HRESULT Document::ResizeChanged(Node& stream, ULONGLONG size) {
+    return ut::ExportBoundary(
+        [&] {
+            if (!stream.chain && size >= kMiniStreamCutoff)
+                if (HRESULT hr = Spill(stream); FAILED(hr))
+                    return hr;
+            dirty_ = true;
+            if (stream.chain) {
+                HRESULT hr = stream.chain->Resize(size);
+                stream.size = stream.chain->Size();
+                return hr;
+            }
+            stream.bytes->resize(size);
+            stream.size = size;
+            return S_OK;
+        },
+        HRESULT{STG_E_INSUFFICIENTMEMORY});
+}
+
+void Document::Settle(Node& stream) {
+    if (stream.chain)
+        (void)stream.chain->Flush(); // what fails to go now stays gathered, and the commit tells
+}
+
+// A stream grown to the mini-stream cutoff moves its bytes to the sectors of the next file.
+HRESULT Document::Spill(Node& stream) {
+    std::shared_ptr<SectorFile> image;
+    if (HRESULT hr = Image(image); FAILED(hr))
+        return hr;
+    auto chain = std::make_unique<SectorChain>(image);
+    if (stream.bytes && !stream.bytes->empty())
+        if (HRESULT hr = chain->Write(0, stream.bytes->data(), stream.bytes->size()); FAILED(hr))
+            return hr;
+    stream.chain = std::move(chain);
+    stream.bytes.reset();
+    return S_OK;
+}
+
+// Beside the document's file when it is one, so that the commit renames it into place;
+// elsewhere a nameless temporary file that the commit copies into the byte array.
+HRESULT Document::Image(std::shared_ptr<SectorFile>& image) {
+    if (!image_) {
+        FileBytes* file = FileBehind(bytes_.Get());
+        int fd = -1;
+        if (HRESULT hr = file ? file->BeginReplacement(fd) : CreateScratchFile(fd); FAILED(hr))
+            return hr;
+        try {
+            image_ = std::make_shared<SectorFile>(fd, file == nullptr);
+        } catch (...) {
+            if (!file)
+                ::close(fd);
+            throw;
+        }
+    }
+    image = image_;
+    return S_OK;
+}
+
+void Document::DropImage() {
+    if (!image_)
+        return;
+    image_->Retire();
+    image_.reset();
+    if (FileBytes* file = FileBehind(bytes_.Get()))
+        file->AbandonReplacement();
 }
 
 HRESULT Document::Commit(bool durable) {
@@ -319,12 +366,22 @@ HRESULT Document::Commit(bool durable) {
     if (!Writable())
         return STG_E_ACCESSDENIED;
     return ut::ExportBoundary([&] {
-        FileBytes* file = FileBehind(bytes_.Get());
-        HRESULT hr =
-            file ? file->ReplaceContent([this](std::FILE* target) { return WriteImage(target); }, durable)
-                 : WriteThroughScratch(durable);
-        if (FAILED(hr))
+        std::shared_ptr<SectorFile> image;
+        if (HRESULT hr = Image(image); FAILED(hr))
             return hr;
+        std::uint32_t mark = image->Count();
+        HRESULT hr = WriteCompoundFile(
+            *image, *root_, [this](Node& stream, const ByteSink& sink) { return ReadAll(stream, sink); });
+        if (SUCCEEDED(hr)) {
+            FileBytes* file = FileBehind(bytes_.Get());
+            hr = file ? file->FinishReplacement(durable) : CopyImageToBytes(*image, durable);
+        }
+        if (FAILED(hr)) {
+            image->Truncate(mark); // the streams' sectors stay for the next try
+            return hr;
+        }
+        image_->Retire();
+        image_.reset();
         Rebase(*root_);
         reader_.reset();
         layout_.reset();
@@ -345,6 +402,7 @@ HRESULT Document::Revert() {
         for (std::shared_ptr<Node>& child : root_->children)
             MarkGone(*child);
         root_->children.clear();
+        DropImage();
         Adopt(*root_, 0);
         BuildChildren(*root_);
         dirty_ = false;
@@ -362,24 +420,18 @@ void Document::Close() {
     closed_ = true;
     MarkGone(*root_);
     root_->children.clear();
+    DropImage();
     reader_.reset();
     layout_.reset();
     bytes_.Reset();
 }
 
-HRESULT Document::WriteThroughScratch(bool durable) {
-    std::FILE* scratch = nullptr;
-    if (HRESULT hr = CreateScratchFile(&scratch); FAILED(hr))
-        return hr;
-    std::unique_ptr<std::FILE, int (*)(std::FILE*)> owner(scratch, std::fclose);
-    if (HRESULT hr = WriteImage(scratch); FAILED(hr))
-        return hr;
-    int fd = ::fileno(scratch);
-    off_t size = ::lseek(fd, 0, SEEK_END);
-    std::vector<std::uint8_t> chunk(kCopyChunk);
-    for (ULONGLONG at = 0; at < static_cast<ULONGLONG>(size);) {
-        std::size_t count = std::min<ULONGLONG>(chunk.size(), static_cast<ULONGLONG>(size) - at);
-        if (HRESULT hr = ReadFull(fd, at, chunk.data(), count); FAILED(hr))
+HRESULT Document::CopyImageToBytes(const SectorFile& image, bool durable) {
+    ULONGLONG size = SectorFile::Offset(image.Count());
+    std::vector<std::uint8_t> chunk(std::min<ULONGLONG>(kCopyChunk, size));
+    for (ULONGLONG at = 0; at < size;) {
+        std::size_t count = std::min<ULONGLONG>(chunk.size(), size - at);
+        if (HRESULT hr = image.Read(at, chunk.data(), count); FAILED(hr))
             return hr;
         ULARGE_INTEGER offset{};
         offset.QuadPart = at;
@@ -390,99 +442,10 @@ HRESULT Document::WriteThroughScratch(bool durable) {
         at += count;
     }
     ULARGE_INTEGER total{};
-    total.QuadPart = static_cast<ULONGLONG>(size);
+    total.QuadPart = size;
     if (HRESULT hr = bytes_->SetSize(total); FAILED(hr))
         return hr;
     return durable ? bytes_->Flush() : S_OK;
-}
-
-HRESULT Document::WriteImage(std::FILE* file) {
-    GsfOwner<GsfOutput> sink(gsf_output_stdio_new_FILE("", file, TRUE));
-    GsfOwner<GsfOutfile> root(sink ? gsf_outfile_msole_new(sink.get()) : nullptr);
-    if (!root)
-        return E_OUTOFMEMORY;
-    HRESULT hr = WriteElements(*root_, root.get());
-    bool closed = gsf_output_close(GSF_OUTPUT(root.get()));
-    root.reset();
-    // Closing the compound file closes its sink as well, where libgsf does so.
-    closed = (gsf_output_is_closed(sink.get()) || gsf_output_close(sink.get())) && closed;
-    sink.reset();
-    if (SUCCEEDED(hr) && (!closed || std::fflush(file) != 0))
-        hr = WriteFailure();
-    return SUCCEEDED(hr) ? PatchDirectory(::fileno(file)) : hr;
-}
-
-HRESULT Document::WriteElements(Node& storage, GsfOutfile* target) {
-    for (std::shared_ptr<Node>& element : storage.children) {
-        std::string name = Utf8FromWide(element->name);
-        GsfOwner<GsfOutput> child(gsf_outfile_new_child(target, name.c_str(), element->IsStorage()));
-        if (!child)
-            return STG_E_WRITEFAULT;
-        HRESULT hr = element->IsStorage() ? WriteElements(*element, GSF_OUTFILE(child.get()))
-                                          : WriteStream(*element, child.get());
-        if (!gsf_output_close(child.get()) && SUCCEEDED(hr))
-            hr = WriteFailure();
-        if (FAILED(hr))
-            return hr;
-    }
-    return S_OK;
-}
-
-HRESULT Document::WriteStream(Node& stream, GsfOutput* target) {
-    if (stream.size == 0)
-        return S_OK;
-    if (stream.bytes)
-        return gsf_output_write(target, stream.bytes->size(), stream.bytes->data()) ? S_OK : WriteFailure();
-    if (HRESULT hr = CheckSource(stream); FAILED(hr))
-        return hr;
-    GsfOwner<GsfInput> source = OpenSource(stream);
-    if (!source)
-        return STG_E_DOCFILECORRUPT;
-    std::vector<std::uint8_t> chunk(std::min<ULONGLONG>(kCopyChunk, stream.size));
-    for (ULONGLONG at = 0; at < stream.size;) {
-        std::size_t count = std::min<ULONGLONG>(chunk.size(), stream.size - at);
-        if (HRESULT hr = GsfReadAt(source.get(), at, chunk.data(), count); FAILED(hr))
-            return hr;
-        if (!gsf_output_write(target, count, chunk.data()))
-            return WriteFailure();
-        at += count;
-    }
-    return S_OK;
-}
-
-// libgsf links each storage's elements as one long list and writes neither state bits nor
-// times: relink them as balanced trees and write what the nodes hold, sector by sector.
-HRESULT Document::PatchDirectory(int fd) {
-    ComPtr<ILockBytes> written;
-    if (HRESULT hr = WrapDescriptor(fd, written.Put()); FAILED(hr))
-        return hr;
-    std::unique_ptr<CompoundFile> layout;
-    if (HRESULT hr = CompoundFile::Open(written.Get(), 0xFFFFFFFF, layout); FAILED(hr))
-        return hr;
-    std::vector<EntryPatch> patches(layout->EntryCount());
-    if (HRESULT hr = PlanStorage(*layout, 0, *root_, patches); FAILED(hr))
-        return hr;
-    // Sectors that follow each other in the file are read, patched and written as one run.
-    std::uint32_t perSector = layout->SectorSize() / kDirectoryEntrySize;
-    std::vector<std::uint8_t> run;
-    for (std::uint32_t first = 0; first < layout->EntryCount();) {
-        ULONGLONG offset = layout->EntryOffset(first);
-        std::uint32_t last = first + perSector;
-        while (last < layout->EntryCount() && last - first < kCopyChunk / kDirectoryEntrySize &&
-               layout->EntryOffset(last) == offset + (last - first) * kDirectoryEntrySize)
-            last += perSector;
-        run.resize(static_cast<std::size_t>(last - first) * kDirectoryEntrySize);
-        if (HRESULT hr = ReadFull(fd, offset, run.data(), run.size()); FAILED(hr))
-            return hr;
-        for (std::uint32_t i = first; i < last; ++i)
-            if (patches[i].node)
-                ApplyPatch(patches[i],
-                           run.data() + static_cast<std::size_t>(i - first) * kDirectoryEntrySize);
-        if (HRESULT hr = WriteFull(fd, offset, run.data(), run.size()); FAILED(hr))
-            return hr;
-        first = last;
-    }
-    return S_OK;
 }
 
 } // namespace ut::platform::posix

@@ -10,6 +10,7 @@
 #include <ut/platform/storage.h>
 
 #include "posix/compound_file.h"
+#include "posix/compound_writer.h"
 #include "posix/gsf_io.h"
 
 namespace ut::platform::posix {
@@ -38,8 +39,11 @@ struct Node {
     // A storage's reader, opened when one of its elements is first read.
     GsfOwner<GsfInfile> reader;
 
-    // A stream's bytes, once written here; until then they are read from the file.
+    // A stream's bytes once changed here: in memory while it is shorter than the mini-stream
+    // cutoff, then in the sectors of the file the next commit writes. Until then they are read
+    // from the file.
     std::unique_ptr<std::vector<std::uint8_t>> bytes;
+    std::unique_ptr<SectorChain> chain;
     ULONGLONG size = 0;
 
     // How many interfaces hold the element; elements open once at a time.
@@ -48,6 +52,7 @@ struct Node {
     bool gone = false;
 
     bool IsStorage() const { return type == STGTY_STORAGE; }
+    bool Changed() const { return bytes || chain; }
     std::shared_ptr<Node> Find(const std::wstring& name) const { return Find(KeyOf(name)); }
     std::shared_ptr<Node> Find(const NameKey& key) const;
     // Names the node; its place among its siblings is the caller's to keep.
@@ -95,8 +100,16 @@ public:
     HRESULT CheckSource(const Node& stream);
     // libgsf's input for a stream's bytes in the file, or null.
     GsfOwner<GsfInput> OpenSource(Node& stream);
-    // Copies a stream's bytes from the file into memory, to be changed there.
+    // Copies a stream's bytes from the file to where they can be changed.
     HRESULT Materialize(Node& stream);
+    // Reads, writes or resizes a changed stream's bytes; a read stays within its size.
+    HRESULT ReadChanged(Node& stream, ULONGLONG at, void* buffer, std::size_t count);
+    HRESULT WriteChanged(Node& stream, ULONGLONG at, const std::uint8_t* data, std::size_t count);
+    HRESULT ResizeChanged(Node& stream, ULONGLONG size);
+    // Hands all of a stream's bytes, in order, to `sink`, from wherever they are.
+    HRESULT ReadAll(Node& stream, const ByteSink& sink);
+    // No interface holds the stream any more: what it gathered in memory goes to the file.
+    void Settle(Node& stream);
     // Empties the elements of `storage` named in `names`, as if they had been opened empty.
     void Exclude(Node& storage, SNB names);
 
@@ -110,11 +123,10 @@ private:
     void Rebase(Node& node);
     void Locate(Node& node, std::uint32_t entry);
     GsfInfile* ReaderOf(Node& storage);
-    HRESULT WriteImage(std::FILE* file);
-    HRESULT WriteElements(Node& storage, GsfOutfile* target);
-    HRESULT WriteStream(Node& stream, GsfOutput* target);
-    HRESULT PatchDirectory(int fd);
-    HRESULT WriteThroughScratch(bool durable);
+    HRESULT Spill(Node& stream);
+    HRESULT Image(std::shared_ptr<SectorFile>& image);
+    HRESULT CopyImageToBytes(const SectorFile& image, bool durable);
+    void DropImage();
 
     ComPtr<ILockBytes> bytes_;
     DWORD mode_;
@@ -122,6 +134,8 @@ private:
     std::unique_ptr<CompoundFile> layout_;
     GsfOwner<GsfInfile> reader_;
     std::shared_ptr<Node> root_;
+    // The file the next commit writes, once a stream's bytes or the commit needs it.
+    std::shared_ptr<SectorFile> image_;
     std::uint64_t generation_ = 0;
     bool dirty_ = false;
     bool closed_ = false;
