@@ -13,8 +13,9 @@
 // stream of 4096 bytes or more goes there as it is written (a few bytes at a time are gathered
 // in memory first), shorter ones stay in memory. The root's commit (and, unless transacted, its
 // release) adds the rest, flushes the file to the disk and renames it over the original, so
-// that a crash leaves the old file or the new one, never a mix. Storages inside the root are part of its transaction.
-// POSIX takes no share locks: a second open of the same file is not refused.
+// that a crash leaves the old file or the new one, never a mix. Storages inside the root are
+// part of its transaction. POSIX takes no share locks: a second open of the same file is not
+// refused.
 #pragma once
 
 #include <ut/platform/com.h>
