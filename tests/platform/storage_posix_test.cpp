@@ -279,8 +279,25 @@ TEST(StoragePosix, ReadsWhatTheSystemWrites) {
     EXPECT_EQ(ReadStream(sub.Get(), L"Inner"), Pattern(5, 4));
 }
 
-// A writer killed while its commit is halfway through the new file: the old file stays whole.
-TEST(StoragePosix, AWriterKilledDuringACommitLeavesTheOldFileIntact) {
+// The size of a file that process `pid` has open in `folder` and that is not `except`, or 0:
+// the next file, nameless while it is written.
+std::uintmax_t OpenFileSizeIn(pid_t pid, const std::filesystem::path& folder, const std::string& except) {
+    std::error_code error;
+    for (const auto& entry :
+         std::filesystem::directory_iterator("/proc/" + std::to_string(pid) + "/fd", error)) {
+        std::filesystem::path target = std::filesystem::read_symlink(entry.path(), error);
+        if (error || target.parent_path() != folder || target.filename() == except)
+            continue;
+        struct stat info {};
+        if (::stat(entry.path().c_str(), &info) == 0 && S_ISREG(info.st_mode))
+            return static_cast<std::uintmax_t>(info.st_size);
+    }
+    return 0;
+}
+
+// A writer killed while it writes the next file: the old file stays whole, and nothing is left
+// beside it.
+TEST(StoragePosix, AWriterKilledWhileWritingLeavesTheOldFileIntactAndNothingBeside) {
     TempFolder folder;
     std::wstring path = folder / L"crash.cfb";
     {
@@ -301,25 +318,19 @@ TEST(StoragePosix, AWriterKilledDuringACommitLeavesTheOldFileIntact) {
             (void)root->Commit(STGC_DEFAULT);
         }
     }
-    // Wait until a temporary file beside the original holds part of a commit.
+    // Wait until the writer holds part of the next file.
+    std::filesystem::path watched = std::filesystem::canonical(folder.Root());
     bool caught = false;
     for (auto start = std::chrono::steady_clock::now();
          !caught && std::chrono::steady_clock::now() - start < std::chrono::seconds(120);) {
-        for (const auto& entry : std::filesystem::directory_iterator(folder.Root())) {
-            std::error_code error;
-            auto size = entry.file_size(error);
-            if (entry.path().filename() != "crash.cfb" && !error && size > (1u << 20)) {
-                caught = true;
-                break;
-            }
-        }
+        caught = OpenFileSizeIn(writer, watched, "crash.cfb") > (1u << 20);
         if (!caught)
             std::this_thread::sleep_for(std::chrono::microseconds(200));
     }
     ::kill(writer, SIGKILL);
     int status = 0;
     ::waitpid(writer, &status, 0);
-    ASSERT_TRUE(caught) << "the writer never started a commit";
+    ASSERT_TRUE(caught) << "the writer never started the next file";
     EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
     std::string after = ReadAll(std::filesystem::path(path));
     ComPtr<IStorage> root;
@@ -329,6 +340,7 @@ TEST(StoragePosix, AWriterKilledDuringACommitLeavesTheOldFileIntact) {
     if (after == before) {
         EXPECT_EQ(ElementsOf(root.Get()).size(), 1u);
     }
+    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(folder.Root()), {}), 1);
 }
 
 } // namespace

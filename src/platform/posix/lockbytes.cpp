@@ -7,6 +7,8 @@
 #include <fcntl.h>
 #include <filesystem>
 #include <new>
+#include <random>
+#include <string>
 #include <sys/stat.h>
 #include <unistd.h>
 #include <utility>
@@ -25,10 +27,14 @@ bool CanWrite(DWORD mode) {
     return (mode & 3) != STGM_READ;
 }
 
+std::string FolderOf(const std::string& path) {
+    std::string folder = std::filesystem::path(path).parent_path().string();
+    return folder.empty() ? "." : folder;
+}
+
 // Makes sure a file's new name and content reach the disk before anyone relies on them.
 void SyncFolderOf(const std::string& path) {
-    std::string folder = std::filesystem::path(path).parent_path().string();
-    int fd = ::open(folder.empty() ? "." : folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    int fd = ::open(FolderOf(path).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (fd < 0)
         return;
     (void)::fsync(fd); // the rename is done; a folder that cannot sync loses only durability
@@ -89,12 +95,12 @@ public:
         if (!CanWrite(mode_))
             return STG_E_ACCESSDENIED;
         if (replacement_ < 0) {
-            std::string temporary = path_ + ".XXXXXX";
-            int created = ::mkostemp(temporary.data(), O_CLOEXEC);
-            if (created < 0)
-                return StorageError(errno, STG_E_WRITEFAULT);
-            replacement_ = created;
-            replacementPath_ = std::move(temporary);
+            // Nameless until the commit names it, so that a crash while it is written leaves
+            // nothing beside the file; a named one where the file system cannot do that.
+            replacement_ = ::open(FolderOf(path_).c_str(), O_TMPFILE | O_RDWR | O_CLOEXEC, 0600);
+            if (replacement_ < 0)
+                if (HRESULT hr = NewNamedReplacement(); FAILED(hr))
+                    return hr;
         }
         fd = replacement_;
         return S_OK;
@@ -103,11 +109,15 @@ public:
     HRESULT FinishReplacement(bool durable) override {
         if (replacement_ < 0)
             return E_UNEXPECTED;
+        if (durable && ::fdatasync(replacement_) != 0)
+            return StorageError(errno, STG_E_WRITEFAULT);
+        // Named only now, so that it has a name beside the file for the moment of the rename.
+        if (replacementPath_.empty())
+            if (HRESULT hr = NameReplacement(durable); FAILED(hr))
+                return hr;
         struct stat info {};
         if (::fstat(fd_, &info) == 0)
             (void)::fchmod(replacement_, info.st_mode & 07777); // the owner's default is only less open
-        if (durable && ::fdatasync(replacement_) != 0)
-            return StorageError(errno, STG_E_WRITEFAULT);
         if (::rename(replacementPath_.c_str(), path_.c_str()) != 0)
             return StorageError(errno, STG_E_WRITEFAULT);
         if (durable)
@@ -121,7 +131,8 @@ public:
     void AbandonReplacement() override {
         if (replacement_ < 0)
             return;
-        (void)::unlink(replacementPath_.c_str()); // the old file stays as it was
+        if (!replacementPath_.empty())
+            (void)::unlink(replacementPath_.c_str()); // the old file stays as it was
         ::close(std::exchange(replacement_, -1));
         replacementPath_.clear();
     }
@@ -131,6 +142,55 @@ public:
     void DeleteOnRelease() { deleteOnRelease_ = true; }
 
 private:
+    HRESULT NewNamedReplacement() {
+        std::string temporary = path_ + ".XXXXXX";
+        replacement_ = ::mkostemp(temporary.data(), O_CLOEXEC);
+        if (replacement_ < 0)
+            return StorageError(errno, STG_E_WRITEFAULT);
+        replacementPath_ = std::move(temporary);
+        return S_OK;
+    }
+
+    // Gives the nameless replacement a temporary name beside the file, through its /proc link;
+    // without /proc its bytes are copied into a named file.
+    HRESULT NameReplacement(bool durable) {
+        std::string link = "/proc/self/fd/" + std::to_string(replacement_);
+        std::random_device random;
+        for (int attempt = 0; attempt < 16; ++attempt) {
+            std::string name = path_ + "." + std::to_string(random() % 1000000);
+            if (::linkat(AT_FDCWD, link.c_str(), AT_FDCWD, name.c_str(), AT_SYMLINK_FOLLOW) == 0) {
+                replacementPath_ = std::move(name);
+                return S_OK;
+            }
+            if (errno != EEXIST)
+                break;
+        }
+        int nameless = std::exchange(replacement_, -1);
+        HRESULT hr = NewNamedReplacement();
+        if (SUCCEEDED(hr))
+            hr = CopyWhole(nameless, replacement_);
+        if (SUCCEEDED(hr) && durable && ::fdatasync(replacement_) != 0)
+            hr = StorageError(errno, STG_E_WRITEFAULT);
+        ::close(nameless);
+        if (FAILED(hr))
+            AbandonReplacement();
+        return hr;
+    }
+
+    static HRESULT CopyWhole(int from, int to) {
+        off_t size = ::lseek(from, 0, SEEK_END);
+        loff_t in = 0;
+        loff_t out = 0;
+        while (in < size) {
+            ssize_t copied = ::copy_file_range(from, &in, to, &out, static_cast<std::size_t>(size - in), 0);
+            if (copied < 0 && errno == EINTR)
+                continue;
+            if (copied <= 0)
+                return StorageError(copied < 0 ? errno : EIO, STG_E_WRITEFAULT);
+        }
+        return size < 0 ? StorageError(errno, STG_E_WRITEFAULT) : S_OK;
+    }
+
     ~FileLockBytes() override {
         AbandonReplacement();
         ::close(fd_);
