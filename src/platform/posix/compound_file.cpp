@@ -213,25 +213,25 @@ HRESULT CompoundFile::ReadFatLocations() {
     for (std::uint32_t sector : fatSectors_)
         if (!SectorInFile(sector))
             return STG_E_DOCFILECORRUPT;
-    fat_.assign(static_cast<std::size_t>(wanted) * (sectorSize_ / 4), 0);
-    fatLoaded_.assign(wanted, 0);
+    fat_.resize(wanted);
     return S_OK;
 }
 
 HRESULT CompoundFile::NextSector(std::uint32_t sector, std::uint32_t& next) {
-    if (sector >= fat_.size())
-        return STG_E_DOCFILECORRUPT;
     std::uint32_t perSector = sectorSize_ / 4;
     std::uint32_t table = sector >> (sectorShift_ - 2);
-    if (!fatLoaded_[table]) [[unlikely]] {
+    if (table >= fat_.size())
+        return STG_E_DOCFILECORRUPT;
+    if (!fat_[table]) [[unlikely]] {
         std::vector<std::uint8_t> bytes(sectorSize_);
         if (HRESULT hr = ReadSector(fatSectors_[table], bytes.data()); FAILED(hr))
             return hr;
+        auto entries = std::make_unique_for_overwrite<std::uint32_t[]>(perSector);
         for (std::uint32_t i = 0; i < perSector; ++i)
-            fat_[static_cast<std::size_t>(table) * perSector + i] = Le32(bytes.data() + 4 * i);
-        fatLoaded_[table] = 1;
+            entries[i] = Le32(bytes.data() + 4 * i);
+        fat_[table] = std::move(entries);
     }
-    next = fat_[sector];
+    next = fat_[table][sector & (perSector - 1)];
     return S_OK;
 }
 

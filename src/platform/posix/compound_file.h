@@ -103,9 +103,9 @@ private:
     std::uint32_t sectorCount_ = 0;
     std::unique_ptr<Header> header_;
     std::vector<std::uint32_t> fatSectors_;
-    // The FAT, read one sector at a time as chains need it.
-    std::vector<std::uint32_t> fat_;
-    std::vector<std::uint8_t> fatLoaded_;
+    // The FAT, read one sector at a time as chains need it: opening a large file to read one
+    // stream reads and keeps only the sectors of that stream's chain.
+    std::vector<std::unique_ptr<std::uint32_t[]>> fat_;
     std::vector<std::uint32_t> miniFat_;
     std::vector<std::uint32_t> directorySectors_;
     std::vector<DirectoryEntry> entries_;
