@@ -16,6 +16,7 @@
 namespace {
 
 using ut::ComPtr;
+using ut::platform::AppendLittleEndian;
 using ut::platform::ReadLittleEndian;
 using ut::sdk::ImageView;
 using ut::sdk::Rgba;
@@ -55,11 +56,6 @@ struct PropertyStream {
     std::vector<PropertySet> sets;
 };
 
-void Put(Bytes& out, std::uint32_t value, int size = 4) {
-    for (int i = 0; i < size; ++i, value >>= 8)
-        out.push_back(static_cast<std::uint8_t>(value & 0xFF));
-}
-
 GUID GuidAt(const Bytes& bytes, std::size_t at) {
     GUID guid{ReadLittleEndian(bytes, at),
               static_cast<std::uint16_t>(ReadLittleEndian(bytes, at + 4, 2)),
@@ -70,9 +66,9 @@ GUID GuidAt(const Bytes& bytes, std::size_t at) {
 }
 
 void PutGuid(Bytes& out, const GUID& guid) {
-    Put(out, guid.Data1);
-    Put(out, guid.Data2, 2);
-    Put(out, guid.Data3, 2);
+    AppendLittleEndian(out, guid.Data1);
+    AppendLittleEndian(out, guid.Data2, 2);
+    AppendLittleEndian(out, guid.Data3, 2);
     out.insert(out.end(), guid.Data4, guid.Data4 + 8);
 }
 
@@ -136,11 +132,11 @@ Bytes EncodeSet(const PropertySet& set) {
     Bytes values;
     Bytes out;
     auto header = static_cast<std::uint32_t>(8 + 8 * set.properties.size());
-    Put(out, 0); // the size, known at the end
-    Put(out, static_cast<std::uint32_t>(set.properties.size()));
+    AppendLittleEndian(out, 0); // the size, known at the end
+    AppendLittleEndian(out, static_cast<std::uint32_t>(set.properties.size()));
     for (const Property& property : set.properties) {
-        Put(out, property.id);
-        Put(out, header + static_cast<std::uint32_t>(values.size()));
+        AppendLittleEndian(out, property.id);
+        AppendLittleEndian(out, header + static_cast<std::uint32_t>(values.size()));
         values.insert(values.end(), property.value.begin(), property.value.end());
         PadToFour(values);
     }
@@ -153,17 +149,17 @@ Bytes EncodeSet(const PropertySet& set) {
 
 Bytes EncodeStream(const PropertyStream& stream) {
     Bytes out;
-    Put(out, kByteOrderMark, 2);
-    Put(out, stream.version, 2);
-    Put(out, stream.system);
+    AppendLittleEndian(out, kByteOrderMark, 2);
+    AppendLittleEndian(out, stream.version, 2);
+    AppendLittleEndian(out, stream.system);
     PutGuid(out, stream.clsid);
-    Put(out, static_cast<std::uint32_t>(stream.sets.size()));
+    AppendLittleEndian(out, static_cast<std::uint32_t>(stream.sets.size()));
     std::vector<Bytes> sets;
     std::size_t offset = kStreamHeaderSize + kSetEntrySize * stream.sets.size();
     for (const PropertySet& set : stream.sets) {
         sets.push_back(EncodeSet(set));
         PutGuid(out, set.fmtid);
-        Put(out, static_cast<std::uint32_t>(offset));
+        AppendLittleEndian(out, static_cast<std::uint32_t>(offset));
         offset += sets.back().size();
     }
     for (const Bytes& set : sets)
@@ -178,11 +174,11 @@ Bytes EncodeDib(const ImageView& image) {
     Bytes out;
     out.reserve(kInfoHeaderSize + imageSize);
     for (std::uint32_t field : {kInfoHeaderSize, std::uint32_t{image.width}, std::uint32_t{image.height}})
-        Put(out, field);
-    Put(out, 1, 2);                                             // planes
-    Put(out, 24, 2);                                            // bits per pixel
+        AppendLittleEndian(out, field);
+    AppendLittleEndian(out, 1, 2);                              // planes
+    AppendLittleEndian(out, 24, 2);                             // bits per pixel
     for (std::uint32_t field : {0u, imageSize, 0u, 0u, 0u, 0u}) // uncompressed, no colour table
-        Put(out, field);
+        AppendLittleEndian(out, field);
     for (ULONG row = image.height; row-- > 0;) {
         for (ULONG x = 0; x < image.width; ++x) {
             Rgba p = image.Read(x, row);
@@ -230,10 +226,10 @@ HRESULT DecodeDib(const Bytes& dib, ComPtr<IGWImage>& image) {
 
 Bytes ThumbnailValue(const Bytes& dib) {
     Bytes value;
-    Put(value, kTypeClipboard);
-    Put(value, static_cast<std::uint32_t>(8 + dib.size()));
-    Put(value, kSystemClipboardTag);
-    Put(value, kClipboardBitmap);
+    AppendLittleEndian(value, kTypeClipboard);
+    AppendLittleEndian(value, static_cast<std::uint32_t>(8 + dib.size()));
+    AppendLittleEndian(value, kSystemClipboardTag);
+    AppendLittleEndian(value, kClipboardBitmap);
     value.insert(value.end(), dib.begin(), dib.end());
     return value;
 }
@@ -301,8 +297,8 @@ Property* FindProperty(PropertySet& set, std::uint32_t id) {
 // A summary stream of its own for a file that has none: a code page and nothing else yet.
 PropertyStream NewSummary() {
     Bytes codePage;
-    Put(codePage, kTypeShort);
-    Put(codePage, kCodePageUnicode);
+    AppendLittleEndian(codePage, kTypeShort);
+    AppendLittleEndian(codePage, kCodePageUnicode);
     PropertyStream stream;
     stream.sets.push_back({GUID_GWSummaryInformation, {{kCodePageProperty, codePage}}});
     return stream;

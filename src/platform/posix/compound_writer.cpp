@@ -6,6 +6,7 @@
 #include <cstring>
 #include <unistd.h>
 
+#include <ut/platform/detail/little_endian.h>
 #include <ut/platform/text.h>
 
 #include "posix/compound_file.h"
@@ -34,23 +35,15 @@ Number SectorsFor(Number bytes, Number size) {
 }
 
 void PutLe16(std::uint8_t* p, std::uint16_t value) {
-    p[0] = static_cast<std::uint8_t>(value);
-    p[1] = static_cast<std::uint8_t>(value >> 8);
+    WriteLittleEndian(p, value, 2);
 }
 
 void PutLe32(std::uint8_t* p, std::uint32_t value) {
-    for (int i = 0; i < 4; ++i)
-        p[i] = static_cast<std::uint8_t>(value >> (8 * i));
-}
-
-void PutLe64(std::uint8_t* p, std::uint64_t value) {
-    PutLe32(p, static_cast<std::uint32_t>(value));
-    PutLe32(p + 4, static_cast<std::uint32_t>(value >> 32));
+    WriteLittleEndian(p, value);
 }
 
 void PutTime(std::uint8_t* p, const FILETIME& time) {
-    PutLe32(p, time.dwLowDateTime);
-    PutLe32(p + 4, time.dwHighDateTime);
+    WriteLittleEndian(p, (std::uint64_t{time.dwHighDateTime} << 32) | time.dwLowDateTime, 8);
 }
 
 // One directory entry of the file being written.
@@ -103,7 +96,7 @@ void EncodeEntry(const Entry& entry, bool root, std::uint8_t* raw) {
     PutTime(raw + 100, node.created);
     PutTime(raw + 108, node.modified);
     PutLe32(raw + 116, entry.start);
-    PutLe64(raw + 120, entry.size);
+    WriteLittleEndian(raw + 120, entry.size, 8);
 }
 
 // Builds one commit's file: what goes where, then the tables that say so.
