@@ -23,8 +23,8 @@ inline void WriteLittleEndian(std::uint8_t* at, std::uint64_t value, int size = 
 
 // Appends the low `size` bytes (1 to 8) of `value` to `out`, least significant first.
 inline void AppendLittleEndian(std::vector<std::uint8_t>& out, std::uint64_t value, int size = 4) {
-    out.resize(out.size() + static_cast<std::size_t>(size));
-    WriteLittleEndian(out.data() + out.size() - static_cast<std::size_t>(size), value, size);
+    for (int i = 0; i < size; ++i, value >>= 8)
+        out.push_back(static_cast<std::uint8_t>(value));
 }
 
 } // namespace ut::platform
