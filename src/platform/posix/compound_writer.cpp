@@ -493,6 +493,13 @@ HRESULT SectorChain::Flush() {
     return S_OK;
 }
 
+HRESULT SectorChain::Release() {
+    if (HRESULT hr = Flush(); FAILED(hr))
+        return hr;
+    pending_.shrink_to_fit();
+    return S_OK;
+}
+
 HRESULT SectorChain::Resize(ULONGLONG size) {
     if (HRESULT hr = Flush(); FAILED(hr))
         return hr;

@@ -69,6 +69,9 @@ public:
     HRESULT Write(ULONGLONG at, const std::uint8_t* data, std::size_t count);
     HRESULT Resize(ULONGLONG size);
     HRESULT Flush();
+    // Flushes and gives back the memory of the gathered stretch, as a stream no one holds must:
+    // a scene of thousands of streams would otherwise keep a stretch for each.
+    HRESULT Release();
     // The sectors that hold the bytes, in order; flushed first.
     const std::vector<std::uint32_t>& Sectors() const { return sectors_; }
     bool Flushed() const { return pending_.empty(); }

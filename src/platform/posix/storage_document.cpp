@@ -314,7 +314,7 @@ HRESULT Document::ResizeChanged(Node& stream, ULONGLONG size) {
 
 void Document::Settle(Node& stream) {
     if (stream.chain)
-        (void)stream.chain->Flush(); // what fails to go now stays gathered, and the commit tells
+        (void)stream.chain->Release(); // what fails to go now stays gathered, and the commit tells
 }
 
 // A stream grown to the mini-stream cutoff moves its bytes to the sectors of the next file.
