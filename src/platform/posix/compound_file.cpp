@@ -11,11 +11,7 @@
 namespace ut::platform::posix {
 namespace {
 
-constexpr std::uint8_t kSignature[8] = {0xD0, 0xCF, 0x11, 0xE0, 0xA1, 0xB1, 0x1A, 0xE1};
 constexpr std::uint32_t kHeaderSize = 512;
-constexpr std::uint32_t kHeaderFatEntries = 109;
-constexpr std::uint32_t kEndOfChain = 0xFFFFFFFE;
-constexpr std::uint32_t kMiniSectorSize = 64;
 constexpr ULONG kWindowSize = 64 * 1024;
 
 std::uint16_t Le16(const std::uint8_t* p) {
@@ -27,10 +23,6 @@ std::uint32_t Le32(const std::uint8_t* p) {
 }
 std::uint64_t Le64(const std::uint8_t* p) {
     return Le32(p) | static_cast<std::uint64_t>(Le32(p + 4)) << 32;
-}
-
-std::uint64_t SectorsFor(std::uint64_t bytes, std::uint32_t sectorSize) {
-    return (bytes + sectorSize - 1) / sectorSize;
 }
 
 // Reads exactly `count` bytes at `offset`; a short read is a damaged file.

@@ -13,13 +13,23 @@
 
 namespace ut::platform::posix {
 
+inline constexpr std::uint8_t kSignature[8] = {0xD0, 0xCF, 0x11, 0xE0, 0xA1, 0xB1, 0x1A, 0xE1};
 inline constexpr std::uint32_t kNoEntry = 0xFFFFFFFF;
 inline constexpr std::uint32_t kDirectoryEntrySize = 128;
+// The FAT sectors the header names itself; the DIFAT names the rest.
+inline constexpr std::uint32_t kHeaderFatEntries = 109;
+inline constexpr std::uint32_t kEndOfChain = 0xFFFFFFFE;
 // Streams shorter than this live in the mini stream, in 64-byte sectors.
 inline constexpr std::uint64_t kMiniStreamCutoff = 4096;
+inline constexpr std::uint32_t kMiniSectorSize = 64;
 // libgsf follows the directory tree recursively, with about 250 bytes of stack a level: deeper
 // trees are refused rather than let it overflow a thread's stack.
 inline constexpr std::uint32_t kMaxTreeDepth = 4096;
+
+// How many sectors of `size` bytes hold `bytes`.
+constexpr std::uint64_t SectorsFor(std::uint64_t bytes, std::uint64_t size) {
+    return (bytes + size - 1) / size;
+}
 
 enum class EntryType : std::uint8_t { Unused = 0, Storage = 1, Stream = 2, Root = 5 };
 

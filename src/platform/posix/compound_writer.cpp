@@ -16,23 +16,14 @@
 namespace ut::platform::posix {
 namespace {
 
-constexpr std::uint8_t kSignature[8] = {0xD0, 0xCF, 0x11, 0xE0, 0xA1, 0xB1, 0x1A, 0xE1};
 constexpr std::uint32_t kEntriesPerSector = kSectorSize / 4;
-constexpr std::uint32_t kHeaderFatEntries = 109;
-constexpr std::uint32_t kMiniSectorSize = 64;
 constexpr std::uint32_t kLastRegularSector = 0xFFFFFFFA;
 constexpr std::uint32_t kDifatSector = 0xFFFFFFFC;
 constexpr std::uint32_t kFatSector = 0xFFFFFFFD;
-constexpr std::uint32_t kEndOfChain = 0xFFFFFFFE;
 constexpr std::uint32_t kFreeSector = 0xFFFFFFFF;
 // How much of a stream's writes is gathered before it goes to the file.
 constexpr std::size_t kGathered = 64 * 1024;
 constexpr std::uint8_t kZeros[kSectorSize] = {};
-
-template <class Number>
-Number SectorsFor(Number bytes, Number size) {
-    return (bytes + size - 1) / size;
-}
 
 void PutLe16(std::uint8_t* p, std::uint16_t value) {
     WriteLittleEndian(p, value, 2);
@@ -44,6 +35,14 @@ void PutLe32(std::uint8_t* p, std::uint32_t value) {
 
 void PutTime(std::uint8_t* p, const FILETIME& time) {
     WriteLittleEndian(p, (std::uint64_t{time.dwHighDateTime} << 32) | time.dwLowDateTime, 8);
+}
+
+// A table of sector numbers as the file keeps it.
+std::vector<std::uint8_t> TableBytes(const std::vector<std::uint32_t>& table) {
+    std::vector<std::uint8_t> bytes(table.size() * 4);
+    for (std::size_t i = 0; i < table.size(); ++i)
+        PutLe32(bytes.data() + 4 * i, table[i]);
+    return bytes;
 }
 
 // One directory entry of the file being written.
@@ -153,7 +152,7 @@ private:
             entry.start = stream.chain->Sectors().front();
             return S_OK;
         }
-        auto count = static_cast<std::uint32_t>(SectorsFor<ULONGLONG>(stream.size, kSectorSize));
+        auto count = static_cast<std::uint32_t>(SectorsFor(stream.size, kSectorSize));
         if (HRESULT hr = file_.Append(count, entry.start); FAILED(hr))
             return hr;
         runs_.push_back({entry.start, count});
@@ -183,7 +182,7 @@ private:
             return hr;
         if (mini_.size() - before != entry.size)
             return STG_E_DOCFILECORRUPT;
-        mini_.resize(SectorsFor<std::size_t>(mini_.size(), kMiniSectorSize) * kMiniSectorSize);
+        mini_.resize(SectorsFor(mini_.size(), kMiniSectorSize) * kMiniSectorSize);
         auto end = static_cast<std::uint32_t>(mini_.size() / kMiniSectorSize);
         for (std::uint32_t sector = entry.start; sector < end; ++sector)
             miniFat_.push_back(sector + 1 < end ? sector + 1 : kEndOfChain);
@@ -194,7 +193,7 @@ private:
     HRESULT PlaceBytes(std::vector<std::uint8_t>& bytes, std::uint8_t fill, std::uint32_t& start) {
         if (bytes.empty())
             return S_OK;
-        auto count = static_cast<std::uint32_t>(SectorsFor<std::size_t>(bytes.size(), kSectorSize));
+        auto count = static_cast<std::uint32_t>(SectorsFor(bytes.size(), kSectorSize));
         bytes.resize(std::size_t{count} * kSectorSize, fill);
         if (HRESULT hr = file_.Append(count, start); FAILED(hr))
             return hr;
@@ -208,9 +207,7 @@ private:
     }
 
     HRESULT PlaceTable(const std::vector<std::uint32_t>& table, std::uint32_t& start) {
-        std::vector<std::uint8_t> bytes(table.size() * 4);
-        for (std::size_t i = 0; i < table.size(); ++i)
-            PutLe32(bytes.data() + 4 * i, table[i]);
+        std::vector<std::uint8_t> bytes = TableBytes(table);
         return PlaceBytes(bytes, 0xFF, start);
     }
 
@@ -236,9 +233,9 @@ private:
         std::uint32_t difatCount = 0;
         for (;;) {
             std::uint64_t sectors = std::uint64_t{file_.Count()} + fatCount + difatCount;
-            auto fat = static_cast<std::uint32_t>(SectorsFor<std::uint64_t>(sectors, kEntriesPerSector));
-            std::uint32_t difat =
-                fat > kHeaderFatEntries ? SectorsFor(fat - kHeaderFatEntries, kEntriesPerSector - 1) : 0;
+            auto fat = static_cast<std::uint32_t>(SectorsFor(sectors, kEntriesPerSector));
+            auto difat = static_cast<std::uint32_t>(
+                fat > kHeaderFatEntries ? SectorsFor(fat - kHeaderFatEntries, kEntriesPerSector - 1) : 0);
             if (fat == fatCount && difat == difatCount)
                 break;
             fatCount = fat;
@@ -256,9 +253,7 @@ private:
                 fat[sector] = sector + 1 < first + count ? sector + 1 : kEndOfChain;
         std::fill_n(fat.begin() + firstFat, fatCount, kFatSector);
         std::fill_n(fat.begin() + firstFat + fatCount, difatCount, kDifatSector);
-        std::vector<std::uint8_t> bytes(fat.size() * 4);
-        for (std::size_t i = 0; i < fat.size(); ++i)
-            PutLe32(bytes.data() + 4 * i, fat[i]);
+        std::vector<std::uint8_t> bytes = TableBytes(fat);
         if (HRESULT hr = file_.Write(SectorFile::Offset(firstFat), bytes.data(), bytes.size()); FAILED(hr))
             return hr;
         if (HRESULT hr = WriteDifat(firstFat, fatCount, difatCount); FAILED(hr))
@@ -296,8 +291,7 @@ private:
         PutLe32(header + 48, directory);
         PutLe32(header + 56, kMiniStreamCutoff);
         PutLe32(header + 60, miniFat);
-        PutLe32(header + 64,
-                static_cast<std::uint32_t>(SectorsFor<std::size_t>(miniFat_.size(), kEntriesPerSector)));
+        PutLe32(header + 64, static_cast<std::uint32_t>(SectorsFor(miniFat_.size(), kEntriesPerSector)));
         PutLe32(header + 68, difatCount ? firstFat + fatCount : kEndOfChain);
         PutLe32(header + 72, difatCount);
         for (std::uint32_t i = 0; i < kHeaderFatEntries; ++i)
@@ -409,7 +403,7 @@ HRESULT SectorChain::ForEachRun(ULONGLONG at, std::size_t count, Transfer&& tran
 }
 
 HRESULT SectorChain::Cover(ULONGLONG end) {
-    auto needed = static_cast<std::size_t>(SectorsFor<ULONGLONG>(end, kSectorSize));
+    auto needed = static_cast<std::size_t>(SectorsFor(end, kSectorSize));
     sectors_.reserve(needed);
     while (sectors_.size() < needed) {
         std::uint32_t sector = 0;
@@ -438,7 +432,7 @@ HRESULT SectorChain::WriteThrough(ULONGLONG at, const std::uint8_t* data, std::s
 // Gives back the sectors past the end and clears the rest of the last one, which must read as
 // zeros when the stream grows.
 HRESULT SectorChain::Trim() {
-    auto kept = static_cast<std::size_t>(SectorsFor<ULONGLONG>(size_, kSectorSize));
+    auto kept = static_cast<std::size_t>(SectorsFor(size_, kSectorSize));
     while (sectors_.size() > kept) {
         file_->Give(sectors_.back());
         sectors_.pop_back();

@@ -72,9 +72,8 @@ public:
     // Flushes and gives back the memory of the gathered stretch, as a stream no one holds must:
     // a scene of thousands of streams would otherwise keep a stretch for each.
     HRESULT Release();
-    // The sectors that hold the bytes, in order; flushed first.
+    // The sectors that hold the bytes, in order, once flushed.
     const std::vector<std::uint32_t>& Sectors() const { return sectors_; }
-    bool Flushed() const { return pending_.empty(); }
 
 private:
     HRESULT Cover(ULONGLONG end);

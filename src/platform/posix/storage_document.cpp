@@ -220,17 +220,7 @@ HRESULT Document::Materialize(Node& stream) {
             stream.bytes = std::move(bytes);
             return S_OK;
         }
-        std::shared_ptr<SectorFile> image;
-        if (HRESULT hr = Image(image); FAILED(hr))
-            return hr;
-        auto chain = std::make_unique<SectorChain>(image);
-        if (HRESULT hr =
-                ReadAll(stream, [&](const std::uint8_t* data,
-                                    std::size_t count) { return chain->Write(chain->Size(), data, count); });
-            FAILED(hr))
-            return hr;
-        stream.chain = std::move(chain);
-        return S_OK;
+        return Spill(stream);
     });
 }
 
@@ -317,15 +307,18 @@ void Document::Settle(Node& stream) {
         (void)stream.chain->Release(); // what fails to go now stays gathered, and the commit tells
 }
 
-// A stream grown to the mini-stream cutoff moves its bytes to the sectors of the next file.
+// A stream that reaches the mini-stream cutoff moves its bytes, from memory or from the file,
+// to the sectors of the next file.
 HRESULT Document::Spill(Node& stream) {
     std::shared_ptr<SectorFile> image;
     if (HRESULT hr = Image(image); FAILED(hr))
         return hr;
     auto chain = std::make_unique<SectorChain>(image);
-    if (stream.bytes && !stream.bytes->empty())
-        if (HRESULT hr = chain->Write(0, stream.bytes->data(), stream.bytes->size()); FAILED(hr))
-            return hr;
+    if (HRESULT hr =
+            ReadAll(stream, [&](const std::uint8_t* data,
+                                std::size_t count) { return chain->Write(chain->Size(), data, count); });
+        FAILED(hr))
+        return hr;
     stream.chain = std::move(chain);
     stream.bytes.reset();
     return S_OK;
@@ -380,8 +373,7 @@ HRESULT Document::Commit(bool durable) {
             image->Truncate(mark); // the streams' sectors stay for the next try
             return hr;
         }
-        image_->Retire();
-        image_.reset();
+        DropImage(); // the file it was is the document's file now, or was copied into it
         Rebase(*root_);
         reader_.reset();
         layout_.reset();
