@@ -9,7 +9,6 @@
 #include <filesystem>
 #include <fstream>
 #include <functional>
-#include <iterator>
 #include <optional>
 #include <sqlite3.h>
 #include <sys/stat.h>
@@ -31,10 +30,6 @@ using namespace ut::test;
 using ut::UniqueHKey;
 namespace fs = std::filesystem;
 
-std::string ReadFile(const fs::path& path) {
-    std::ifstream in(path, std::ios::binary);
-    return std::string((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
-}
 void WriteFile(const fs::path& path, const std::string& bytes) {
     std::ofstream(path, std::ios::binary) << bytes;
 }
@@ -148,11 +143,11 @@ TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
     }
     // The folder stays open to everyone, so that the reader can keep its shared index there.
     ASSERT_EQ(chmod(folder.c_str(), 01777) | chmod(store.c_str(), 0444), 0);
-    std::string before = ReadFile(store);
+    std::string before = ut::test::FileContent(store);
     Child probe("probe 'Software\\ut-tests\\read-only'", store.string());
     EXPECT_EQ(probe.Line().value_or("no output"), "read=0 create=5 set=5 delete=5");
     EXPECT_EQ(probe.Wait(), 0);
-    EXPECT_EQ(ReadFile(store), before);
+    EXPECT_EQ(ut::test::FileContent(store), before);
 }
 
 TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
@@ -188,7 +183,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
         {"a damaged store",
          [&](const fs::path& path) {
              store(path);
-             std::string bytes = ReadFile(path);
+             std::string bytes = ut::test::FileContent(path);
              std::fill(bytes.begin() + 4096, bytes.end(), 'Z');
              WriteFile(path, bytes);
          }},
@@ -197,7 +192,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
         SCOPED_TRACE(label);
         fs::path path = folder / (std::string(label) + ".db");
         make(path);
-        std::string before = ReadFile(path);
+        std::string before = ut::test::FileContent(path);
         {
             StoreSwitch use(path);
             testing::internal::CaptureStderr();
@@ -209,7 +204,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
             EXPECT_NE(said.find(path.string()), std::string::npos) << said;
             EXPECT_EQ(said.find("ut registry"), said.rfind("ut registry")) << said;
         }
-        EXPECT_EQ(ReadFile(path), before);
+        EXPECT_EQ(ut::test::FileContent(path), before);
     }
 }
 

@@ -31,11 +31,6 @@ using ut::test::PutStream;
 using ut::test::ReadStream;
 using ut::test::TempFolder;
 
-std::string ReadAll(const std::filesystem::path& path) {
-    std::ifstream in(path, std::ios::binary);
-    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-}
-
 void WriteAll(const std::filesystem::path& path, const std::string& bytes) {
     std::ofstream(path, std::ios::binary | std::ios::trunc) << bytes;
 }
@@ -96,7 +91,7 @@ std::string SampleBytes(const TempFolder& folder) {
         EXPECT_EQ(root->CreateStorage(L"sub", kElementMode, 0, 0, sub.Put()), S_OK);
         EXPECT_EQ(PutStream(sub.Get(), L"in", "x"), S_OK);
     }
-    return ReadAll(folder.Root() / "good.cfb");
+    return ut::test::FileContent(folder.Root() / "good.cfb");
 }
 
 struct Damage {
@@ -305,7 +300,7 @@ TEST(StoragePosix, AWriterKilledWhileWritingLeavesTheOldFileIntactAndNothingBesi
         ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
         ASSERT_EQ(PutStream(root.Get(), L"old", Pattern(1000, 1)), S_OK);
     }
-    std::string before = ReadAll(std::filesystem::path(path));
+    std::string before = ut::test::FileContent(std::filesystem::path(path));
     pid_t writer = ::fork();
     ASSERT_GE(writer, 0);
     if (writer == 0) {
@@ -332,7 +327,7 @@ TEST(StoragePosix, AWriterKilledWhileWritingLeavesTheOldFileIntactAndNothingBesi
     ::waitpid(writer, &status, 0);
     ASSERT_TRUE(caught) << "the writer never started the next file";
     EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
-    std::string after = ReadAll(std::filesystem::path(path));
+    std::string after = ut::test::FileContent(std::filesystem::path(path));
     ComPtr<IStorage> root;
     ASSERT_EQ(Open(path, root), S_OK);
     EXPECT_EQ(ReadStream(root.Get(), L"old"), Pattern(1000, 1));

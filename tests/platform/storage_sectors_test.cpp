@@ -3,8 +3,6 @@
 // and reverts, and a full disk must fail only the call it hits, losing nothing.
 #include <csignal>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <map>
 #include <random>
 #include <string>
@@ -271,11 +269,6 @@ TEST(StorageSectors, AGrownStreamReadsZerosWhereItHadShrunk) {
     }
 }
 
-std::string FileBytes(const std::wstring& path) {
-    std::ifstream in(std::filesystem::path(path), std::ios::binary);
-    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-}
-
 // Files may grow only to `limit` bytes while it stands, as on a disk that is full.
 class FullDisk {
 public:
@@ -319,7 +312,7 @@ TEST(StorageSectors, AFullDiskFailsOnlyTheCallItMeets) {
         ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode | STGM_TRANSACTED, 0, root.Put()), S_OK);
         ASSERT_EQ(PutStream(root.Get(), L"old", ut::test::Pattern(5000, 1)), S_OK);
         ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
-        std::string before = FileBytes(path);
+        std::string before = ut::test::FileContent(path);
 
         std::size_t total = row.pieceSize < 4096 && !row.writeFails ? 3000 : 2 << 20;
         std::string content = ut::test::Pattern(total, 2);
@@ -342,7 +335,7 @@ TEST(StorageSectors, AFullDiskFailsOnlyTheCallItMeets) {
         STATSTG stat{};
         ASSERT_EQ(stream->Stat(&stat, STATFLAG_NONAME), S_OK);
         EXPECT_EQ(stat.cbSize.QuadPart, row.writeFails ? content.size() : total);
-        EXPECT_EQ(FileBytes(path), before) << "the file changed";
+        EXPECT_EQ(ut::test::FileContent(path), before) << "the file changed";
         stream.Reset();
         ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
         root.Reset();

@@ -5,10 +5,8 @@
 #include <cmath>
 #include <cstdint>
 #include <filesystem>
-#include <fstream>
 #include <functional>
 #include <iostream>
-#include <iterator>
 #include <set>
 #include <string>
 #include <vector>
@@ -81,11 +79,6 @@ Pixels ImagePixels(IGWImage* image) {
         pixels[i] = std::uint32_t(p[3]) << 24 | std::uint32_t(p[0]) << 16 | std::uint32_t(p[1]) << 8 | p[2];
     }
     return pixels;
-}
-
-std::string FileBytes(const std::wstring& path) {
-    std::ifstream in(std::filesystem::path(path), std::ios::binary);
-    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
 }
 
 std::wstring NewSceneFile(const ut::test::TempFolder& folder, const std::string& summary = {}) {
@@ -235,7 +228,7 @@ TEST(Thumbnails, WithoutAPictureThereIsNoThumbnailAndTheFileIsNotOpened) {
         auto before = std::filesystem::last_write_time(notCompound);
         EXPECT_EQ(Result(KXPutThumnailInFile(CKXString(notCompound.c_str()))),
                   c.put == "S_OK" ? refused : c.put);
-        EXPECT_EQ(FileBytes(notCompound), "not a compound file");
+        EXPECT_EQ(ut::test::FileContent(notCompound), "not a compound file");
         EXPECT_EQ(std::filesystem::last_write_time(notCompound), before);
         EXPECT_EQ(Result(KXPutThumnailInFile(CKXString((folder / L"none.scn").c_str()))),
                   c.put == "S_OK" ? "NOTFOUND" : c.put);
@@ -426,7 +419,7 @@ TEST(Thumbnails, EveryExportSurvivesEveryHostFault) {
     ut::test::TempFolder folder;
     ut::host::ReferenceHost host(ut::host::Settings{.thumbnailImage = folder.Write(L"p.bmp", Bmp(128, 32))});
     const std::wstring scene = NewSceneFile(folder, SummaryStream({{1, kCodePage}, {2, kTitle}}));
-    const std::string original = FileBytes(scene);
+    const std::string original = ut::test::FileContent(scene);
     int available = -1;
     struct Walk {
         const char* name;
@@ -457,7 +450,7 @@ TEST(Thumbnails, EveryExportSurvivesEveryHostFault) {
              return KXPutThumnailInFile(CKXString(scene.c_str()));
          },
          {"S_FALSE", "DENIED"},
-         [&] { return FileBytes(scene) == original; }},
+         [&] { return ut::test::FileContent(scene) == original; }},
     };
     int walked = 0;
     for (const Walk& walk : walks) {
@@ -475,7 +468,7 @@ TEST(Thumbnails, EveryExportSurvivesEveryHostFault) {
                                  E_ACCESSDENIED);
     }
     EXPECT_EQ(available, 1);
-    EXPECT_NE(FileBytes(scene), original);
+    EXPECT_NE(ut::test::FileContent(scene), original);
     std::cout << "[ walked   ] " << walked << " failure paths in " << std::size(walks) << " scenarios\n";
 }
 

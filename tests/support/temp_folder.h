@@ -3,6 +3,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <random>
 #include <string>
 #include <string_view>
@@ -10,6 +11,12 @@
 #include <gtest/gtest.h>
 
 namespace ut::test {
+
+// The whole content of a file, or nothing when it cannot be read.
+inline std::string FileContent(const std::filesystem::path& path) {
+    std::ifstream in(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+}
 
 class TempFolder {
 public:
@@ -45,8 +52,8 @@ private:
     static std::string UniqueName() {
         static std::random_device random;
         const auto* test = ::testing::UnitTest::GetInstance()->current_test_info();
-        std::string name = std::string("ut_") + (test ? test->name() : "test") + "_" + std::to_string(random()) +
-                           std::to_string(random());
+        std::string name = std::string("ut_") + (test ? test->name() : "test") + "_" +
+                           std::to_string(random()) + std::to_string(random());
         for (char& c : name)
             if (c == '/')
                 c = '_';
