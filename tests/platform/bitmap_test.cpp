@@ -102,19 +102,14 @@ TEST_F(BitmapTest, StretchingCopiesScalesAndClips) {
         RECT to;
         std::vector<std::uint32_t> expected;
     } cases[] = {
+        // clang-format off
         {"copy", 2, 2, {A, B, C, D}, 2, 2, {0, 0, 2, 2}, {A, B, C, D}},
-        {"twice as large",
-         2,
-         2,
-         {A, B, C, D},
-         4,
-         4,
-         {0, 0, 4, 4},
-         {A, A, B, B, A, A, B, B, C, C, D, D, C, C, D, D}},
+        {"twice as large", 2, 2, {A, B, C, D}, 4, 4, {0, 0, 4, 4}, {A, A, B, B, A, A, B, B, C, C, D, D, C, C, D, D}},
         {"half as large", 4, 2, {A, A, B, B, A, A, B, B}, 2, 1, {0, 0, 2, 1}, {A, B}},
         {"offset inside", 1, 1, {D}, 3, 3, {1, 1, 2, 2}, {Z, Z, Z, Z, D, Z, Z, Z, Z}},
         {"clipped at the top left", 2, 2, {A, B, C, D}, 3, 3, {-1, -1, 1, 1}, {D, Z, Z, Z, Z, Z, Z, Z, Z}},
         {"wide into tall", 2, 1, {A, B}, 2, 4, {0, 1, 2, 3}, {Z, Z, A, B, A, B, Z, Z}},
+        // clang-format on
     };
     for (const Case& c : cases)
         EXPECT_EQ(Stretch(c.width, c.height, c.pixels, c.targetWidth, c.targetHeight, c.to), c.expected)

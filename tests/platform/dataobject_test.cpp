@@ -2,6 +2,8 @@
 // on both homes.
 #include <cstring>
 #include <string>
+#include <tuple>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -10,6 +12,7 @@
 #include <ut/platform/stream.h>
 
 #include "support/ref_tracker.h"
+#include "support/streams.h"
 
 namespace {
 
@@ -68,21 +71,17 @@ TEST(DropFiles, NamesCountLengthsAndCutCopies) {
     auto drop = static_cast<HDROP>(block.get());
     EXPECT_EQ(DragQueryFileW(drop, 0xFFFFFFFF, nullptr, 0), 3u);
     wchar_t buffer[64];
-    struct Case {
-        UINT index;
-        UINT size;
-        UINT expected;
-        const wchar_t* text;
-    } cases[] = {
+    const std::tuple<UINT, UINT, UINT, const wchar_t*> cases[] = {
+        // index, room, length, text
         {0, 64, 19, L"C:\\scenes\\first.scn"},
         {1, 64, 19, L"/renders/second.avi"},
         {2, 64, 1, L"x"},
         {0, 6, 5, L"C:\\sc"},
         {1, 1, 0, L""},
     };
-    for (const Case& c : cases) {
-        EXPECT_EQ(DragQueryFileW(drop, c.index, buffer, c.size), c.expected) << c.index;
-        EXPECT_STREQ(buffer, c.text) << c.index;
+    for (const auto& [index, room, length, text] : cases) {
+        EXPECT_EQ(DragQueryFileW(drop, index, buffer, room), length) << index;
+        EXPECT_STREQ(buffer, text) << index;
     }
     EXPECT_EQ(DragQueryFileW(drop, 1, nullptr, 0), 19u);
     EXPECT_EQ(DragQueryFileW(drop, 3, buffer, 64), 0u);
@@ -96,10 +95,7 @@ protected:
 
 TEST_F(DataObjectTest, AnswersWhichFormatsAndMediaItHolds) {
     ASSERT_EQ(ut::platform::SetGlobalData(data_.Get(), CF_UNICODETEXT, L"text", 5 * sizeof(wchar_t)), S_OK);
-    struct Case {
-        FORMATETC format;
-        HRESULT expected;
-    } cases[] = {
+    std::pair<FORMATETC, HRESULT> cases[] = {
         {Format(CF_UNICODETEXT), S_OK},
         {Format(CF_UNICODETEXT, 0xFFFFFFFF), S_OK},
         {Format(CF_HDROP), DV_E_FORMATETC},
@@ -107,11 +103,11 @@ TEST_F(DataObjectTest, AnswersWhichFormatsAndMediaItHolds) {
         {Format(CF_UNICODETEXT, TYMED_HGLOBAL, DVASPECT_ICON), DV_E_DVASPECT},
         {Format(CF_UNICODETEXT, TYMED_HGLOBAL, DVASPECT_CONTENT, 0), DV_E_LINDEX},
     };
-    for (Case& c : cases) {
-        EXPECT_EQ(data_->QueryGetData(&c.format), c.expected) << c.format.cfFormat << " " << c.format.tymed;
+    for (auto& [format, expected] : cases) {
+        EXPECT_EQ(data_->QueryGetData(&format), expected) << format.cfFormat << " " << format.tymed;
         STGMEDIUM medium{};
-        HRESULT hr = data_->GetData(&c.format, &medium);
-        EXPECT_EQ(hr, c.expected);
+        HRESULT hr = data_->GetData(&format, &medium);
+        EXPECT_EQ(hr, expected);
         if (SUCCEEDED(hr))
             ReleaseStgMedium(&medium);
     }
@@ -163,8 +159,7 @@ TEST_F(DataObjectTest, CarriesDroppedFilesAndSharedStreams) {
     EXPECT_STREQ(name, L"two.avi");
     ReleaseStgMedium(&medium);
 
-    ComPtr<IStream> stream;
-    ASSERT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
+    ComPtr<IStream> stream = ut::test::StreamOf();
     ut::test::RefTracker references;
     references.Track(stream.Get(), 1, "stream");
     FORMATETC streamed = Format(CF_TEXT, TYMED_ISTREAM);
@@ -181,8 +176,7 @@ TEST_F(DataObjectTest, CarriesDroppedFilesAndSharedStreams) {
 
 // A medium with a releaser gives the releaser back its reference and leaves the rest alone.
 TEST(StgMedium, AReleaserTakesTheMediumsPlace) {
-    ComPtr<IStream> keeper;
-    ASSERT_EQ(ut::platform::CreateMemoryStream(keeper.Put()), S_OK);
+    ComPtr<IStream> keeper = ut::test::StreamOf();
     ut::test::RefTracker references;
     references.Track(keeper.Get(), 1, "keeper");
     HGLOBAL block = GlobalAlloc(GMEM_MOVEABLE, 4);

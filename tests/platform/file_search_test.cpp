@@ -46,13 +46,10 @@ TEST(FileSearch, FindsOneEntryByNameAndListsAFoldersMatches) {
         {temp.Path(), {{temp.Path().substr(temp.Path().find_last_of(L"/\\") + 1), true, 0}}},
         {temp.Path(L"*.avi"), {{L"a.avi", false, 5}, {L"b.avi", false, 0}}},
         {temp.Path(L"?.txt"), {{L"c.txt", false, 1}}},
-        {temp.Path(L"*"),
-         {{L".", true, 0},
-          {L"..", true, 0},
-          {L"a.avi", false, 5},
-          {L"b.avi", false, 0},
-          {L"c.txt", false, 1},
-          {L"sub", true, 0}}},
+        // clang-format off
+        {temp.Path(L"*"), {{L".", true, 0}, {L"..", true, 0}, {L"a.avi", false, 5}, {L"b.avi", false, 0},
+                           {L"c.txt", false, 1}, {L"sub", true, 0}}},
+        // clang-format on
         {temp.Path(L"*.mov"), {}},
         {temp.Path(L"missing"), {}},
         {temp.Path(L"missing") + L"/*", {}},

@@ -1,9 +1,12 @@
 // Temporary names, file search, deletion, access tests and path splitting, alike on both homes.
 #include <algorithm>
+#include <array>
 #include <cwctype>
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <tuple>
+#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -71,16 +74,13 @@ TEST(Files, DeletingAndAccessFollowTheSystemsAnswers) {
                                                std::filesystem::perms::group_read |
                                                std::filesystem::perms::others_read);
     std::filesystem::path missing = folder.Root() / "missing.bin";
-    struct Case {
-        std::filesystem::path path;
-        int mode;
-        int expected;
-    } cases[] = {
+    const std::tuple<std::filesystem::path, int, int> cases[] = {
+        // path, mode, answer
         {file, 0, 0},     {file, 2, 0},      {file, 4, 0},      {file, 6, 0},     {readOnly, 0, 0},
         {readOnly, 4, 0}, {readOnly, 2, -1}, {readOnly, 6, -1}, {missing, 0, -1}, {folder.Root(), 0, 0},
     };
-    for (const Case& c : cases)
-        EXPECT_EQ(_waccess(c.path.wstring().c_str(), c.mode), c.expected) << c.path << " mode " << c.mode;
+    for (const auto& [path, mode, expected] : cases)
+        EXPECT_EQ(_waccess(path.wstring().c_str(), mode), expected) << path << " mode " << mode;
 
     EXPECT_TRUE(DeleteFileW(file.wstring().c_str()));
     EXPECT_FALSE(std::filesystem::exists(file));
@@ -90,29 +90,19 @@ TEST(Files, DeletingAndAccessFollowTheSystemsAnswers) {
 }
 
 TEST(Files, SplitsPathsIntoDriveFolderNameAndExtension) {
-    struct Case {
-        const wchar_t* path;
-        const wchar_t* drive;
-        const wchar_t* dir;
-        const wchar_t* name;
-        const wchar_t* extension;
-    } cases[] = {
-        {L"C:\\dir\\sub\\name.ext", L"C:", L"\\dir\\sub\\", L"name", L".ext"},
-        {L"name", L"", L"", L"name", L""},
-        {L"dir/a.b.c", L"", L"dir/", L"a.b", L".c"},
-        {L"dir\\.hidden", L"", L"dir\\", L"", L".hidden"},
-        {L"C:", L"C:", L"", L"", L""},
-        {L"dir\\", L"", L"dir\\", L"", L""},
-        {L"a.dir\\name", L"", L"a.dir\\", L"name", L""},
-        {L"", L"", L"", L"", L""},
+    using Parts = std::array<std::wstring, 4>; // drive, folder, name, extension
+    const std::pair<const wchar_t*, Parts> cases[] = {
+        // clang-format off
+        {L"C:\\dir\\sub\\name.ext", {L"C:", L"\\dir\\sub\\", L"name", L".ext"}}, {L"name", {L"", L"", L"name", L""}},
+        {L"dir/a.b.c", {L"", L"dir/", L"a.b", L".c"}}, {L"dir\\.hidden", {L"", L"dir\\", L"", L".hidden"}},
+        {L"C:", {L"C:", L"", L"", L""}}, {L"dir\\", {L"", L"dir\\", L"", L""}},
+        {L"a.dir\\name", {L"", L"a.dir\\", L"name", L""}}, {L"", {L"", L"", L"", L""}},
+        // clang-format on
     };
-    for (const Case& c : cases) {
+    for (const auto& [path, expected] : cases) {
         wchar_t drive[_MAX_DRIVE], dir[_MAX_DIR], name[_MAX_FNAME], extension[_MAX_EXT];
-        _wsplitpath(c.path, drive, dir, name, extension);
-        EXPECT_STREQ(drive, c.drive) << c.path;
-        EXPECT_STREQ(dir, c.dir) << c.path;
-        EXPECT_STREQ(name, c.name) << c.path;
-        EXPECT_STREQ(extension, c.extension) << c.path;
+        _wsplitpath(path, drive, dir, name, extension);
+        EXPECT_EQ((Parts{drive, dir, name, extension}), expected) << path;
     }
     wchar_t extension[_MAX_EXT];
     _wsplitpath(L"only\\the.ext", nullptr, nullptr, nullptr, extension);

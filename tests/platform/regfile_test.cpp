@@ -36,6 +36,7 @@ protected:
     ScratchKey scratch_;
 };
 
+// Unknown roots and missing keys are refused.
 TEST_F(RegFile, ExportImportsBackUnchanged) {
     const wchar_t* keys[] = {L"export", L"export\\sub key \"q\" \u00c4", L"export\\Stra\u00dfe\\deeper",
                              L"export\\empty"};
@@ -48,6 +49,8 @@ TEST_F(RegFile, ExportImportsBackUnchanged) {
     }
     const std::wstring top = scratch_.FullPath() + L"\\export";
     std::string first, second;
+    EXPECT_EQ(ExportRegFile(L"HKEY_NOWHERE\\Software", first), ERROR_BAD_PATHNAME);
+    EXPECT_EQ(ExportRegFile((top + L"\\missing").c_str(), first), ERROR_FILE_NOT_FOUND);
     ASSERT_EQ(ExportRegFile(top.c_str(), first), ERROR_SUCCESS);
     std::wstring text = DecodeExport(first);
     EXPECT_EQ(
@@ -70,12 +73,6 @@ TEST_F(RegFile, ExportImportsBackUnchanged) {
             EXPECT_EQ(value.data, filled(path) ? sample.data : Bytes()) << Narrow(sample.name);
         }
     }
-}
-
-TEST_F(RegFile, ExportRefusesUnknownRootsAndMissingKeys) {
-    std::string bytes;
-    EXPECT_EQ(ExportRegFile(L"HKEY_NOWHERE\\Software", bytes), ERROR_BAD_PATHNAME);
-    EXPECT_EQ(ExportRegFile((scratch_.FullPath() + L"\\missing").c_str(), bytes), ERROR_FILE_NOT_FOUND);
 }
 
 TEST_F(RegFile, ImportReadsEveryForm) {
@@ -137,36 +134,22 @@ TEST_F(RegFile, ImportReadsEveryEncoding) {
 }
 
 TEST_F(RegFile, MalformedInputIsRefusedWithItsLineAndNothingApplied) {
-    struct Case {
-        std::string line; // line 5, after a key and a value that are valid
-        unsigned expectedLine;
-    };
-    const Case cases[] = {
-        {"\"v\"=hex:0g", 5},
-        {"\"v\"=hex:1,2", 5},
-        {"\"v\"=hex(zz):00", 5},
-        {"\"v\"=hex", 5},
-        {"\"v\"=dword:123456789", 5},
-        {"\"v\"=dword:", 5},
-        {"\"v\"=\"unknown \\q escape\"", 5},
-        {"\"v\"=\"not closed", 5},
-        {"\"v\"=\"x\" trailing", 5},
-        {"\"v\" \"x\"", 5},
-        {"\"v\"=str:x", 5},
-        {"just words", 5},
-        {"[HKEY_NOWHERE\\x]", 5},
-        {"[$\\no bracket", 5},
-        {"[-HKEY_CURRENT_USER]", 5},
-        {"[-$\\gone]\n\"after\"=\"a deletion\"", 6},
-        {"\"v\"=hex:01,\\", 6},
-    };
-    for (const Case& c : cases) {
-        SCOPED_TRACE(c.line);
+    // Each row is line 5, after a key and a value that are valid; the problem is on the line given.
+    // clang-format off
+    const std::pair<std::string, unsigned> cases[] = {
+        {"\"v\"=hex:0g", 5}, {"\"v\"=hex:1,2", 5}, {"\"v\"=hex(zz):00", 5}, {"\"v\"=hex", 5},
+        {"\"v\"=dword:123456789", 5}, {"\"v\"=dword:", 5}, {"\"v\"=\"unknown \\q escape\"", 5},
+        {"\"v\"=\"not closed", 5}, {"\"v\"=\"x\" trailing", 5}, {"\"v\" \"x\"", 5}, {"\"v\"=str:x", 5},
+        {"just words", 5}, {"[HKEY_NOWHERE\\x]", 5}, {"[$\\no bracket", 5}, {"[-HKEY_CURRENT_USER]", 5},
+        {"[-$\\gone]\n\"after\"=\"a deletion\"", 6}, {"\"v\"=hex:01,\\", 6}};
+    // clang-format on
+    for (const auto& [line, expectedLine] : cases) {
+        SCOPED_TRACE(line);
         RegFileProblem problem;
         std::string text =
-            "Windows Registry Editor Version 5.00\n\n[$\\first]\n\"ok\"=\"yes\"\n" + c.line + "\n";
+            "Windows Registry Editor Version 5.00\n\n[$\\first]\n\"ok\"=\"yes\"\n" + line + "\n";
         EXPECT_EQ(Import(text, &problem), ERROR_INVALID_DATA);
-        EXPECT_EQ(problem.line, c.expectedLine);
+        EXPECT_EQ(problem.line, expectedLine);
         EXPECT_FALSE(problem.message.empty());
         EXPECT_FALSE(OpenKey(scratch_.Get(), L"first"));
     }

@@ -132,8 +132,8 @@ TEST(RegistryStore, AKilledWriterLosesNothingThatHadReturned) {
 }
 
 TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
-    ut::test::TempFolder temp;
-    const fs::path folder = temp.Path();
+    TempFolder temp;
+    const fs::path& folder = temp.Root();
     fs::path store = folder / "store.db";
     {
         StoreSwitch use(store);
@@ -143,16 +143,16 @@ TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
     }
     // The folder stays open to everyone, so that the reader can keep its shared index there.
     ASSERT_EQ(chmod(folder.c_str(), 01777) | chmod(store.c_str(), 0444), 0);
-    std::string before = ut::test::FileContent(store);
+    std::string before = FileContent(store);
     Child probe("probe 'Software\\ut-tests\\read-only'", store.string());
     EXPECT_EQ(probe.Line().value_or("no output"), "read=0 create=5 set=5 delete=5");
     EXPECT_EQ(probe.Wait(), 0);
-    EXPECT_EQ(ut::test::FileContent(store), before);
+    EXPECT_EQ(FileContent(store), before);
 }
 
 TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
-    ut::test::TempFolder temp;
-    const fs::path folder = temp.Path();
+    TempFolder temp;
+    const fs::path& folder = temp.Root();
     auto sql = [](const fs::path& path, const char* statements) {
         sqlite3* db = nullptr;
         sqlite3_open(path.c_str(), &db);
@@ -183,7 +183,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
         {"a damaged store",
          [&](const fs::path& path) {
              store(path);
-             std::string bytes = ut::test::FileContent(path);
+             std::string bytes = FileContent(path);
              std::fill(bytes.begin() + 4096, bytes.end(), 'Z');
              WriteFile(path, bytes);
          }},
@@ -192,7 +192,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
         SCOPED_TRACE(label);
         fs::path path = folder / (std::string(label) + ".db");
         make(path);
-        std::string before = ut::test::FileContent(path);
+        std::string before = FileContent(path);
         {
             StoreSwitch use(path);
             testing::internal::CaptureStderr();
@@ -204,7 +204,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
             EXPECT_NE(said.find(path.string()), std::string::npos) << said;
             EXPECT_EQ(said.find("ut registry"), said.rfind("ut registry")) << said;
         }
-        EXPECT_EQ(ut::test::FileContent(path), before);
+        EXPECT_EQ(FileContent(path), before);
     }
 }
 
@@ -220,8 +220,8 @@ TEST(RegistryStore, LivesWhereTheEnvironmentSaysAndMakesItsFolders) {
         Variable a("UT_REGISTRY", named), b("XDG_DATA_HOME", data), c("HOME", home);
         EXPECT_EQ(ut::platform::RegistryStorePath(), expected);
     }
-    ut::test::TempFolder temp;
-    const fs::path folder = temp.Path();
+    TempFolder temp;
+    const fs::path& folder = temp.Root();
     Variable data("XDG_DATA_HOME", folder.c_str());
     {
         StoreSwitch use(""); // the default place
@@ -258,8 +258,8 @@ TEST(RegistryStore, ReadsCostTheSameAtEveryStepAndNothingUntilAnotherProcessComm
     EXPECT_EQ(name(L"key100005").data, TextBytes(L"name 5"));
     EXPECT_EQ(ut::platform::GetRegistryStoreCounters().statements, statements);
 
-    ut::test::TempFolder temp;
-    const fs::path folder = temp.Path();
+    TempFolder temp;
+    const fs::path& folder = temp.Root();
     std::string path = Narrow(scratch.FullPath()) + "\\hundred";
     WriteFile(folder / "change.reg", "Windows Registry Editor Version 5.00\n\n[" + path +
                                          "\\key100005]\n\"Name\"=\"changed\"\n[-" + path + "\\key100006]\n[" +

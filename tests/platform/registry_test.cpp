@@ -176,17 +176,13 @@ TEST_F(Registry, CallsAnswerTheSystemsCodes) {
 }
 
 TEST_F(Registry, NamesAreCaseInsensitiveAndKeepTheirFirstCase) {
+    // clang-format off
     const std::tuple<const wchar_t*, const wchar_t*, bool> cases[] = {
-        {L"MixedCase", L"mixedcase", true},
-        {L"MixedCase", L"MIXEDCASE", true},
-        {L"\u00c4pfel", L"\u00e4PFEL", true},
-        {L"\u00e9clair", L"\u00c9CLAIR", true},
-        {L"\u00ffe", L"\u0178E", true},
-        {L"\u041c\u0438\u0440", L"\u041c\u0418\u0420", true},
-        {L"Stra\u00dfe", L"STRASSE", false},
-        {L"\u00df", L"\u1e9e", false}, // ß, ẞ
-        {L"a", L"\u00e0", false},
-    };
+        {L"MixedCase", L"mixedcase", true}, {L"MixedCase", L"MIXEDCASE", true}, {L"\u00c4pfel", L"\u00e4PFEL", true},
+        {L"\u00e9clair", L"\u00c9CLAIR", true}, {L"\u00ffe", L"\u0178E", true},
+        {L"\u041c\u0438\u0440", L"\u041c\u0418\u0420", true}, {L"Stra\u00dfe", L"STRASSE", false},
+        {L"\u00df", L"\u1e9e", false}, /* ß, ẞ */ {L"a", L"\u00e0", false}};
+    // clang-format on
     for (const auto& [created, opened, same] : cases) {
         SCOPED_TRACE(Narrow(created) + " / " + Narrow(opened));
         UniqueHKey parent = CreateKey(Scratch(), L"case");

@@ -3,8 +3,6 @@
 #include <chrono>
 #include <csignal>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <string>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -21,22 +19,17 @@
 
 namespace {
 
+using namespace ut::test;
 using ut::ComPtr;
-using ut::test::ElementsOf;
-using ut::test::kCreateMode;
-using ut::test::kElementMode;
-using ut::test::kReadMode;
-using ut::test::Pattern;
-using ut::test::PutStream;
-using ut::test::ReadStream;
-using ut::test::TempFolder;
-
-void WriteAll(const std::filesystem::path& path, const std::string& bytes) {
-    std::ofstream(path, std::ios::binary | std::ios::trunc) << bytes;
-}
 
 HRESULT Open(const std::wstring& path, ComPtr<IStorage>& storage, DWORD mode = kReadMode) {
     return StgOpenStorage(path.c_str(), nullptr, mode, nullptr, 0, storage.Put());
+}
+
+ComPtr<IStorage> Created(const std::wstring& path) {
+    ComPtr<IStorage> storage;
+    EXPECT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, storage.Put()), S_OK);
+    return storage;
 }
 
 // The bytes of a compound file, with the places a test damages found by name.
@@ -50,13 +43,10 @@ public:
             value = value << 8 | static_cast<std::uint8_t>(bytes_[at + i]);
         return value;
     }
-    void Put32(std::size_t at, std::uint32_t value) {
-        for (int i = 0; i < 4; ++i)
+    // Writes the `size` low bytes of `value`, little-endian.
+    void Put(std::size_t at, std::uint32_t value, int size = 4) {
+        for (int i = 0; i < size; ++i)
             bytes_[at + i] = static_cast<char>(value >> (8 * i));
-    }
-    void Put16(std::size_t at, std::uint16_t value) {
-        bytes_[at] = static_cast<char>(value);
-        bytes_[at + 1] = static_cast<char>(value >> 8);
     }
     // The directory entry named `name`: entries are 128 bytes, aligned, after the header.
     std::size_t Entry(const std::string& name) const {
@@ -70,8 +60,10 @@ public:
         ADD_FAILURE() << "no entry " << name;
         return 0;
     }
-    // The FAT slot of `sector`, in the first FAT sector.
-    std::size_t FatSlot(std::uint32_t sector) const { return (Get32(76) + 1) * 512 + 4 * sector; }
+    // The FAT slot of the first sector of `name`'s chain, in the first FAT sector.
+    std::size_t FirstFatSlot(const std::string& name) const {
+        return (Get32(76) + 1) * 512 + 4 * Get32(Entry(name) + 116);
+    }
 
     std::string& Bytes() { return bytes_; }
 
@@ -83,56 +75,46 @@ private:
 std::string SampleBytes(const TempFolder& folder) {
     std::wstring path = folder / L"good.cfb";
     {
-        ComPtr<IStorage> root;
-        EXPECT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+        ComPtr<IStorage> root = Created(path), sub;
         EXPECT_EQ(PutStream(root.Get(), L"big", Pattern(8192, 1)), S_OK);
         EXPECT_EQ(PutStream(root.Get(), L"small", Pattern(100, 2)), S_OK);
-        ComPtr<IStorage> sub;
         EXPECT_EQ(root->CreateStorage(L"sub", kElementMode, 0, 0, sub.Put()), S_OK);
         EXPECT_EQ(PutStream(sub.Get(), L"in", "x"), S_OK);
     }
-    return ut::test::FileContent(folder.Root() / "good.cfb");
+    return FileContent(path);
 }
+
+// What opening the file, then reading "big" and "small" whole, answers.
+enum Step { kOpen, kReadBig, kReadSmall };
 
 struct Damage {
     const char* what;
+    Step fails;
+    HRESULT code;
     void (*apply)(RawFile& file);
-    HRESULT open;    // from StgOpenStorage
-    HRESULT readBig; // reading "big" when the open succeeds
-    HRESULT readSmall;
 };
 
+// clang-format off
 const Damage kDamages[] = {
-    {"byte order", [](RawFile& f) { f.Put16(28, 0x1234); }, STG_E_INVALIDHEADER, S_OK, S_OK},
-    {"sector shift", [](RawFile& f) { f.Put16(30, 20); }, STG_E_INVALIDHEADER, S_OK, S_OK},
-    {"major version", [](RawFile& f) { f.Put16(26, 7); }, STG_E_INVALIDHEADER, S_OK, S_OK},
-    {"mini sector shift", [](RawFile& f) { f.Put16(32, 7); }, STG_E_INVALIDHEADER, S_OK, S_OK},
-    {"FAT count past the file", [](RawFile& f) { f.Put32(44, 0x7FFFFFFF); }, STG_E_DOCFILECORRUPT, S_OK,
-     S_OK},
-    {"directory past the file", [](RawFile& f) { f.Put32(48, 0x00FFFFFF); }, STG_E_DOCFILECORRUPT, S_OK,
-     S_OK},
-    {"truncated", [](RawFile& f) { f.Bytes().resize(1024); }, STG_E_DOCFILECORRUPT, S_OK, S_OK},
-    {"sibling back to the root", [](RawFile& f) { f.Put32(f.Entry("small") + 72, 0); }, STG_E_DOCFILECORRUPT,
-     S_OK, S_OK},
-    {"sibling past the directory", [](RawFile& f) { f.Put32(f.Entry("small") + 72, 5000); },
-     STG_E_DOCFILECORRUPT, S_OK, S_OK},
-    {"odd name length", [](RawFile& f) { f.Put16(f.Entry("small") + 64, 7); }, STG_E_DOCFILECORRUPT, S_OK,
-     S_OK},
-    {"unknown type", [](RawFile& f) { f.Bytes()[f.Entry("small") + 66] = 9; }, STG_E_DOCFILECORRUPT, S_OK,
-     S_OK},
-    {"stream with elements", [](RawFile& f) { f.Put32(f.Entry("small") + 76, 0); }, STG_E_DOCFILECORRUPT,
-     S_OK, S_OK},
-    {"stream larger than the file", [](RawFile& f) { f.Put32(f.Entry("big") + 120, 0x7FFFFFF0); }, S_OK,
-     STG_E_DOCFILECORRUPT, S_OK},
-    {"chain in a loop",
-     [](RawFile& f) { f.Put32(f.FatSlot(f.Get32(f.Entry("big") + 116)), f.Get32(f.Entry("big") + 116)); },
-     S_OK, STG_E_DOCFILECORRUPT, S_OK},
-    {"chain into a free sector",
-     [](RawFile& f) { f.Put32(f.FatSlot(f.Get32(f.Entry("big") + 116)), 0xFFFFFFFF); }, S_OK,
-     STG_E_DOCFILECORRUPT, S_OK},
-    {"mini chain past the mini stream", [](RawFile& f) { f.Put32(f.Entry("small") + 116, 10000); }, S_OK,
-     S_OK, STG_E_DOCFILECORRUPT},
+    {"byte order", kOpen, STG_E_INVALIDHEADER, [](RawFile& f) { f.Put(28, 0x1234, 2); }},
+    {"sector shift", kOpen, STG_E_INVALIDHEADER, [](RawFile& f) { f.Put(30, 20, 2); }},
+    {"major version", kOpen, STG_E_INVALIDHEADER, [](RawFile& f) { f.Put(26, 7, 2); }},
+    {"mini sector shift", kOpen, STG_E_INVALIDHEADER, [](RawFile& f) { f.Put(32, 7, 2); }},
+    {"FAT count past the file", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(44, 0x7FFFFFFF); }},
+    {"directory past the file", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(48, 0x00FFFFFF); }},
+    {"truncated", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Bytes().resize(1024); }},
+    {"sibling back to the root", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 72, 0); }},
+    {"sibling past the directory", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 72, 5000); }},
+    {"odd name length", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 64, 7, 2); }},
+    {"unknown type", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Bytes()[f.Entry("small") + 66] = 9; }},
+    {"stream with elements", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 76, 0); }},
+    {"stream larger than the file", kReadBig, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("big") + 120, 0x7FFFFFF0); }},
+    {"chain in a loop", kReadBig, STG_E_DOCFILECORRUPT,
+     [](RawFile& f) { f.Put(f.FirstFatSlot("big"), f.Get32(f.Entry("big") + 116)); }},
+    {"chain into a free sector", kReadBig, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.FirstFatSlot("big"), 0xFFFFFFFF); }},
+    {"mini chain past the mini stream", kReadSmall, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 116, 10000); }},
 };
+// clang-format on
 
 HRESULT ReadResult(IStorage* root, const wchar_t* name) {
     ComPtr<IStream> stream;
@@ -150,24 +132,23 @@ TEST(StoragePosix, DamagedFilesAreRefusedWithTheSystemsCodes) {
     TempFolder folder;
     std::string good = SampleBytes(folder);
     ASSERT_GT(good.size(), 2048u);
-    std::wstring path = folder / L"damaged.cfb";
     for (const Damage& damage : kDamages) {
         RawFile file(good);
         damage.apply(file);
-        WriteAll(std::filesystem::path(path), file.Bytes());
         ComPtr<IStorage> root;
-        ASSERT_EQ(Open(path, root), damage.open) << damage.what;
+        auto expected = [&](Step step) { return damage.fails == step ? damage.code : S_OK; };
+        ASSERT_EQ(Open(folder.Write(L"damaged.cfb", file.Bytes()), root), expected(kOpen)) << damage.what;
         if (!root)
             continue;
-        EXPECT_EQ(ReadResult(root.Get(), L"big"), damage.readBig) << damage.what;
-        EXPECT_EQ(ReadResult(root.Get(), L"small"), damage.readSmall) << damage.what;
+        EXPECT_EQ(ReadResult(root.Get(), L"big"), expected(kReadBig)) << damage.what;
+        EXPECT_EQ(ReadResult(root.Get(), L"small"), expected(kReadSmall)) << damage.what;
     }
 }
 
 TEST(StoragePosix, NamesTheSystemForbidsAreRefused) {
     TempFolder folder;
-    ComPtr<IStorage> root;
-    ASSERT_EQ(StgCreateDocfile((folder / L"names.cfb").c_str(), kCreateMode, 0, root.Put()), S_OK);
+    ComPtr<IStorage> root = Created(folder / L"names.cfb");
+    ASSERT_TRUE(root);
     for (const wchar_t* name : {L"x/y", L"x\\y", L"x:y", L"x!y", L""}) {
         ComPtr<IStream> stream;
         EXPECT_EQ(root->CreateStream(name, kElementMode, 0, 0, stream.Put()), STG_E_INVALIDNAME) << name;
@@ -185,10 +166,9 @@ TEST(StoragePosix, StateBitsTimesAndClassIdsRoundTrip) {
     const FILETIME created{0x11111111, 0x01D00000};
     const FILETIME modified{0x22222222, 0x01D10000};
     {
-        ComPtr<IStorage> root;
-        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+        ComPtr<IStorage> root = Created(path), sub;
+        ASSERT_TRUE(root);
         ASSERT_EQ(root->SetStateBits(0xF0F0, 0xFFFF), S_OK);
-        ComPtr<IStorage> sub;
         ASSERT_EQ(root->CreateStorage(L"sub", kElementMode, 0, 0, sub.Put()), S_OK);
         ASSERT_EQ(sub->SetClass(kClass), S_OK);
         ASSERT_EQ(sub->SetStateBits(0x5, 0xF), S_OK);
@@ -220,8 +200,8 @@ TEST(StoragePosix, ManyElementsInOneStorageReadBack) {
     std::wstring path = folder / L"many.cfb";
     constexpr int kCount = 5000;
     {
-        ComPtr<IStorage> root;
-        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
+        ComPtr<IStorage> root = Created(path);
+        ASSERT_TRUE(root);
         for (int i = 0; i < kCount; ++i)
             ASSERT_EQ(PutStream(root.Get(), (L"s" + std::to_wstring(i)).c_str(), std::to_string(i)), S_OK);
     }
@@ -234,10 +214,7 @@ TEST(StoragePosix, ManyElementsInOneStorageReadBack) {
 TEST(StoragePosix, CommitsKeepPermissionsAndLeaveNothingBeside) {
     TempFolder folder;
     std::wstring path = folder / L"kept.cfb";
-    {
-        ComPtr<IStorage> root;
-        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
-    }
+    ASSERT_TRUE(Created(path));
     std::filesystem::path file(path);
     std::filesystem::permissions(file, std::filesystem::perms(0640));
     {
@@ -247,8 +224,7 @@ TEST(StoragePosix, CommitsKeepPermissionsAndLeaveNothingBeside) {
         ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
     }
     EXPECT_EQ(std::filesystem::status(file).permissions(), std::filesystem::perms(0640));
-    auto entries = std::distance(std::filesystem::directory_iterator(folder.Root()), {});
-    EXPECT_EQ(entries, 1);
+    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(folder.Root()), {}), 1);
 }
 
 // The bytes the system itself wrote: a class id, streams large and small, an empty one, and a
@@ -260,17 +236,17 @@ TEST(StoragePosix, ReadsWhatTheSystemWrites) {
     ASSERT_EQ(Open(path, root), S_OK);
     constexpr CLSID kRoot = {0x12345678, 0x9ABC, 0xDEF0, {1, 2, 3, 4, 5, 6, 7, 8}};
     constexpr CLSID kSub = {0xAABBCCDD, 0x1122, 0x3344, {9, 8, 7, 6, 5, 4, 3, 2}};
-    EXPECT_TRUE(IsEqualGUID(ut::test::ClassOf(root.Get()), kRoot));
-    std::vector<ut::test::Element> expected = {{L"Big", STGTY_STREAM, 10000},
-                                               {L"Sub", STGTY_STORAGE, 0},
-                                               {L"Empty", STGTY_STREAM, 0},
-                                               {L"Contents", STGTY_STREAM, 100}};
+    EXPECT_TRUE(IsEqualGUID(ClassOf(root.Get()), kRoot));
+    std::vector<Element> expected = {{L"Big", STGTY_STREAM, 10000},
+                                     {L"Sub", STGTY_STORAGE, 0},
+                                     {L"Empty", STGTY_STREAM, 0},
+                                     {L"Contents", STGTY_STREAM, 100}};
     EXPECT_EQ(ElementsOf(root.Get()), expected);
     EXPECT_EQ(ReadStream(root.Get(), L"Big"), Pattern(10000, 2));
     EXPECT_EQ(ReadStream(root.Get(), L"Contents"), Pattern(100, 1));
     ComPtr<IStorage> sub;
     ASSERT_EQ(root->OpenStorage(L"Sub", nullptr, kReadMode, nullptr, 0, sub.Put()), S_OK);
-    EXPECT_TRUE(IsEqualGUID(ut::test::ClassOf(sub.Get()), kSub));
+    EXPECT_TRUE(IsEqualGUID(ClassOf(sub.Get()), kSub));
     EXPECT_EQ(ReadStream(sub.Get(), L"Inner"), Pattern(5, 4));
 }
 
@@ -295,12 +271,8 @@ std::uintmax_t OpenFileSizeIn(pid_t pid, const std::filesystem::path& folder, co
 TEST(StoragePosix, AWriterKilledWhileWritingLeavesTheOldFileIntactAndNothingBeside) {
     TempFolder folder;
     std::wstring path = folder / L"crash.cfb";
-    {
-        ComPtr<IStorage> root;
-        ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode, 0, root.Put()), S_OK);
-        ASSERT_EQ(PutStream(root.Get(), L"old", Pattern(1000, 1)), S_OK);
-    }
-    std::string before = ut::test::FileContent(std::filesystem::path(path));
+    ASSERT_EQ(PutStream(Created(path).Get(), L"old", Pattern(1000, 1)), S_OK);
+    std::string before = FileContent(std::filesystem::path(path));
     pid_t writer = ::fork();
     ASSERT_GE(writer, 0);
     if (writer == 0) {
@@ -327,7 +299,7 @@ TEST(StoragePosix, AWriterKilledWhileWritingLeavesTheOldFileIntactAndNothingBesi
     ::waitpid(writer, &status, 0);
     ASSERT_TRUE(caught) << "the writer never started the next file";
     EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
-    std::string after = ut::test::FileContent(std::filesystem::path(path));
+    std::string after = FileContent(std::filesystem::path(path));
     ComPtr<IStorage> root;
     ASSERT_EQ(Open(path, root), S_OK);
     EXPECT_EQ(ReadStream(root.Get(), L"old"), Pattern(1000, 1));

@@ -7,6 +7,7 @@
 #include <random>
 #include <string>
 #include <sys/resource.h>
+#include <tuple>
 
 #include <gtest/gtest.h>
 
@@ -18,12 +19,8 @@
 
 namespace {
 
+using namespace ut::test;
 using ut::ComPtr;
-using ut::test::kCreateMode;
-using ut::test::kElementMode;
-using ut::test::PutStream;
-using ut::test::ReadStream;
-using ut::test::TempFolder;
 
 constexpr DWORD kTransacted = STGM_TRANSACTED | STGM_READWRITE | STGM_SHARE_EXCLUSIVE;
 
@@ -63,35 +60,14 @@ public:
     Model(Home& home, unsigned seed) : home_(home), random_(seed) {}
 
     void Run(int steps) {
+        // Each action's share of the steps is its number of places here.
+        static constexpr void (Model::*kActions[])() = {
+            &Model::Write, &Model::Write,   &Model::Write,  &Model::Resize, &Model::Read,
+            &Model::Read,  &Model::Destroy, &Model::Commit, &Model::Revert, &Model::Reopen};
         ASSERT_EQ(home_.Create(root_), S_OK);
         for (int step = 0; step < steps && !::testing::Test::HasFailure(); ++step) {
             SCOPED_TRACE(step);
-            switch (Below(10)) {
-            case 0:
-            case 1:
-            case 2:
-                Write();
-                break;
-            case 3:
-                Resize();
-                break;
-            case 4:
-            case 5:
-                Read();
-                break;
-            case 6:
-                Destroy();
-                break;
-            case 7:
-                Commit();
-                break;
-            case 8:
-                Revert();
-                break;
-            default:
-                Reopen();
-                break;
-            }
+            (this->*kActions[Below(std::size(kActions))])();
         }
         Reopen();
     }
@@ -99,16 +75,10 @@ public:
 private:
     std::size_t Below(std::size_t n) { return std::uniform_int_distribution<std::size_t>(0, n - 1)(random_); }
     std::wstring Pick() { return L"s" + std::to_wstring(Below(4)); }
-
+    // A few bytes, a few KiB, or more than a gathered stretch.
     std::size_t Length() {
-        switch (Below(3)) {
-        case 0:
-            return 1 + Below(16);
-        case 1:
-            return 100 + Below(6000);
-        default:
-            return 60000 + Below(10000);
-        }
+        std::size_t kind = Below(3);
+        return kind == 0 ? 1 + Below(16) : kind == 1 ? 100 + Below(6000) : 60000 + Below(10000);
     }
 
     IStream* Held(const std::wstring& name) {
@@ -204,7 +174,7 @@ private:
         Commit();
         held_.clear();
         ASSERT_EQ(home_.Open(root_), S_OK);
-        EXPECT_EQ(ut::test::ElementsOf(root_.Get()).size(), current_.size());
+        EXPECT_EQ(ElementsOf(root_.Get()).size(), current_.size());
         for (const auto& [name, bytes] : current_)
             EXPECT_TRUE(ReadStream(root_.Get(), name.c_str()) == bytes) << "stream of " << bytes.size();
     }
@@ -229,19 +199,15 @@ TEST(StorageSectors, RandomChangesReadBackBeforeAndAfterCommits) {
 
 // What a stream held before it shrank must not come back when it grows again.
 TEST(StorageSectors, AGrownStreamReadsZerosWhereItHadShrunk) {
-    struct Row {
-        const char* what;
-        ULONGLONG shrunk;
-        bool growByWriting; // else by SetSize
-    };
-    const Row rows[] = {
+    // What the row is, the size shrunk to, and whether it grows by a write (else by SetSize).
+    const std::tuple<const char*, ULONGLONG, bool> rows[] = {
         {"within a sector, grown by SetSize", 5000, false},
         {"within a sector, grown by a write past the end", 5000, true},
         {"below the mini-stream cutoff", 1000, false},
         {"to nothing", 0, true},
     };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.what);
+    for (const auto& [what, shrunk, growByWriting] : rows) {
+        SCOPED_TRACE(what);
         TempFolder folder;
         ComPtr<IStorage> root;
         ASSERT_EQ(StgCreateDocfile((folder / L"grow.cfb").c_str(), kCreateMode, 0, root.Put()), S_OK);
@@ -250,11 +216,11 @@ TEST(StorageSectors, AGrownStreamReadsZerosWhereItHadShrunk) {
         std::string content(100000, 'x');
         ASSERT_EQ(stream->Write(content.data(), static_cast<ULONG>(content.size()), nullptr), S_OK);
         ULARGE_INTEGER size{};
-        size.QuadPart = row.shrunk;
+        size.QuadPart = shrunk;
         ASSERT_EQ(stream->SetSize(size), S_OK);
-        content.resize(row.shrunk);
+        content.resize(shrunk);
         content.resize(20000, '\0');
-        if (row.growByWriting) {
+        if (growByWriting) {
             LARGE_INTEGER end{};
             end.QuadPart = 19999;
             ASSERT_EQ(stream->Seek(end, STREAM_SEEK_SET, nullptr), S_OK);
@@ -292,56 +258,52 @@ private:
 // A full disk fails the write or the commit that meets it with STG_E_MEDIUMFULL; the file
 // stays as it was, and once there is room again the same storage commits everything.
 TEST(StorageSectors, AFullDiskFailsOnlyTheCallItMeets) {
-    struct Row {
-        const char* what;
-        std::size_t pieceSize; // the new stream is written in pieces of this size
-        rlim_t limit;
-        bool writeFails; // else the commit fails
-    };
-    const Row rows[] = {
+    // What the row is, the size of the pieces the new stream is written in, the limit, and whether
+    // a write fails (else the commit).
+    const std::tuple<const char*, std::size_t, rlim_t, bool> rows[] = {
         {"a large write goes to the file at once", 1 << 20, 256 * 1024, true},
         {"gathered small writes meet it when they go", 1000, 256 * 1024, true},
         {"the commit's tables meet it", 1 << 20, (2 << 20) + 20000, false},
         {"the commit's copy of an unchanged stream meets it", 100, 4000, false},
     };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.what);
+    for (const auto& [what, pieceSize, limit, writeFails] : rows) {
+        SCOPED_TRACE(what);
         TempFolder folder;
         std::wstring path = folder / L"full.cfb";
         ComPtr<IStorage> root;
         ASSERT_EQ(StgCreateDocfile(path.c_str(), kCreateMode | STGM_TRANSACTED, 0, root.Put()), S_OK);
-        ASSERT_EQ(PutStream(root.Get(), L"old", ut::test::Pattern(5000, 1)), S_OK);
+        ASSERT_EQ(PutStream(root.Get(), L"old", Pattern(5000, 1)), S_OK);
         ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
-        std::string before = ut::test::FileContent(path);
+        std::string before = FileContent(path);
 
-        std::size_t total = row.pieceSize < 4096 && !row.writeFails ? 3000 : 2 << 20;
-        std::string content = ut::test::Pattern(total, 2);
+        std::size_t total = pieceSize < 4096 && !writeFails ? 3000 : 2 << 20;
+        std::string content = Pattern(total, 2);
         ComPtr<IStream> stream;
         ASSERT_EQ(root->CreateStream(L"new", kElementMode, 0, 0, stream.Put()), S_OK);
         HRESULT failed = S_OK;
         {
-            FullDisk disk(row.limit);
+            FullDisk disk(limit);
             std::size_t at = 0;
-            for (; at < total && SUCCEEDED(failed); at += row.pieceSize) {
-                std::size_t count = std::min(row.pieceSize, total - at);
+            for (; at < total && SUCCEEDED(failed); at += pieceSize) {
+                std::size_t count = std::min(pieceSize, total - at);
                 failed = stream->Write(content.data() + at, static_cast<ULONG>(count), nullptr);
             }
             if (SUCCEEDED(failed))
                 failed = root->Commit(STGC_DEFAULT);
             else
-                content.resize(at - row.pieceSize); // what the stream holds: the failed write left nothing
+                content.resize(at - pieceSize); // what the stream holds: the failed write left nothing
         }
         EXPECT_EQ(failed, STG_E_MEDIUMFULL);
         STATSTG stat{};
         ASSERT_EQ(stream->Stat(&stat, STATFLAG_NONAME), S_OK);
-        EXPECT_EQ(stat.cbSize.QuadPart, row.writeFails ? content.size() : total);
-        EXPECT_EQ(ut::test::FileContent(path), before) << "the file changed";
+        EXPECT_EQ(stat.cbSize.QuadPart, writeFails ? content.size() : total);
+        EXPECT_EQ(FileContent(path), before) << "the file changed";
         stream.Reset();
         ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
         root.Reset();
-        ASSERT_EQ(StgOpenStorage(path.c_str(), nullptr, ut::test::kReadMode, nullptr, 0, root.Put()), S_OK);
+        ASSERT_EQ(StgOpenStorage(path.c_str(), nullptr, kReadMode, nullptr, 0, root.Put()), S_OK);
         EXPECT_TRUE(ReadStream(root.Get(), L"new") == content);
-        EXPECT_EQ(ReadStream(root.Get(), L"old"), ut::test::Pattern(5000, 1));
+        EXPECT_EQ(ReadStream(root.Get(), L"old"), Pattern(5000, 1));
     }
 }
 

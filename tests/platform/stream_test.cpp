@@ -1,6 +1,4 @@
 // The memory and file streams must behave alike, and alike on both homes.
-#include <cstring>
-#include <filesystem>
 #include <string>
 #include <utility>
 
@@ -8,11 +6,13 @@
 
 #include <ut/platform/stream.h>
 
+#include "support/streams.h"
 #include "support/temp_folder.h"
 
 namespace {
 
 using ut::ComPtr;
+using ut::test::PositionOf;
 
 LARGE_INTEGER Offset(LONGLONG value) {
     LARGE_INTEGER offset;
@@ -20,12 +20,7 @@ LARGE_INTEGER Offset(LONGLONG value) {
     return offset;
 }
 
-ULONGLONG Position(IStream* stream) {
-    ULARGE_INTEGER position{};
-    EXPECT_EQ(stream->Seek(Offset(0), STREAM_SEEK_CUR, &position), S_OK);
-    return position.QuadPart;
-}
-
+// Reads from the start in small pieces, leaving the position at the end.
 std::string ReadAll(IStream* stream) {
     EXPECT_EQ(stream->Seek(Offset(0), STREAM_SEEK_SET, nullptr), S_OK);
     std::string out;
@@ -36,38 +31,27 @@ std::string ReadAll(IStream* stream) {
     return out;
 }
 
-std::wstring TempPath(const wchar_t* name) {
-    return (std::filesystem::temp_directory_path() / name).wstring();
-}
-
 enum class Kind { Memory, File };
 
 class StreamTest : public ::testing::TestWithParam<Kind> {
 protected:
     void SetUp() override {
-        if (GetParam() == Kind::Memory) {
-            ASSERT_EQ(ut::platform::CreateMemoryStream(stream_.Put()), S_OK);
-            return;
-        }
-        path_ = TempPath(L"ut_stream_test.bin");
-        ASSERT_EQ(ut::platform::OpenFileStream(path_.c_str(), STGM_READWRITE | STGM_CREATE, stream_.Put()),
+        ASSERT_EQ(GetParam() == Kind::Memory
+                      ? ut::platform::CreateMemoryStream(stream_.Put())
+                      : ut::platform::OpenFileStream((folder_ / L"stream.bin").c_str(),
+                                                     STGM_READWRITE | STGM_CREATE, stream_.Put()),
                   S_OK);
     }
-    void TearDown() override {
-        stream_.Reset();
-        if (!path_.empty())
-            std::filesystem::remove(path_);
-    }
 
+    ut::test::TempFolder folder_; // goes after the stream
     ComPtr<IStream> stream_;
-    std::wstring path_;
 };
 
 TEST_P(StreamTest, WritesReadsAndSeeks) {
     ULONG written = 0;
     ASSERT_EQ(stream_->Write("hello world", 11, &written), S_OK);
     EXPECT_EQ(written, 11u);
-    EXPECT_EQ(Position(stream_.Get()), 11u);
+    EXPECT_EQ(PositionOf(stream_.Get()), 11u);
     EXPECT_EQ(ReadAll(stream_.Get()), "hello world");
 
     ULARGE_INTEGER at{};
@@ -78,7 +62,7 @@ TEST_P(StreamTest, WritesReadsAndSeeks) {
     ASSERT_EQ(stream_->Read(word, 5, &got), S_OK);
     EXPECT_EQ(std::string(word, got), "world");
     ASSERT_EQ(stream_->Seek(Offset(-11), STREAM_SEEK_CUR, nullptr), S_OK);
-    EXPECT_EQ(Position(stream_.Get()), 0u);
+    EXPECT_EQ(PositionOf(stream_.Get()), 0u);
 
     // The system's file stream answers S_FALSE at the end; both homes answer S_OK, also far past it.
     char buffer[8];
@@ -95,7 +79,7 @@ TEST_P(StreamTest, RefusedSeeksAndNullPointersChangeNothing) {
     EXPECT_EQ(stream_->Seek(Offset(-4), STREAM_SEEK_CUR, nullptr), STG_E_INVALIDFUNCTION);
     EXPECT_EQ(stream_->Seek(Offset(-1), STREAM_SEEK_SET, nullptr), STG_E_INVALIDFUNCTION);
     EXPECT_EQ(stream_->Seek(Offset(0), 7, nullptr), STG_E_INVALIDFUNCTION);
-    EXPECT_EQ(Position(stream_.Get()), 3u);
+    EXPECT_EQ(PositionOf(stream_.Get()), 3u);
     ULONG count = 0;
     EXPECT_EQ(stream_->Read(nullptr, 1, &count), STG_E_INVALIDPOINTER);
     EXPECT_EQ(stream_->Write(nullptr, 1, &count), STG_E_INVALIDPOINTER);
@@ -113,15 +97,14 @@ TEST_P(StreamTest, GrowingPastTheEndFillsTheGapWithZeros) {
     size.QuadPart = 5000;
     ASSERT_EQ(stream_->Write("y", 1, nullptr), S_OK);
     ASSERT_EQ(stream_->SetSize(size), S_OK);
-    EXPECT_EQ(Position(stream_.Get()), 6u);
+    EXPECT_EQ(PositionOf(stream_.Get()), 6u);
     EXPECT_EQ(ReadAll(stream_.Get()), std::string("\0\0\0\0xy", 6) + std::string(4994, '\0'));
 }
 
 TEST_P(StreamTest, CopyToMovesTheRequestedBytesSetSizeTruncatesAndStatReportsTheSize) {
     ASSERT_EQ(stream_->Write("0123456789", 10, nullptr), S_OK);
     ASSERT_EQ(stream_->Seek(Offset(2), STREAM_SEEK_SET, nullptr), S_OK);
-    ComPtr<IStream> target;
-    ASSERT_EQ(ut::platform::CreateMemoryStream(target.Put()), S_OK);
+    ComPtr<IStream> target = ut::test::StreamOf();
     ULARGE_INTEGER count{}, read{}, written{};
     count.QuadPart = 5;
     ASSERT_EQ(stream_->CopyTo(target.Get(), count, &read, &written), S_OK);
@@ -143,25 +126,23 @@ INSTANTIATE_TEST_SUITE_P(BothStreams, StreamTest, ::testing::Values(Kind::Memory
                          [](const auto& info) { return info.param == Kind::Memory ? "Memory" : "File"; });
 
 TEST(MemoryStream, ClonesShareBytesButNotPosition) {
-    ComPtr<IStream> stream;
-    ASSERT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
-    ASSERT_EQ(stream->Write("abcdef", 6, nullptr), S_OK);
+    ComPtr<IStream> stream = ut::test::StreamOf({'a', 'b', 'c', 'd', 'e', 'f'});
+    ASSERT_EQ(stream->Seek(Offset(0), STREAM_SEEK_END, nullptr), S_OK);
     ComPtr<IStream> clone;
     ASSERT_EQ(stream->Clone(clone.Put()), S_OK);
-    EXPECT_EQ(Position(clone.Get()), 6u);
+    EXPECT_EQ(PositionOf(clone.Get()), 6u);
     ASSERT_EQ(clone->Seek(Offset(0), STREAM_SEEK_SET, nullptr), S_OK);
     ASSERT_EQ(clone->Write("X", 1, nullptr), S_OK);
-    EXPECT_EQ(Position(stream.Get()), 6u);
+    EXPECT_EQ(PositionOf(stream.Get()), 6u);
     EXPECT_EQ(ReadAll(stream.Get()), "Xbcdef");
 }
 
 // The system wraps a memory stream's position at 4 GiB instead of refusing it.
 TEST(MemoryStream, RefusesPositionsPastFourGibibytes) {
-    ComPtr<IStream> stream;
-    ASSERT_EQ(ut::platform::CreateMemoryStream(stream.Put()), S_OK);
+    ComPtr<IStream> stream = ut::test::StreamOf();
     ASSERT_EQ(stream->Seek(Offset(0xFFFFFFFFll), STREAM_SEEK_SET, nullptr), S_OK);
     EXPECT_EQ(stream->Seek(Offset(0x100000000ll), STREAM_SEEK_SET, nullptr), STG_E_INVALIDFUNCTION);
-    EXPECT_EQ(Position(stream.Get()), 0xFFFFFFFFull);
+    EXPECT_EQ(PositionOf(stream.Get()), 0xFFFFFFFFull);
     EXPECT_EQ(stream->Write("x", 1, nullptr), STG_E_MEDIUMFULL);
 }
 
@@ -194,10 +175,10 @@ TEST(FileStream, KeepsItsBytesAcrossOpensReportsItsNameAndFollowsTheMode) {
 }
 
 TEST(FileStream, RefusesBadArgumentsFoldersAndMissingFiles) {
+    ut::test::TempFolder temp;
     ComPtr<IStream> stream;
-    std::wstring folder = std::filesystem::temp_directory_path().wstring();
-    std::wstring missing = TempPath(L"ut_no_such_file.bin");
-    std::wstring inMissingFolder = TempPath(L"ut_no_such_folder") + L"/file.bin";
+    std::wstring folder = temp.Path(), missing = temp / L"missing.bin",
+                 inMissingFolder = temp / L"missing/file.bin";
     EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), STGM_READ, stream.Put()), STG_E_ACCESSDENIED);
     EXPECT_EQ(ut::platform::OpenFileStream(L"", STGM_READ, stream.Put()), STG_E_INVALIDNAME);
     EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), 3, stream.Put()), STG_E_INVALIDFLAG);

@@ -1,5 +1,6 @@
 #include <climits>
 #include <string>
+#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -57,23 +58,14 @@ TEST(PlatformStrings, FoldingLengthsDigitsAndNumbers) {
     for (unsigned c : {97u, 47u, 58u, 32u, 0u}) // 'a' '/' ':' ' ' NUL
         EXPECT_FALSE(IsMultibyteDigit(c)) << c;
 
-    struct Number {
-        const char* text;
-        LONG value;
-    };
-    const Number numbers[] = {{"42", 42},
-                              {"  -17x", -17},
-                              {"+8", 8},
-                              {"x1", 0},
-                              {"", 0},
-                              {"007", 7},
-                              {"2147483647", INT32_MAX},
-                              {"-2147483648", INT32_MIN}};
-    for (const Number& n : numbers) {
-        std::string narrow = n.text;
-        std::wstring wide(narrow.begin(), narrow.end());
-        EXPECT_EQ(BytesToLong(n.text), n.value) << n.text;
-        EXPECT_EQ(WideToLong(wide.c_str()), n.value) << n.text;
+    // clang-format off
+    const std::pair<const char*, LONG> numbers[] = {{"42", 42}, {"  -17x", -17}, {"+8", 8}, {"x1", 0}, {"", 0}, {"007", 7},
+                              {"2147483647", INT32_MAX}, {"-2147483648", INT32_MIN}};
+    // clang-format on
+    for (const auto& [text, value] : numbers) {
+        std::string narrow = text;
+        EXPECT_EQ(BytesToLong(text), value) << text;
+        EXPECT_EQ(WideToLong(std::wstring(narrow.begin(), narrow.end()).c_str()), value) << text;
     }
 }
 

@@ -1,5 +1,6 @@
 // UTF-8 and UTF-16LE conversion of wide text.
 #include <algorithm>
+#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -20,21 +21,18 @@ TEST(Text, Utf8RoundTripsEveryPlane) {
 }
 
 TEST(Text, BrokenUtf8BecomesReplacementCharacters) {
-    struct Case {
-        std::string input;
-        std::size_t replacements;
+    // The input, and how many replacement characters it becomes.
+    const std::pair<std::string, std::size_t> cases[] = {
+        {"\xC3", 1},         // truncated sequence
+        {"\x80", 1},         // stray continuation byte
+        {"\xC0\xAF", 2},     // overlong encoding
+        {"\xED\xA0\x80", 3}, // encoded surrogate
+        {"a\xFF\x62", 1},    // byte that never starts a sequence
     };
-    const Case cases[] = {
-        {"\xC3", 1},             // truncated sequence
-        {"\x80", 1},             // stray continuation byte
-        {"\xC0\xAF", 2},         // overlong encoding
-        {"\xED\xA0\x80", 3},     // encoded surrogate
-        {"a\xFF" "b", 1},        // byte that never starts a sequence
-    };
-    for (const Case& c : cases) {
-        std::wstring wide = WideFromUtf8(c.input);
-        EXPECT_EQ(static_cast<std::size_t>(std::count(wide.begin(), wide.end(), L'\xFFFD')), c.replacements)
-            << "input of " << c.input.size() << " bytes";
+    for (const auto& [input, replacements] : cases) {
+        std::wstring wide = WideFromUtf8(input);
+        EXPECT_EQ(static_cast<std::size_t>(std::count(wide.begin(), wide.end(), L'\xFFFD')), replacements)
+            << "input of " << input.size() << " bytes";
     }
 }
 
