@@ -56,10 +56,7 @@ TEST_F(RegistrationTest, EveryHostFailureEndsAsTheRulesSay) {
     auto viewWithEditor = [&] {
         ASSERT_EQ(KXRegisterView(kView, m, L"Curve view"), S_OK);
         ASSERT_EQ(KXRegisterQVXExplorerEditor(kView, GUID_NULL, m), S_OK);
-        UniqueHKey key;
-        ASSERT_EQ(sdk::CreateKey(HKEY_LOCAL_MACHINE, Base(L"QVX Explorer\\DefaultEditor").c_str(), key),
-                  ERROR_SUCCESS);
-        ASSERT_EQ(sdk::SetText(key.get(), L"CLSID", GuidToString(kTree).c_str()), ERROR_SUCCESS);
+        SetText(HKEY_LOCAL_MACHINE, Base(L"QVX Explorer\\DefaultEditor"), L"CLSID", GuidToString(kTree));
     };
     const Walk walks[] = {
         {"operator", [] {}, [&] { return KXRegisterOperator(kClass, m, kTwist); }, Propagated},

@@ -28,6 +28,14 @@ std::vector<GUID> Listed(const wchar_t* category, HRESULT* hr) {
     return FAILED(listed) ? std::vector<GUID>{GUID_NULL} : std::vector<GUID>(list, list + count);
 }
 
+Ids Listing(const std::function<HRESULT(DWORD*, GUID**)>& list, HRESULT expected) {
+    DWORD count = 9;
+    GUID* ids = reinterpret_cast<GUID*>(&count);
+    EXPECT_EQ(list(&count, &ids), expected);
+    std::unique_ptr<GUID, TaskMemDeleter> owned(ids);
+    return ids ? Ids(ids, ids + count) : Ids{};
+}
+
 std::wstring NameOf(const wchar_t* category, const GUID& clsid) {
     wchar_t name[80] = L"";
     DWORD bytes = sizeof name;
@@ -38,6 +46,12 @@ std::wstring TextAt(HKEY root, const std::wstring& path, const wchar_t* value) {
     UniqueHKey key = sdk::OpenKey(root, path.c_str());
     std::wstring text;
     return key && sdk::ReadText(key.get(), value, text) == ERROR_SUCCESS ? text : L"<none>";
+}
+
+void SetText(HKEY root, const std::wstring& path, const wchar_t* name, const std::wstring& text) {
+    UniqueHKey key;
+    ASSERT_EQ(sdk::CreateKey(root, path.c_str(), key), ERROR_SUCCESS);
+    ASSERT_EQ(sdk::SetText(key.get(), name, text.c_str()), ERROR_SUCCESS);
 }
 
 bool KeyExists(HKEY root, const std::wstring& path) {
@@ -207,14 +221,11 @@ TEST_F(RegistrationTest, ManipulatorsKeepTheirControlsAndGoWithThem) {
 
     ASSERT_EQ(KXRegisterManipulator(g, m, kTwist, 2, kControls), S_OK);
     ASSERT_EQ(KXRegisterManipulator(g, m, kTwist, 1, &kControls[1]), S_OK); // starts clean
+    auto controls = [&](DWORD* count, GUID** list) { return KXGetManipulator3DControls(g, count, list); };
+    EXPECT_EQ(Listing(controls, S_OK), Ids{kControls[1]});
+    EXPECT_EQ(Listing(KXGetManipulators, S_OK), Ids{g});
     DWORD count = 0;
     GUID* list = nullptr;
-    ASSERT_EQ(KXGetManipulator3DControls(g, &count, &list), S_OK);
-    EXPECT_EQ(std::vector<GUID>(list, list + count), std::vector<GUID>{kControls[1]});
-    CoTaskMemFree(list);
-    ASSERT_EQ(KXGetManipulators(&count, &list), S_OK);
-    EXPECT_EQ(std::vector<GUID>(list, list + count), std::vector<GUID>{g});
-    CoTaskMemFree(list);
     EXPECT_EQ(KXRemRegistryKey(g, L"Manipulator"), S_FALSE); // a class key with sub-keys stays
     EXPECT_EQ(KXGetManipulator3DControls(GUID_NULL, &count, &list), E_INVALIDARG);
     EXPECT_EQ(KXGetManipulator3DControls(g, nullptr, &list), E_POINTER);

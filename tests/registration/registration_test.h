@@ -2,6 +2,7 @@
 // string table over a cleared registry, and short ways to read registrations back.
 #pragma once
 
+#include <functional>
 #include <ostream>
 #include <string>
 #include <vector>
@@ -39,11 +40,16 @@ private:
 // The classes KXGetCLSIDList gives for a category; {GUID_NULL} when it fails (with its result in
 // `hr` when asked).
 std::vector<GUID> Listed(const wchar_t* category, HRESULT* hr = nullptr);
+// What a listing hands out, checking its result; the list must be set, if only to null.
+using Ids = std::vector<GUID>;
+Ids Listing(const std::function<HRESULT(DWORD*, GUID**)>& list, HRESULT expected);
 // The "Name" KXGetKeyName gives, or "<failed>".
 std::wstring NameOf(const wchar_t* category, const GUID& clsid);
 // A text value of `root`\`path`, or "<none>"; whether a key is there.
 std::wstring TextAt(HKEY root, const std::wstring& path, const wchar_t* value);
 bool KeyExists(HKEY root, const std::wstring& path);
+// Writes a text value, making the key.
+void SetText(HKEY root, const std::wstring& path, const wchar_t* name, const std::wstring& text);
 // The library's base key followed by `path`.
 std::wstring Base(const std::wstring& path = L"");
 

@@ -65,13 +65,6 @@ TEST_F(Families, FoundByNameWhateverTheCaseAndTestedByMembership) {
         EXPECT_EQ(Result(KXValidateObjectFamily(families, count, clsid)), Result(expected)) << clsid.Data1;
 }
 
-TEST(FamiliesWithoutManager, MembershipAnswersTheFailureWhichTestsAsTrue) {
-    int answer = F3DIsCLSIDInFamily(kSpot, kLights);
-    EXPECT_LT(answer, 0);
-    GUID found{};
-    EXPECT_LT(KXFindFamily(L"Lights", &found), 0);
-}
-
 TEST(WatchMap, KeepsOneEntryPerValueAndCopies) {
     GUID a = kSpot, sameAsA = kSpot, b = kLens;
     C3DWatchMap map;

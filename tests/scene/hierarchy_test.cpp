@@ -1,12 +1,16 @@
-// Hierarchy moves on the reference scene (models and item parents) and on containers known by their
-// class, hierarchy roots in and outside a model, and the scene's bounding box.
+// Hierarchy moves (under models, items and containers known by their class), roots in and outside
+// a model and the scene box on the reference scene; shader traversal.
+#include <algorithm>
+#include <map>
 #include <string>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <ut/hierarchy.h>
+#include <ut/host/reference_shaders.h>
 #include <ut/scene.h>
+#include <ut/shaders.h>
 
 #include "support/ref_tracker.h"
 #include "support/scene_mocks.h"
@@ -16,6 +20,9 @@ namespace {
 
 using ::testing::_;
 using ::testing::Return;
+using ut::host::ShaderDescription;
+using ut::test::Find;
+using ut::test::NameOf;
 using ut::test::Result;
 
 class Hierarchy : public ::testing::Test {
@@ -27,11 +34,6 @@ protected:
         settings.scene.objects[0].children[0].position = {0, 2, 0};
         settings.scene.objects[2].extent = {0, 0, 0, 1, 1, 1};
         return settings;
-    }
-    ut::ComPtr<I3DObject> Find(std::wstring name) {
-        ut::ComPtr<I3DObject> object;
-        EXPECT_EQ(F3DGet3DObjectFromName(name.data(), object.Put()), S_OK);
-        return object;
     }
     std::string Names(const std::vector<ut::host::ObjectDescription>& objects) {
         std::string names;
@@ -77,14 +79,7 @@ TEST_F(Hierarchy, MovesChecksTheirArgumentsInOrderAndMoveUnderModelsAndItems) {
     for (const auto& c : cases) {
         HRESULT hr = KXMoveObjectInHier(c.parent, c.object, static_cast<tagEGWDestination>(c.destination),
                                         c.reference, &out);
-        LPOLESTR name = nullptr;
-        ut::ComPtr<I3DObject> previous;
-        if (out && SUCCEEDED(out->QueryInterface(IID_I3DObject, previous.PutVoid())))
-            previous->GetName(&name);
-        EXPECT_EQ(Result(hr) + " " + (out ? ut::test::Narrow(name) : "null"), c.expected) << c.destination;
-        CoTaskMemFree(name);
-        if (out)
-            out->Release();
+        EXPECT_EQ(Result(hr) + " " + NameOf(out), c.expected) << c.destination;
     }
     ut::host::SceneDescription scene = host.DescribeScene();
     EXPECT_EQ(Names(scene.objects), "Rig Robot ");
@@ -152,13 +147,7 @@ TEST_F(Hierarchy, RootsAreFoundInTheSceneAndBelowAModel) {
     for (const auto& c : cases) {
         I3DObject* root = nullptr;
         HRESULT hr = KXGet3DObjectHierarchyRootInModel(c.object, model.Get(), &root);
-        LPOLESTR name = nullptr;
-        if (root)
-            root->GetName(&name);
-        EXPECT_EQ(Result(hr) + " " + (root ? ut::test::Narrow(name) : "null"), c.expected);
-        CoTaskMemFree(name);
-        if (root)
-            root->Release();
+        EXPECT_EQ(Result(hr) + " " + NameOf(root), c.expected);
     }
     EXPECT_EQ(KXGet3DObjectHierarchyRootInModel(arm.Get(), nullptr, found.Put()), E_POINTER);
 }
@@ -178,6 +167,102 @@ TEST_F(Hierarchy, TheSceneBoxCoversEveryExtentMovedByPositionsAndTheTransform) {
     EXPECT_CALL(view, GetObjectBoundingBox(nullptr, _, 1, E3DSPACE_LOCAL, doubled.Matrix(), 7, &box))
         .WillOnce(Return(S_FALSE));
     EXPECT_EQ(KXGetSceneBBox(nullptr, &view, 5, E3DSPACE_LOCAL, &doubled, 7, &box), S_FALSE);
+}
+
+// A shader network with a shared sub-network, an opaque node, a plain hierarchy and a cycle.
+// Surface's output port 0 leads to Noise but is not followed; port 2 nests ports 3 and 4.
+ut::host::ShaderNetwork TestNetwork() {
+    const std::vector<ShaderDescription> shaders = {
+        {.name = L"Surface",
+         .skippedPort = 0,
+         .ports = {{0, L"Noise"}, {1, L"Mix"}, {2, L"", {{3, L"Texture"}, {4, L"Opaque"}}}},
+         .nameSpace = L"Scene"},
+        {.name = L"Mix", .ports = {{1, L"Texture"}, {2, L"Noise"}}, .preferredNameSpace = L"Library"},
+        {.name = L"Texture", .ports = {{1, L"Noise"}}},
+        {.name = L"Noise"},
+        {.name = L"Opaque", .opaque = true, .ports = {{1, L"Noise"}}},
+        {.name = L"Plain", .node = false, .ports = {{1, L"Noise"}}},
+        {.name = L"Loop1", .ports = {{1, L"Loop2"}}},
+        {.name = L"Loop2", .ports = {{1, L"Loop1"}}}};
+    return ut::host::ShaderNetwork(shaders, {L"Scene", L"Library"});
+}
+
+// Records the nodes visited by name; answers `stop` at the `stopAt`-th visit, or at the first
+// node visited twice when `stopAt` is 0 and `stop` is not.
+struct Recorder : C3DShaderTraverserCallback {
+    const ut::host::ShaderNetwork& network;
+    int stopAt = -1;
+    long stop = 0;
+    std::string seen;
+    long OnShader(IUnknown* shader) override {
+        std::string name;
+        for (const wchar_t* candidate :
+             {L"Surface", L"Mix", L"Texture", L"Noise", L"Opaque", L"Plain", L"Loop1", L"Loop2"})
+            if (static_cast<IUnknown*>(network.Node(candidate).Get()) == shader)
+                name = ut::test::Narrow(candidate);
+        bool repeat = seen.find(name) != std::string::npos;
+        seen += (seen.empty() ? "" : " ") + name;
+        int visits = static_cast<int>(std::count(seen.begin(), seen.end(), ' ')) + 1;
+        return (stopAt == visits || (stopAt == 0 && repeat)) ? stop : 0;
+    }
+    explicit Recorder(const ut::host::ShaderNetwork& n) : network(n) {}
+};
+
+TEST(ShaderTraverser, WalksConnectedPortsDepthFirstAndStopsWhenTold) {
+    ut::test::LiveObjectCheck live;
+    ut::host::ShaderNetwork network = TestNetwork();
+    struct Case {
+        const wchar_t* root;
+        int stopAt;
+        long stop;
+        std::string expected;
+    };
+    const Case cases[] = {
+        // The output port is skipped, a nested port is followed, Noise is reached three times and
+        // the opaque node not at all.
+        {L"Surface", -1, 0, "S_OK: Surface Mix Texture Noise Noise Texture Noise"},
+        {L"Plain", -1, 0, "S_OK: "},
+        {L"Surface", 1, 5, "5: Surface"},
+        {L"Surface", 3, -7, "-7: Surface Mix Texture"},
+        // A cycle goes round until the callback stops it.
+        {L"Loop1", 0, 9, "9: Loop1 Loop2 Loop1"}};
+    for (const Case& c : cases) {
+        Recorder recorder(network);
+        recorder.stopAt = c.stopAt;
+        recorder.stop = c.stop;
+        C3DShaderTraverser traverser;
+        HRESULT hr = traverser.Traverse(network.Node(c.root).Get(), &recorder, false);
+        EXPECT_EQ(ut::test::Result(hr) + ": " + recorder.seen, c.expected);
+    }
+}
+
+TEST(ShaderTraverser, WalksARootOnceWithTheOnceOption) {
+    ut::host::ShaderNetwork network = TestNetwork();
+    Recorder recorder(network);
+    C3DShaderTraverser traverser;
+    auto noise = network.Node(L"Noise");
+    EXPECT_EQ(traverser.Traverse(nullptr, &recorder, true), E_POINTER);
+    EXPECT_EQ(traverser.Traverse(noise.Get(), nullptr, true), E_POINTER);
+    EXPECT_EQ(traverser.Traverse(noise.Get(), &recorder, true), S_OK);
+    EXPECT_EQ(traverser.Traverse(noise.Get(), &recorder, true), S_FALSE);
+    EXPECT_EQ(traverser.Traverse(noise.Get(), &recorder, false), S_OK);
+    C3DShaderTraverser copy(traverser);
+    EXPECT_EQ(copy.Traverse(noise.Get(), &recorder, true), S_FALSE); // the set is copied
+    EXPECT_EQ(recorder.seen, "Noise Noise");
+}
+
+TEST(ShaderNameSpaceTraverser, NamesEveryShaderInItsPreferredOrTheGivenNameSpace) {
+    ut::test::LiveObjectCheck live;
+    ut::host::ShaderNetwork network = TestNetwork();
+    C3DShaderNameSpaceTraverser naming;
+    auto surface = network.Node(L"Surface");
+    EXPECT_EQ(naming.Traverse(nullptr, network.NameSpace(L"Scene").Get()), E_POINTER);
+    EXPECT_EQ(naming.Traverse(surface.Get(), network.NameSpace(L"Scene").Get()), S_OK);
+    EXPECT_EQ(network.Members(L"Scene"), (std::vector<std::wstring>{L"Surface", L"Texture", L"Noise"}));
+    EXPECT_EQ(network.Members(L"Library"), std::vector<std::wstring>{L"Mix"});
+    C3DShaderNameSpaceTraverser copy(naming);
+    EXPECT_EQ(copy.Traverse(surface.Get(), network.NameSpace(L"Library").Get()), S_FALSE);
+    EXPECT_EQ(copy.OnShader(nullptr), 0);
 }
 
 } // namespace

@@ -18,6 +18,7 @@ namespace {
 
 using ::testing::_;
 using ::testing::Return;
+using ut::test::Find;
 using ut::test::Result;
 
 // Records which handler ran and answers S_FALSE from each, so that the answer is seen to come back.
@@ -52,6 +53,10 @@ VARIANT Integer(LONG value) {
     variant.lVal = value;
     return variant;
 }
+
+// The notifications in the order of the sink's bits.
+const wchar_t* const kNames[] = {L"GWAPP_STATE_CHANGE",   L"KX3D_SELECTION_LIST", L"KX3D_ACTIVE_LIST",
+                                 L"DesktopAppActivation", L"DesktopAppMinimized", L"DesktopAppRestore"};
 
 TEST(AppNotifySink, DispatchesEachNotificationByItsExactName) {
     const struct {
@@ -91,8 +96,7 @@ TEST(AppNotifySink, AdvisesAllOrNothingInItsBitOrderAndHearsTheService) {
         ut::test::ScopedGenericObject installed(CLSID_GWNotificationService, &service);
         auto* sink = new Recording;
         ::testing::InSequence order;
-        for (const wchar_t* name : {L"GWAPP_STATE_CHANGE", L"KX3D_SELECTION_LIST", L"KX3D_ACTIVE_LIST",
-                                    L"DesktopAppActivation", L"DesktopAppMinimized", L"DesktopAppRestore"})
+        for (const wchar_t* name : kNames)
             EXPECT_CALL(service, Advise(::testing::StrEq(name), _)).WillOnce(Return(S_OK));
         EXPECT_CALL(service, Unadvise(::testing::StrEq(L"KX3D_SELECTION_LIST"), _)).WillOnce(Return(E_FAIL));
         EXPECT_EQ(sink->Advise(63), S_OK);
@@ -114,12 +118,10 @@ TEST(AppNotifySink, AdvisesAllOrNothingInItsBitOrderAndHearsTheService) {
     EXPECT_EQ(sink->Advise(3), S_FALSE);
     ASSERT_EQ(sink->Advise(62), S_OK);
     VARIANT closing = Integer(2), active = Integer(1);
-    real->Broadcast(L"GWAPP_STATE_CHANGE", 1, &closing);
-    real->Broadcast(L"KX3D_SELECTION_LIST", 3, nullptr);
-    real->Broadcast(L"KX3D_ACTIVE_LIST", 4, nullptr);
-    real->Broadcast(L"DesktopAppActivation", 1, &active);
-    real->Broadcast(L"DesktopAppMinimized", 0, nullptr);
-    real->Broadcast(L"DesktopAppRestore", 0, nullptr);
+    const std::pair<ULONG, VARIANT*> payloads[] = {{1, &closing}, {3, nullptr}, {4, nullptr},
+                                                   {1, &active},  {0, nullptr}, {0, nullptr}};
+    for (int i = 0; i < 6; ++i)
+        real->Broadcast(kNames[i], payloads[i].first, payloads[i].second);
     EXPECT_EQ(sink->seen, "PreClose Selection3 Active4 Activate Minimize Maximize");
     EXPECT_EQ(sink->Unadvise(63), S_OK);
     real->Broadcast(L"DesktopAppRestore", 0, nullptr);
@@ -129,11 +131,6 @@ TEST(AppNotifySink, AdvisesAllOrNothingInItsBitOrderAndHearsTheService) {
 
 class ActiveDatabase : public ::testing::Test {
 protected:
-    ut::ComPtr<I3DObject> Find(std::wstring name) {
-        ut::ComPtr<I3DObject> object;
-        EXPECT_EQ(F3DGet3DObjectFromName(name.data(), object.Put()), S_OK);
-        return object;
-    }
     ut::test::MockEventSink events;
     ut::host::ReferenceHost host{ut::test::TestScene()};
     ut::ComPtr<IGWActiveDatabaseNotifier> notifier;

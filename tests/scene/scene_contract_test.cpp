@@ -169,60 +169,48 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
     each(EXPECT_CALL(transient, Contains(&hierarchy))); // it does not declare itself not transient
     each(EXPECT_CALL(transient, Reset()));
     struct Row {
-        const char* name;
+        const char* call;
         Mapping mapping;
-        std::function<HRESULT()> call;
+        std::function<HRESULT()> run;
     };
     IUnknown* asUnknown = &component;
+#define ROW(mapping, call) Row(#call, mapping, [&] { return call; })
     const Row rows[] = {
-        {"KXStoreCommand", kAsIs, [&] { return KXStoreCommand(kSomeId, kOtherId, &context); }},
-        {"KXPostCommand", kAsIs, [] { return KXPostCommand(); }},
-        {"F3DGet3DObjectFromName", kAsIs, [&] { return F3DGet3DObjectFromName(cube, &found); }},
-        {"F3DSceneNotificationQuietOn", kAsIs, [] { return F3DSceneNotificationQuietOn(); }},
-        {"F3DSceneNotificationQuietOff", kAsIs, [] { return F3DSceneNotificationQuietOff(); }},
-        {"F3DCreate3DObjectFromPrimitive", kAsIs,
-         [&] { return F3DCreate3DObjectFromPrimitive(&primitive, cube, &found); }},
-        {"KXCreate3DModelObject", kAsIs, [&] { return KXCreate3DModelObject(L"Robot", kSomeId, &out); }},
-        {"F3DAdd3DObjectToScene", kAsIs, [&] { return F3DAdd3DObjectToScene(&object, nullptr, 7); }},
-        {"F3DRemove3DObjectFromScene", kAsIs, [&] { return F3DRemove3DObjectFromScene(&object); }},
-        {"KXGetGenericManager", kAsIs, [&] { return KXGetGenericManager(kSomeId, kOtherId, &out); }},
-        {"F3DGetLayerContainer", kOk,
-         [&] { return F3DGetLayerContainer(reinterpret_cast<IKXLayerContainer**>(&out)); }},
-        {"F3DGetPassContainer", kOk,
-         [&] { return F3DGetPassContainer(reinterpret_cast<IKXLayerContainer**>(&out)); }},
-        {"F3DGetParTypeContainer", kOk, [&] { return F3DGetParTypeContainer(kSomeId, &out); }},
-        {"F3DGetEnvironmentContainer", kAsIs, [&] { return F3DGetEnvironmentContainer(kSomeId, &out); }},
-        {"KXGetSceneProperty", kOk, [&] { return KXGetSceneProperty(kSomeId, kOtherId, &out); }},
-        {"KXGetListOfSceneCameras", kAsIs,
-         [&] { return KXGetListOfSceneCameras(reinterpret_cast<I3DList**>(&out)); }},
-        {"KXGetCacheManager", kOk, [&] { return KXGetCacheManager(kSomeId, &out); }},
-        {"KXGetCacheManager(I3DCacheMgr**)", kOk,
-         [&] { return KXGetCacheManager(reinterpret_cast<I3DCacheMgr**>(&out)); }},
-        {"F3DGetRefPlaneFolder", kAsIs,
-         [&] { return F3DGetRefPlaneFolder(reinterpret_cast<I3DRefPlaneFolder**>(&out)); }},
-        {"F3DGetDeviceManager", kAsIs, [&] { return F3DGetDeviceManager(kSomeId, &out); }},
-        {"F3DGetTransientObjectContainer", kAsIs,
-         [&] { return F3DGetTransientObjectContainer(kSomeId, &out); }},
-        {"KXGetSceneDefaultsObject", kAsIs,
-         [&] { return KXGetSceneDefaultsObject(kSomeId, reinterpret_cast<IUnknown**>(&out)); }},
-        {"KXGetStreamFromSceneDefaults", kOkOrFalse,
-         [&] { return KXGetStreamFromSceneDefaults(kSomeId, reinterpret_cast<IStream**>(&out)); }},
-        {"KXCreateDefaultInstance", kOkOrFalse,
-         [&] { return KXCreateDefaultInstance(kSomeId, kOtherId, &out, &preset); }},
-        {"F3DAddObjectToTransientObjectContainer", kOk,
-         [&] { return F3DAddObjectToTransientObjectContainer(&hierarchy, 5); }},
-        {"F3DAddObjectToTransientObjectContainer(IUnknown*)", kOk,
-         [&] { return F3DAddObjectToTransientObjectContainer(asUnknown); }},
-        {"F3DRemoveObjectFromTransientObjectContainer", kFalseOrOk,
-         [&] { return F3DRemoveObjectFromTransientObjectContainer(asUnknown); }},
-        {"F3DIsObjectInTransientObjectContainer", kFalseOrOk,
-         [&] { return F3DIsObjectInTransientObjectContainer(&hierarchy); }},
-        {"F3DTransientObjectContainerReset", kOk, [] { return F3DTransientObjectContainerReset(); }},
+        ROW(kAsIs, KXStoreCommand(kSomeId, kOtherId, &context)),
+        ROW(kAsIs, KXPostCommand()),
+        ROW(kAsIs, F3DGet3DObjectFromName(cube, &found)),
+        ROW(kAsIs, F3DSceneNotificationQuietOn()),
+        ROW(kAsIs, F3DSceneNotificationQuietOff()),
+        ROW(kAsIs, F3DCreate3DObjectFromPrimitive(&primitive, cube, &found)),
+        ROW(kAsIs, KXCreate3DModelObject(L"Robot", kSomeId, &out)),
+        ROW(kAsIs, F3DAdd3DObjectToScene(&object, nullptr, 7)),
+        ROW(kAsIs, F3DRemove3DObjectFromScene(&object)),
+        ROW(kAsIs, KXGetGenericManager(kSomeId, kOtherId, &out)),
+        ROW(kOk, F3DGetLayerContainer(reinterpret_cast<IKXLayerContainer**>(&out))),
+        ROW(kOk, F3DGetPassContainer(reinterpret_cast<IKXLayerContainer**>(&out))),
+        ROW(kOk, F3DGetParTypeContainer(kSomeId, &out)),
+        ROW(kAsIs, F3DGetEnvironmentContainer(kSomeId, &out)),
+        ROW(kOk, KXGetSceneProperty(kSomeId, kOtherId, &out)),
+        ROW(kAsIs, KXGetListOfSceneCameras(reinterpret_cast<I3DList**>(&out))),
+        ROW(kOk, KXGetCacheManager(kSomeId, &out)),
+        ROW(kOk, KXGetCacheManager(reinterpret_cast<I3DCacheMgr**>(&out))),
+        ROW(kAsIs, F3DGetRefPlaneFolder(reinterpret_cast<I3DRefPlaneFolder**>(&out))),
+        ROW(kAsIs, F3DGetDeviceManager(kSomeId, &out)),
+        ROW(kAsIs, F3DGetTransientObjectContainer(kSomeId, &out)),
+        ROW(kAsIs, KXGetSceneDefaultsObject(kSomeId, reinterpret_cast<IUnknown**>(&out))),
+        ROW(kOkOrFalse, KXGetStreamFromSceneDefaults(kSomeId, reinterpret_cast<IStream**>(&out))),
+        ROW(kOkOrFalse, KXCreateDefaultInstance(kSomeId, kOtherId, &out, &preset)),
+        ROW(kOk, F3DAddObjectToTransientObjectContainer(&hierarchy, 5)),
+        ROW(kOk, F3DAddObjectToTransientObjectContainer(asUnknown)),
+        ROW(kFalseOrOk, F3DRemoveObjectFromTransientObjectContainer(asUnknown)),
+        ROW(kFalseOrOk, F3DIsObjectInTransientObjectContainer(&hierarchy)),
+        ROW(kOk, F3DTransientObjectContainerReset()),
     };
+#undef ROW
     for (HRESULT given : answers) {
         answer = given;
         for (const Row& row : rows)
-            EXPECT_EQ(row.call(), Mapped(row.mapping, given)) << row.name << " answered " << given;
+            EXPECT_EQ(row.run(), Mapped(row.mapping, given)) << row.call << " answered " << given;
     }
 }
 

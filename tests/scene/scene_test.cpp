@@ -16,6 +16,7 @@
 
 namespace {
 
+using ut::test::Find;
 using ut::test::Held;
 using ut::test::Result;
 
@@ -39,13 +40,6 @@ std::vector<std::wstring> Names(I3DList* list) {
         CoTaskMemFree(name);
     }
     return names;
-}
-
-ut::ComPtr<I3DObject> Find(const wchar_t* name) {
-    ut::ComPtr<I3DObject> object;
-    std::wstring text = name;
-    EXPECT_EQ(F3DGet3DObjectFromName(text.data(), object.Put()), S_OK) << "no object " << name;
-    return object;
 }
 
 class ReferenceScene : public ::testing::Test {
@@ -141,10 +135,6 @@ TEST(ReferenceSceneWithoutContainer, EveryContentMemberMakesOne) {
     I3DRefPlaneFolder* planes = nullptr;
     EXPECT_EQ(F3DGetRefPlaneFolder(&planes), S_OK);
     EXPECT_EQ(Held(planes), "set");
-    EXPECT_EQ(KXGetCacheManager(IID_IUnknown, &out), S_OK);
-    static_cast<IUnknown*>(out)->Release();
-    EXPECT_EQ(F3DGetDeviceManager(IID_IUnknown, &out), S_OK);
-    static_cast<IUnknown*>(out)->Release();
     // Each call works on a container of its own: what one adds the next does not hold.
     ut::ComPtr<I3DObject> arm = Find(L"Arm");
     EXPECT_EQ(F3DAddObjectToTransientObjectContainer(static_cast<IUnknown*>(arm.Get())), S_OK);

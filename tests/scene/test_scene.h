@@ -3,8 +3,11 @@
 
 #include <string>
 
+#include <gtest/gtest.h>
+
 #include <ut/host/reference_host.h>
 #include <ut/platform/com.h>
+#include <ut/scene.h>
 
 namespace ut::test {
 
@@ -61,6 +64,29 @@ inline std::string Narrow(const wchar_t* text) {
     for (; text && *text; ++text)
         narrow += static_cast<char>(*text);
     return narrow;
+}
+
+// The scene's object of that name.
+inline ComPtr<I3DObject> Find(std::wstring name) {
+    ComPtr<I3DObject> object;
+    EXPECT_EQ(F3DGet3DObjectFromName(name.data(), object.Put()), S_OK)
+        << "no object " << Narrow(name.c_str());
+    return object;
+}
+
+// The name of the object, "null" for none; the reference is released.
+template <class Interface>
+std::string NameOf(Interface*& object) {
+    ComPtr<I3DObject> named;
+    LPOLESTR name = nullptr;
+    if (object && SUCCEEDED(object->QueryInterface(IID_I3DObject, named.PutVoid())))
+        named->GetName(&name);
+    std::string text = object ? Narrow(name) : "null";
+    CoTaskMemFree(name);
+    if (object)
+        object->Release();
+    object = nullptr;
+    return text;
 }
 
 // "set" or "null" for an out-parameter; what it holds is released.
