@@ -7,6 +7,7 @@
 #include <functional>
 #include <memory>
 #include <optional>
+#include <tuple>
 
 #include <ut/registration.h>
 #include <ut/sdk/detail/registry.h>
@@ -81,13 +82,8 @@ TEST_F(RegistrationTest, ClassKeysAreFoundByTheIdentifierTheirNameParsesTo) {
 }
 
 TEST_F(RegistrationTest, PathsAtACategoryAreReadWithChecks) {
-    struct Stored {
-        DWORD type;
-        std::wstring data;
-        HRESULT result;
-        std::optional<std::wstring> read; // none: whatever the registry left
-    };
-    const Stored cases[] = {
+    // The value's type and bytes; the result and the path read (none: whatever the registry left).
+    const std::tuple<DWORD, std::wstring, HRESULT, std::optional<std::wstring>> cases[] = {
         {REG_SZ, std::wstring(L"c:\\a\0", 5), S_OK, L"c:\\a"},
         {REG_EXPAND_SZ, std::wstring(L"c:\\a\0", 5), S_OK, L"c:\\a"},
         {REG_SZ, L"c:\\a", E_FAIL, L""}, // no terminator
@@ -98,12 +94,12 @@ TEST_F(RegistrationTest, PathsAtACategoryAreReadWithChecks) {
         {REG_DWORD, std::wstring(4 / sizeof(wchar_t), L'\1'), E_FAIL, L""},
         {REG_SZ, std::wstring(50, L'p') + L'\0', E_FAIL, std::nullopt}, // too long for the buffer
     };
-    for (const Stored& stored : cases) {
-        SCOPED_TRACE(platform::Utf8FromWide(stored.data) + " of type " + std::to_string(stored.type));
-        SetRaw(HKEY_LOCAL_MACHINE, Base(L"Shaders"), L"Path", stored.type, Units(stored.data));
+    for (const auto& [type, data, result, read] : cases) {
+        SCOPED_TRACE(platform::Utf8FromWide(data) + " of type " + std::to_string(type));
+        SetRaw(HKEY_LOCAL_MACHINE, Base(L"Shaders"), L"Path", type, Units(data));
         wchar_t path[20] = L"untouched";
-        EXPECT_EQ(KXGetPathAtRegKey(L"Shaders", sizeof path, path), stored.result);
-        EXPECT_TRUE(!stored.read || *stored.read == path);
+        EXPECT_EQ(KXGetPathAtRegKey(L"Shaders", sizeof path, path), result);
+        EXPECT_TRUE(!read || *read == path);
     }
     wchar_t path[20];
     EXPECT_EQ(KXGetPathAtRegKey(L"Nothing here", sizeof path, path), E_FAIL);
@@ -116,22 +112,16 @@ TEST_F(RegistrationTest, PathsAtACategoryAreReadWithChecks) {
 
 TEST_F(RegistrationTest, ViewNamesFallBackToTheIdentifierText) {
     const std::wstring key = Base(L"View\\") + GuidToString(kClass), id = GuidToString(kClass);
-    struct Stored {
-        DWORD type;
-        std::wstring name;
-        HRESULT result;
-        std::wstring read;
-    };
-    const Stored cases[] = {
+    // The value's type and text; the result and the name read.
+    const std::tuple<DWORD, std::wstring, HRESULT, std::wstring> cases[] = {
         {REG_SZ, std::wstring(39, L'v'), S_OK, std::wstring(39, L'v')},
         {REG_SZ, std::wstring(40, L'v'), E_FAIL, id},
-        {REG_DWORD, L"", E_FAIL, id},
-    };
-    for (const Stored& stored : cases) {
-        SetRaw(HKEY_LOCAL_MACHINE, key, L"Name", stored.type, Units(stored.name + L'\0'));
+        {REG_DWORD, L"", E_FAIL, id}};
+    for (const auto& [type, stored, result, read] : cases) {
+        SetRaw(HKEY_LOCAL_MACHINE, key, L"Name", type, Units(stored + L'\0'));
         wchar_t name[40] = L"untouched";
-        EXPECT_EQ(KXGetCorvaneViewName(kClass, name), stored.result) << stored.name.size();
-        EXPECT_EQ(std::wstring(name), stored.read);
+        EXPECT_EQ(KXGetCorvaneViewName(kClass, name), result) << stored.size();
+        EXPECT_EQ(std::wstring(name), read) << stored.size();
     }
     wchar_t name[40] = L"untouched";
     EXPECT_EQ(KXGetCorvaneViewName(TestGuid(2), name), E_FAIL);

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <map>
 #include <string>
+#include <tuple>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -53,13 +54,8 @@ TEST_F(Hierarchy, MovesChecksTheirArgumentsInOrderAndMoveUnderModelsAndItems) {
     ASSERT_EQ(KXGetCurrentSceneModel(IID_I3DObject, root.PutVoid()), S_OK);
     ut::test::ComMock<IUnknown> marked(IID_IGWNotUnderModel);
     IUnknown* out = nullptr;
-    const struct {
-        IUnknown* parent;
-        IUnknown* object;
-        LONG destination;
-        IUnknown* reference;
-        std::string expected; // the result and what `out` received
-    } cases[] = {
+    // Parent, object, destination, reference; the result and the name of what `out` received.
+    const std::tuple<IUnknown*, IUnknown*, LONG, IUnknown*, std::string> cases[] = {
         {robot.Get(), nullptr, GWDEST_LAST, nullptr, "E_POINTER null"},
         {robot.Get(), rig.Get(), GWDEST_AFTER, nullptr, "E_POINTER null"},
         {nullptr, rig.Get(), GWDEST_LAST, nullptr, "E_POINTER null"},
@@ -76,10 +72,11 @@ TEST_F(Hierarchy, MovesChecksTheirArgumentsInOrderAndMoveUnderModelsAndItems) {
         {arm.Get(), camera.Get(), GWDEST_BEFORE, light.Get(), "S_OK Shot"},
         {arm.Get(), robot.Get(), GWDEST_FIRST, nullptr, "E_INVALIDARG Shot"},
     };
-    for (const auto& c : cases) {
-        HRESULT hr = KXMoveObjectInHier(c.parent, c.object, static_cast<tagEGWDestination>(c.destination),
-                                        c.reference, &out);
-        EXPECT_EQ(Result(hr) + " " + NameOf(out), c.expected) << c.destination;
+    int row = 0;
+    for (const auto& [parent, object, destination, reference, expected] : cases) {
+        HRESULT hr =
+            KXMoveObjectInHier(parent, object, static_cast<tagEGWDestination>(destination), reference, &out);
+        EXPECT_EQ(Result(hr) + " " + NameOf(out), expected) << "row " << row++;
     }
     ut::host::SceneDescription scene = host.DescribeScene();
     EXPECT_EQ(Names(scene.objects), "Rig Robot ");
@@ -95,36 +92,35 @@ TEST(HierarchyContainers, LayersPassesAndPlainContainersTakeObjectsAsTheyAre) {
     };
     ut::test::ComMock<IUnknown> object(IID_IUnknown);
     const GUID other = ut::test::kX;
-    const struct {
-        const GUID* kind;
-        HRESULT resolved;
-        bool withData, withHierarchy;
-        std::string expected;
-    } cases[] = {{&GUID_3DLayerContainer, S_OK, true, true, "S_OK 3"},
-                 {&GUID_3DPassContainer, S_OK, true, true, "S_OK 3"},
-                 {&CLSID_3DPlainContainer, S_OK, true, true, "S_OK 3"},
-                 {&other, S_OK, true, true, "E_INVALIDARG 0"},
-                 {&CLSID_3DPlainContainer, S_OK, false, true, "E_POINTER 0"},
-                 {&CLSID_3DPlainContainer, S_FALSE, true, true, "E_INVALIDARG 0"},
-                 {&CLSID_3DPlainContainer, S_OK, true, false, "E_NOINTERFACE 0"}};
-    for (const auto& c : cases) {
+    // The parent's class, what resolving the object answers, whether the parent has active data and
+    // a hierarchy; the result and whether the hierarchy moved the object.
+    const std::tuple<const GUID*, HRESULT, bool, bool, std::string> cases[] = {
+        {&GUID_3DLayerContainer, S_OK, true, true, "S_OK 3"},
+        {&GUID_3DPassContainer, S_OK, true, true, "S_OK 3"},
+        {&CLSID_3DPlainContainer, S_OK, true, true, "S_OK 3"},
+        {&other, S_OK, true, true, "E_INVALIDARG 0"},
+        {&CLSID_3DPlainContainer, S_OK, false, true, "E_POINTER 0"},
+        {&CLSID_3DPlainContainer, S_FALSE, true, true, "E_INVALIDARG 0"},
+        {&CLSID_3DPlainContainer, S_OK, true, false, "E_NOINTERFACE 0"}};
+    int row = 0;
+    for (const auto& [kind, resolved, withData, withHierarchy, expected] : cases) {
         Parent parent;
         EXPECT_CALL(parent.persist, GetClassID(_)).WillRepeatedly([&](CLSID* clsid) {
-            *clsid = *c.kind;
+            *clsid = *kind;
             return S_OK;
         });
-        if (c.withData)
+        if (withData)
             parent.persist.Also(IID_IGWActiveData, &parent.data);
-        if (c.withHierarchy)
+        if (withHierarchy)
             parent.data.Also(IID_IGWComponentHierarchy, &parent.hierarchy);
-        ON_CALL(parent.data, ResolveObject(&object, _)).WillByDefault(Return(c.resolved));
+        ON_CALL(parent.data, ResolveObject(&object, _)).WillByDefault(Return(resolved));
         int moved = 0;
         ON_CALL(parent.hierarchy, MoveComponent(_, GWDEST_LAST, nullptr)).WillByDefault([&](auto&&...) {
             moved = 3;
             return S_OK;
         });
         HRESULT hr = KXMoveObjectInHier(&parent.persist, &object, GWDEST_LAST, nullptr, nullptr);
-        EXPECT_EQ(Result(hr) + " " + std::to_string(moved), c.expected) << Result(c.resolved);
+        EXPECT_EQ(Result(hr) + " " + std::to_string(moved), expected) << "row " << row++;
     }
 }
 
@@ -137,17 +133,14 @@ TEST_F(Hierarchy, RootsAreFoundInTheSceneAndBelowAModel) {
     EXPECT_EQ(KXGet3DObjectHierarchyRoot(light.Get(), found.Put()), S_OK);
     EXPECT_TRUE(found == robot);
     EXPECT_EQ(KXGet3DObjectHierarchyRoot(nullptr, found.Put()), E_POINTER);
-    const struct {
-        I3DObject* object;
-        std::string expected;
-    } cases[] = {{arm.Get(), "S_OK Arm"},
-                 {light.Get(), "S_OK Arm"},
-                 {camera.Get(), "E_UNEXPECTED null"},
-                 {rig.Get(), "S_FALSE null"}};
-    for (const auto& c : cases) {
+    const std::pair<I3DObject*, std::string> cases[] = {{arm.Get(), "S_OK Arm"},
+                                                        {light.Get(), "S_OK Arm"},
+                                                        {camera.Get(), "E_UNEXPECTED null"},
+                                                        {rig.Get(), "S_FALSE null"}};
+    for (const auto& [object, expected] : cases) {
         I3DObject* root = nullptr;
-        HRESULT hr = KXGet3DObjectHierarchyRootInModel(c.object, model.Get(), &root);
-        EXPECT_EQ(Result(hr) + " " + NameOf(root), c.expected);
+        HRESULT hr = KXGet3DObjectHierarchyRootInModel(object, model.Get(), &root);
+        EXPECT_EQ(Result(hr) + " " + NameOf(root), expected) << expected;
     }
     EXPECT_EQ(KXGet3DObjectHierarchyRootInModel(arm.Get(), nullptr, found.Put()), E_POINTER);
 }
@@ -211,13 +204,8 @@ struct Recorder : C3DShaderTraverserCallback {
 TEST(ShaderTraverser, WalksConnectedPortsDepthFirstAndStopsWhenTold) {
     ut::test::LiveObjectCheck live;
     ut::host::ShaderNetwork network = TestNetwork();
-    struct Case {
-        const wchar_t* root;
-        int stopAt;
-        long stop;
-        std::string expected;
-    };
-    const Case cases[] = {
+    // The root, the visit to stop at and what to answer there; the result and the visits.
+    const std::tuple<const wchar_t*, int, long, std::string> cases[] = {
         // The output port is skipped, a nested port is followed, Noise is reached three times and
         // the opaque node not at all.
         {L"Surface", -1, 0, "S_OK: Surface Mix Texture Noise Noise Texture Noise"},
@@ -226,13 +214,14 @@ TEST(ShaderTraverser, WalksConnectedPortsDepthFirstAndStopsWhenTold) {
         {L"Surface", 3, -7, "-7: Surface Mix Texture"},
         // A cycle goes round until the callback stops it.
         {L"Loop1", 0, 9, "9: Loop1 Loop2 Loop1"}};
-    for (const Case& c : cases) {
+    for (const auto& [root, stopAt, stop, expected] : cases) {
         Recorder recorder(network);
-        recorder.stopAt = c.stopAt;
-        recorder.stop = c.stop;
+        recorder.stopAt = stopAt;
+        recorder.stop = stop;
         C3DShaderTraverser traverser;
-        HRESULT hr = traverser.Traverse(network.Node(c.root).Get(), &recorder, false);
-        EXPECT_EQ(ut::test::Result(hr) + ": " + recorder.seen, c.expected);
+        HRESULT hr = traverser.Traverse(network.Node(root).Get(), &recorder, false);
+        EXPECT_EQ(ut::test::Result(hr) + ": " + recorder.seen, expected)
+            << ut::test::Narrow(root) << " " << stopAt;
     }
 }
 

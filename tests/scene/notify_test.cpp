@@ -2,6 +2,7 @@
 // database's object events, the load guard, the property forwarders and the curve cache, on the
 // reference host.
 #include <string>
+#include <tuple>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -59,33 +60,30 @@ const wchar_t* const kNames[] = {L"GWAPP_STATE_CHANGE",   L"KX3D_SELECTION_LIST"
                                  L"DesktopAppActivation", L"DesktopAppMinimized", L"DesktopAppRestore"};
 
 TEST(AppNotifySink, DispatchesEachNotificationByItsExactName) {
-    const struct {
-        const wchar_t* name;
-        ULONG kind;
-        LONG value; // -1: no value
-        std::string expected;
-    } cases[] = {{L"GWAPP_STATE_CHANGE", 1, 8, "S_FALSE Terminate"},
-                 {L"GWAPP_STATE_CHANGE", 1, 2, "S_FALSE PreClose"},
-                 {L"GWAPP_STATE_CHANGE", 1, 1, "S_FALSE Startup"},
-                 {L"GWAPP_STATE_CHANGE", 1, 4, "S_FALSE New"},
-                 {L"GWAPP_STATE_CHANGE", 1, 16, "S_FALSE PostClose"},
-                 {L"GWAPP_STATE_CHANGE", 1, 0x10100, "S_FALSE Changed"}, // the low 16 bits
-                 {L"GWAPP_STATE_CHANGE", 1, 3, "S_OK "},
-                 {L"GWAPP_STATE_CHANGE", 2, 8, "E_INVALIDARG "},
-                 {L"GWAPP_STATE_CHANGE", 1, -1, "E_INVALIDARG "},
-                 {L"gwapp_state_change", 1, 8, "S_OK "},
-                 {L"KX3D_SELECTION_LIST", 5, -1, "S_FALSE Selection5"},
-                 {L"KX3D_ACTIVE_LIST", 6, 0, "S_FALSE Active6"},
-                 {L"DesktopAppActivation", 1, 1, "S_FALSE Activate"},
-                 {L"DesktopAppActivation", 1, 0, "S_FALSE Deactivate"},
-                 {L"DesktopAppActivation", 0, 1, "E_INVALIDARG "},
-                 {L"DesktopAppMinimized", 0, -1, "S_FALSE Minimize"},
-                 {L"DesktopAppRestore", 0, -1, "S_FALSE Maximize"}};
-    for (const auto& c : cases) {
+    // The notification, its kind and value (-1: none); the result and the handlers that ran.
+    const std::tuple<const wchar_t*, ULONG, LONG, std::string> cases[] = {
+        {L"GWAPP_STATE_CHANGE", 1, 8, "S_FALSE Terminate"},
+        {L"GWAPP_STATE_CHANGE", 1, 2, "S_FALSE PreClose"},
+        {L"GWAPP_STATE_CHANGE", 1, 1, "S_FALSE Startup"},
+        {L"GWAPP_STATE_CHANGE", 1, 4, "S_FALSE New"},
+        {L"GWAPP_STATE_CHANGE", 1, 16, "S_FALSE PostClose"},
+        {L"GWAPP_STATE_CHANGE", 1, 0x10100, "S_FALSE Changed"}, // the low 16 bits
+        {L"GWAPP_STATE_CHANGE", 1, 3, "S_OK "},
+        {L"GWAPP_STATE_CHANGE", 2, 8, "E_INVALIDARG "},
+        {L"GWAPP_STATE_CHANGE", 1, -1, "E_INVALIDARG "},
+        {L"gwapp_state_change", 1, 8, "S_OK "},
+        {L"KX3D_SELECTION_LIST", 5, -1, "S_FALSE Selection5"},
+        {L"KX3D_ACTIVE_LIST", 6, 0, "S_FALSE Active6"},
+        {L"DesktopAppActivation", 1, 1, "S_FALSE Activate"},
+        {L"DesktopAppActivation", 1, 0, "S_FALSE Deactivate"},
+        {L"DesktopAppActivation", 0, 1, "E_INVALIDARG "},
+        {L"DesktopAppMinimized", 0, -1, "S_FALSE Minimize"},
+        {L"DesktopAppRestore", 0, -1, "S_FALSE Maximize"}};
+    for (const auto& [name, kind, number, expected] : cases) {
         auto* sink = new Recording;
-        VARIANT value = Integer(c.value);
-        HRESULT hr = sink->PropertyChanged(c.name, c.kind, c.value < 0 ? nullptr : &value, 0);
-        EXPECT_EQ(Result(hr) + " " + sink->seen, c.expected) << ut::test::Narrow(c.name) << " " << c.value;
+        VARIANT value = Integer(number);
+        HRESULT hr = sink->PropertyChanged(name, kind, number < 0 ? nullptr : &value, 0);
+        EXPECT_EQ(Result(hr) + " " + sink->seen, expected) << ut::test::Narrow(name) << " " << number;
         sink->Release();
     }
 }

@@ -2,6 +2,7 @@
 // which arguments and in which order, how its answer is mapped, and that no reference is left.
 #include <functional>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include <gmock/gmock.h>
@@ -10,6 +11,7 @@
 #include <ut/sdk/objects.h>
 
 #include "support/scene_mocks.h"
+#include "test_scene.h"
 
 namespace {
 
@@ -21,6 +23,7 @@ using ::testing::SetArgPointee;
 using ::testing::StrEq;
 using ::testing::StrictMock;
 using ut::test::GiveOut;
+using ut::test::Result;
 
 constexpr GUID kSomeId = {0x1, 0x2, 0x3, {4, 5, 6, 7, 8, 9, 10, 11}};
 constexpr GUID kOtherId = {0xA, 0xB, 0xC, {1, 1, 1, 1, 1, 1, 1, 1}};
@@ -96,26 +99,13 @@ protected:
 };
 
 // How a function maps the one host answer it passes on.
-enum Mapping {
-    kAsIs,
-    kOk,        // any success becomes S_OK
-    kOkOrFalse, // S_OK stays, everything else becomes S_FALSE
-    kFalseOrOk, // S_FALSE stays, any other success becomes S_OK
+using Mapping = HRESULT (*)(HRESULT);
+constexpr Mapping kAsIs = [](HRESULT answer) { return answer; };
+constexpr Mapping kOk = [](HRESULT answer) { return FAILED(answer) ? answer : S_OK; };
+constexpr Mapping kOkOrFalse = [](HRESULT answer) { return answer == S_OK ? S_OK : S_FALSE; };
+constexpr Mapping kFalseOrOk = [](HRESULT answer) {
+    return FAILED(answer) || answer == S_FALSE ? answer : S_OK;
 };
-
-HRESULT Mapped(Mapping mapping, HRESULT answer) {
-    switch (mapping) {
-    case kAsIs:
-        return answer;
-    case kOk:
-        return FAILED(answer) ? answer : S_OK;
-    case kOkOrFalse:
-        return answer == S_OK ? S_OK : S_FALSE;
-    case kFalseOrOk:
-        return FAILED(answer) || answer == S_FALSE ? answer : S_OK;
-    }
-    return E_UNEXPECTED;
-}
 
 TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMapsTheAnswer) {
     // Each row runs once for each answer; every operation is expected as often as its rows run
@@ -210,7 +200,7 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
     for (HRESULT given : answers) {
         answer = given;
         for (const Row& row : rows)
-            EXPECT_EQ(row.run(), Mapped(row.mapping, given)) << row.call << " answered " << given;
+            EXPECT_EQ(row.run(), row.mapping(given)) << row.call << " answered " << given;
     }
 }
 
@@ -441,27 +431,24 @@ TEST_F(SceneContract, TheModelIsAskedForTheRootPropertyThenToMakeIt) {
 TEST_F(SceneContract, TheTimeMappingIsTheSetHeldByTheScenesTimeMappingProperty) {
     ut::test::MockProperties mapping;
     IGWProperties* out = nullptr;
-    struct Case {
-        VARTYPE type;
-        HRESULT read;
-        HRESULT expected;
-    };
-    const Case cases[] = {{VT_UNKNOWN, S_OK, S_OK},
-                          {VT_UNKNOWN, S_FALSE, S_OK},
-                          {VT_I4, S_OK, E_NOINTERFACE},
-                          {VT_EMPTY, kRefused, S_FALSE}};
-    for (const Case& c : cases) {
+    // What the property holds and what reading it answers; the result.
+    const std::tuple<VARTYPE, HRESULT, HRESULT> cases[] = {{VT_UNKNOWN, S_OK, S_OK},
+                                                           {VT_UNKNOWN, S_FALSE, S_OK},
+                                                           {VT_I4, S_OK, E_NOINTERFACE},
+                                                           {VT_EMPTY, kRefused, S_FALSE}};
+    for (const auto& [type, read, expected] : cases) {
+        SCOPED_TRACE(::testing::Message() << "type " << type << ", read " << Result(read));
         SceneIsCurrent();
         EXPECT_CALL(sceneProperties, GetProperty(GUID_GWTimeMappingProperty, _, 0))
             .WillOnce([&](REFGUID, GWVARIANT* value, LONG) {
-                value->vt = c.type;
-                value->punkVal = c.type == VT_UNKNOWN ? static_cast<IUnknown*>(&mapping) : nullptr;
+                value->vt = type;
+                value->punkVal = type == VT_UNKNOWN ? static_cast<IUnknown*>(&mapping) : nullptr;
                 if (value->punkVal)
                     mapping.AddRef();
-                return c.read;
+                return read;
             });
-        EXPECT_EQ(KXGetCurrentSceneTimeMapping(&out), c.expected);
-        EXPECT_EQ(out, c.expected == S_OK ? &mapping : nullptr);
+        EXPECT_EQ(KXGetCurrentSceneTimeMapping(&out), expected);
+        EXPECT_EQ(out, expected == S_OK ? &mapping : nullptr);
         if (out)
             out->Release();
         EXPECT_EQ(mapping.Extra(), 0u) << "the variant is cleared";
@@ -472,35 +459,29 @@ TEST_F(SceneContract, AScenePropertyIsMadeAndAddedOnlyWhenMissingAndAskedFor) {
     StrictMock<ut::test::MockClassFactory> classes;
     ut::test::MockProperties made;
     ScopedClass installed(kSomeId, &classes);
-    struct Case {
-        HRESULT read;
-        int create;
-        HRESULT expected;
-        VARTYPE type;
-    };
-    const Case cases[] = {{S_OK, 1, S_OK, VT_R8},
-                          {S_FALSE, 0, S_OK, VT_R8},
-                          {kRefused, 0, S_OK, VT_R8},
-                          {S_FALSE, 1, S_OK, VT_UNKNOWN},
-                          {kRefused, 1, kRefused, VT_R8}};
-    for (const Case& c : cases) {
+    // What reading the property answers, whether to make it; the result and the value's type.
+    const std::tuple<HRESULT, int, HRESULT, VARTYPE> cases[] = {{S_OK, 1, S_OK, VT_R8},
+                                                                {S_FALSE, 0, S_OK, VT_R8},
+                                                                {kRefused, 0, S_OK, VT_R8},
+                                                                {S_FALSE, 1, S_OK, VT_UNKNOWN},
+                                                                {kRefused, 1, kRefused, VT_R8}};
+    for (const auto& [read, create, expected, type] : cases) {
+        SCOPED_TRACE(::testing::Message() << "read " << Result(read) << ", create " << create);
         CGWVariant value;
         SceneIsCurrent();
         EXPECT_CALL(sceneProperties, GetProperty(kSomeId, &value, 0))
-            .WillOnce([&](REFGUID, GWVARIANT* read, LONG) {
-                read->vt = VT_R8;
-                return c.read;
+            .WillOnce([&](REFGUID, GWVARIANT* held, LONG) {
+                held->vt = VT_R8;
+                return read;
             });
-        if (c.read != S_OK && c.create) {
+        if (read != S_OK && create) {
             SceneIsCurrent();
             EXPECT_CALL(classes, CreateInstance(nullptr, IID_IGWProperties, _)).WillOnce(GiveOut<2>(&made));
-            EXPECT_CALL(scene, AddProperty(kSomeId, &made, 4, 0x8000u)).WillOnce(Return(c.expected));
+            EXPECT_CALL(scene, AddProperty(kSomeId, &made, 4, 0x8000u)).WillOnce(Return(expected));
         }
-        EXPECT_EQ(KXGetCurrentSceneProperty(kSomeId, value, c.create), c.expected);
-        EXPECT_EQ(value.vt, c.type);
-        if (c.type == VT_UNKNOWN) {
-            EXPECT_EQ(value.punkVal, static_cast<IUnknown*>(&made));
-        }
+        EXPECT_EQ(KXGetCurrentSceneProperty(kSomeId, value, create), expected);
+        EXPECT_EQ(value.vt, type);
+        EXPECT_TRUE(type != VT_UNKNOWN || value.punkVal == static_cast<IUnknown*>(&made));
     }
     EXPECT_EQ(made.Extra(), 0u);
 }

@@ -1,5 +1,6 @@
 // Scene access on the reference scene: what a plug-in sees when it works on a real scene.
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -80,19 +81,15 @@ TEST_F(ReferenceScene, ObjectsAreCreatedAddedFoundByNameAndRemoved) {
 
 TEST_F(ReferenceScene, PropsListListsThePropertiesOfAClassOrAnswersFalse) {
     ut::ComPtr<I3DObject> arm = Find(L"Arm"), light = Find(L"Light");
-    struct Case {
-        I3DObject* object;
-        GUID propertyClass;
-        HRESULT expected;
-        std::vector<std::wstring> names; // "-" for no list at all
-    };
-    const Case cases[] = {{arm.Get(), ut::test::kColor, S_OK, {L"set", L"set"}},
-                          {arm.Get(), ut::test::kX, S_FALSE, {}},
-                          {light.Get(), ut::test::kColor, S_FALSE, {L"-"}}};
-    for (const Case& c : cases) {
+    // The object and the property class; the result and the names listed, "-" for no list at all.
+    const std::tuple<I3DObject*, GUID, HRESULT, std::vector<std::wstring>> cases[] = {
+        {arm.Get(), ut::test::kColor, S_OK, {L"set", L"set"}},
+        {arm.Get(), ut::test::kX, S_FALSE, {}},
+        {light.Get(), ut::test::kColor, S_FALSE, {L"-"}}};
+    for (const auto& [object, propertyClass, expected, names] : cases) {
         ut::ComPtr<I3DList> list;
-        EXPECT_EQ(F3DGetPropsList(c.object, c.propertyClass, list.Put()), c.expected);
-        EXPECT_EQ(list ? Names(list.Get()) : std::vector<std::wstring>{L"-"}, c.names);
+        EXPECT_EQ(F3DGetPropsList(object, propertyClass, list.Put()), expected) << propertyClass.Data1;
+        EXPECT_EQ(list ? Names(list.Get()) : std::vector<std::wstring>{L"-"}, names) << propertyClass.Data1;
     }
 }
 
