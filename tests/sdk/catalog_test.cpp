@@ -1,8 +1,11 @@
+// Text tables, catalogs and logging; module registry keys and string dictionaries.
 #include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
 
+#include <ut/detail/names.h>
+#include <ut/platform/process.h>
 #include <ut/sdk/catalog.h>
 #include <ut/sdk/log.h>
 #include <ut/sdk/resources.h>
@@ -123,6 +126,33 @@ TEST(ErrorHandling, CreatesItsMapOnceAndReportsThroughTheVirtualLog) {
     EXPECT_EQ(handling.ReportMsg(2), KX_E_MSG_NOT_FOUND);
     EXPECT_EQ(handling.mapsCreated, 1);
     EXPECT_EQ(handling.logged, (std::vector<std::wstring>{L"Ann scored 90%", L"Ann scored 90%"}));
+}
+
+HINSTANCE ThisExecutable() {
+    return ut::platform::ModuleOf(reinterpret_cast<const void*>(&ThisExecutable));
+}
+
+TEST(RegistryKey, NamesTheModuleEndsInABackslashAndRefusesWhatItCannotBuild) {
+    wchar_t key[ut::kPathCapacity];
+    ASSERT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"", key, ut::kPathCapacity), ERROR_SUCCESS);
+    EXPECT_STREQ(key, L"Software\\ut\\Modules\\ut_sdk_tests\\");
+    ASSERT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"Views", key, ut::kPathCapacity), ERROR_SUCCESS);
+    EXPECT_STREQ(key, L"Software\\ut\\Modules\\ut_sdk_tests\\Views\\");
+    EXPECT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"", key, 16), ERROR_INSUFFICIENT_BUFFER);
+    EXPECT_STREQ(key, L"");
+    EXPECT_EQ(GWResourceConstructRegKey(nullptr, L"", key, 16), ERROR_INVALID_PARAMETER);
+    EXPECT_EQ(GWResourceConstructRegKey(ThisExecutable(), L"", nullptr, 16), ERROR_INVALID_PARAMETER);
+}
+
+TEST(Dictionaries, AreFoundByNameUntilUnregistered) {
+    HINSTANCE self = ThisExecutable();
+    ASSERT_EQ(KXDictRegisterInstance(self, L"TESTDICT"), S_OK);
+    EXPECT_EQ(KXDictFindInstance(L"TESTDICT"), self);
+    EXPECT_EQ(KXDictUnregisterInstance(L"TESTDICT"), S_OK);
+    EXPECT_EQ(KXDictFindInstance(L"TESTDICT"), nullptr);
+    EXPECT_EQ(KXDictUnregisterInstance(L"TESTDICT"), S_FALSE);
+    EXPECT_EQ(KXDictRegisterInstance(nullptr, L"TESTDICT"), E_INVALIDARG);
+    EXPECT_EQ(KXDictRegisterInstance(self, L""), E_INVALIDARG);
 }
 
 } // namespace

@@ -64,18 +64,16 @@ TEST(ComClasses, AreEnteredOverAndRemovedOnce) {
     EXPECT_EQ(GWUnregisterCOMObject(clsid), S_FALSE);
 }
 
-struct Cleaning {
-    const char* label;
-    std::vector<std::wstring> keys; // below HKEY_LOCAL_MACHINE; "=" at the end gives the key a value
-    std::wstring clean;
-    HRESULT result;
-    std::vector<std::wstring> remaining;
-    std::vector<std::wstring> gone;
-};
-
 TEST(CleaningKeys, DropsWhatIsEmptyUpToTheCategory) {
     const std::wstring m = L"Software\\ut\\Modules\\cleaning";
     const std::wstring cat = m + L"\\Cat", a = cat + L"\\A";
+    struct Cleaning {
+        const char* label;
+        std::vector<std::wstring> keys; // below HKEY_LOCAL_MACHINE; "=" at the end gives the key a value
+        std::wstring clean;
+        HRESULT result;
+        std::vector<std::wstring> remaining, gone;
+    };
     // clang-format off
     const Cleaning cases[] = {
         {"class key and category", {a}, a, S_OK, {m}, {cat}},
@@ -94,23 +92,21 @@ TEST(CleaningKeys, DropsWhatIsEmptyUpToTheCategory) {
     for (const Cleaning& c : cases) {
         SCOPED_TRACE(c.label);
         ut::test::RegistrationScope scope;
-        for (std::wstring path : c.keys) {
+        for (const std::wstring& path : c.keys) {
             bool valued = path.back() == L'=';
-            if (valued)
-                path.pop_back();
             UniqueHKey key;
-            ASSERT_EQ(ut::sdk::CreateKey(HKEY_LOCAL_MACHINE, path.c_str(), key), ERROR_SUCCESS);
+            ASSERT_EQ(
+                ut::sdk::CreateKey(HKEY_LOCAL_MACHINE, path.substr(0, path.size() - valued).c_str(), key),
+                ERROR_SUCCESS);
             if (valued) {
                 ASSERT_EQ(ut::sdk::SetText(key.get(), L"v", L"x"), ERROR_SUCCESS);
             }
         }
         EXPECT_EQ(GwRegCleanKey(HKEY_LOCAL_MACHINE, c.clean.c_str()), c.result);
-        for (const std::wstring& path : c.remaining)
-            EXPECT_TRUE(ut::sdk::OpenKey(HKEY_LOCAL_MACHINE, path.c_str()))
-                << ut::platform::Utf8FromWide(path);
-        for (const std::wstring& path : c.gone)
-            EXPECT_FALSE(ut::sdk::OpenKey(HKEY_LOCAL_MACHINE, path.c_str()))
-                << ut::platform::Utf8FromWide(path);
+        for (bool kept : {true, false})
+            for (const std::wstring& path : kept ? c.remaining : c.gone)
+                EXPECT_EQ(bool(ut::sdk::OpenKey(HKEY_LOCAL_MACHINE, path.c_str())), kept)
+                    << ut::platform::Utf8FromWide(path);
     }
     EXPECT_EQ(GwRegCleanKey(HKEY_LOCAL_MACHINE, nullptr), E_INVALIDARG);
 }

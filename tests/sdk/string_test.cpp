@@ -1,6 +1,8 @@
 // CKXString's operations.
 #include <cstdlib>
 #include <cstring>
+#include <iterator>
+#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -11,14 +13,11 @@ namespace {
 TEST(CKXString, SlicesClampOutOfRangeCounts) {
     struct Case {
         int count;
-        const wchar_t* left;
-        const wchar_t* right;
-        const wchar_t* truncatedLeft;
-        const wchar_t* truncatedRight;
+        const wchar_t *left, *right, *truncatedLeft, *truncatedRight;
     };
     const Case cases[] = {
-        {0, L"", L"", L"scene", L"scene"},     {2, L"sc", L"ne", L"ene", L"sce"},
-        {5, L"scene", L"scene", L"", L""},     {9, L"scene", L"scene", L"", L""},
+        {0, L"", L"", L"scene", L"scene"},  {2, L"sc", L"ne", L"ene", L"sce"},
+        {5, L"scene", L"scene", L"", L""},  {9, L"scene", L"scene", L"", L""},
         {-3, L"", L"", L"scene", L"scene"},
     };
     for (const Case& c : cases) {
@@ -33,8 +32,8 @@ TEST(CKXString, SlicesClampOutOfRangeCounts) {
     }
 }
 
-TEST(CKXString, ComparesWithAndWithoutCase) {
-    CKXString s(L"Render");
+TEST(CKXString, ComparesWithAndWithoutCaseAndFinds) {
+    CKXString s(L"Render"), dotted(L"a.b.c");
     EXPECT_EQ(s.Compare(L"Render"), 0);
     EXPECT_LT(s.Compare(L"render"), 0);
     EXPECT_EQ(s.Compare(L"RENDER", true), 0);
@@ -43,27 +42,20 @@ TEST(CKXString, ComparesWithAndWithoutCase) {
     EXPECT_LT(s.Compare(L"Renderer"), 0);
     EXPECT_GT(s.Compare(nullptr), 0);
     EXPECT_EQ(CKXString().Compare(nullptr), 0);
-}
-
-TEST(CKXString, FindsCharactersAndText) {
-    CKXString s(L"a.b.c");
-    EXPECT_EQ(s.Find(L'.'), 1);
-    EXPECT_EQ(s.Find(L'.', 2), 3);
-    EXPECT_EQ(s.Find(L"b.c"), 2);
-    EXPECT_EQ(s.Find(L'x'), -1);
-    EXPECT_EQ(s.Find(L'.', 9), -1);
-    EXPECT_EQ(s.Find(static_cast<const wchar_t*>(nullptr)), -1);
+    const int found[] = {dotted.Find(L'.'),    dotted.Find(L'.', 2),
+                         dotted.Find(L"b.c"),  dotted.Find(L'x'),
+                         dotted.Find(L'.', 9), dotted.Find(static_cast<const wchar_t*>(nullptr))};
+    EXPECT_EQ(std::vector<int>(std::begin(found), std::end(found)), (std::vector<int>{1, 3, 2, -1, -1, -1}));
 }
 
 TEST(CKXString, AttachTakesOverBuffersOfBothAllocators) {
-    auto* crt = static_cast<wchar_t*>(std::malloc(4 * sizeof(wchar_t)));
-    std::memcpy(crt, L"crt", 4 * sizeof(wchar_t));
+    auto* crt =
+        static_cast<wchar_t*>(std::memcpy(std::malloc(8 * sizeof(wchar_t)), L"crt", 4 * sizeof(wchar_t)));
     CKXString a;
     a.Attach_CRT(crt);
     EXPECT_EQ(a, L"crt");
-
-    auto* ole = static_cast<wchar_t*>(CoTaskMemAlloc(4 * sizeof(wchar_t)));
-    std::memcpy(ole, L"ole", 4 * sizeof(wchar_t));
+    auto* ole =
+        static_cast<wchar_t*>(std::memcpy(CoTaskMemAlloc(8 * sizeof(wchar_t)), L"ole", 4 * sizeof(wchar_t)));
     a.Attach_OLE(ole);
     EXPECT_EQ(a, L"ole");
 
