@@ -23,9 +23,7 @@ const unsigned char* Bytes(const std::string& text) {
 
 // The sign of each form on the same ASCII text; they must agree.
 struct Signs {
-    int wide;
-    int multibyte;
-    int narrow;
+    int wide, multibyte, narrow;
 };
 Signs Compare(const std::string& lhs, const std::string& rhs) {
     return {Sign(F3Dwcsicmpnum(Widen(lhs).c_str(), Widen(rhs).c_str())),
@@ -34,8 +32,7 @@ Signs Compare(const std::string& lhs, const std::string& rhs) {
 
 TEST(NumericCompare, OrdersTrailingNumbersByValueInEveryForm) {
     struct Case {
-        const char* lhs;
-        const char* rhs;
+        const char *lhs, *rhs;
         int sign;
     };
     const Case cases[] = {
@@ -103,27 +100,21 @@ TEST(NumericCompare, IsAConsistentOrderAlikeInEveryFormOnGeneratedNames) {
 }
 
 // Switches LC_ALL to the first of `names` the C library knows, and back at the end.
-class LocaleScope {
-public:
-    explicit LocaleScope(std::initializer_list<const char*> names)
-        : previous_(std::setlocale(LC_ALL, nullptr)) {
+struct LocaleScope {
+    explicit LocaleScope(std::initializer_list<const char*> names) {
         for (const char* name : names)
-            if (std::setlocale(LC_ALL, name)) {
-                active_ = true;
+            if ((active = std::setlocale(LC_ALL, name) != nullptr))
                 return;
-            }
     }
-    ~LocaleScope() { std::setlocale(LC_ALL, previous_.c_str()); }
-    bool Active() const { return active_; }
+    ~LocaleScope() { std::setlocale(LC_ALL, previous.c_str()); }
 
-private:
-    std::string previous_;
-    bool active_ = false;
+    std::string previous = std::setlocale(LC_ALL, nullptr);
+    bool active = false;
 };
 
 TEST(NumericCompare, FoldsCaseBeyondAsciiUnderTheCurrentLocale) {
     LocaleScope locale({"C.UTF-8", "en_US.UTF-8", ".UTF-8", "English_United States.1252"});
-    if (!locale.Active())
+    if (!locale.active)
         GTEST_SKIP() << "no locale with case folding beyond ASCII";
     EXPECT_EQ(Sign(F3Dwcsicmpnum(L"\u00C9clair10", L"\u00E9clair9")), 1);
     EXPECT_EQ(Sign(F3Dwcsicmpnum(L"\u00C9t\u00C9", L"\u00E9t\u00E9")), 0);
@@ -132,7 +123,7 @@ TEST(NumericCompare, FoldsCaseBeyondAsciiUnderTheCurrentLocale) {
 
 TEST(NumericCompare, MultibyteFormSeeksDigitsAtTheCharacterCountAsByteOffset) {
     LocaleScope locale({"C.UTF-8", "en_US.UTF-8", ".UTF-8"});
-    if (!locale.Active() || MB_CUR_MAX < 2)
+    if (!locale.active || MB_CUR_MAX < 2)
         GTEST_SKIP() << "no UTF-8 locale";
     // "éé12" has 4 characters in 6 bytes: the search starts at byte 4 and finds no digit before
     // it, so both sides compare as plain text, '1' before '5'. The narrow form sees 12 and 5.

@@ -1,7 +1,5 @@
 #include <cstdio>
 #include <cstring>
-#include <fstream>
-#include <sstream>
 #include <string>
 #include <vector>
 
@@ -14,6 +12,7 @@
 #include <ut/platform/text.h>
 #include <ut/scene.h>
 #include <ut/sdk/application.h>
+#include <ut/sdk/detail/registry.h>
 #include <ut/sdk/objects.h>
 
 #include "support/fault_plan.h"
@@ -63,24 +62,19 @@ struct Entry {
 };
 
 VARIANT Value(VARTYPE type, LONGLONG bits = 0) {
-    VARIANT value;
-    VariantInit(&value);
+    VARIANT value{};
     value.vt = type;
     value.llVal = bits;
     return value;
 }
-template <class T>
-VARIANT Pointer(VARTYPE type, T* pointer) {
+VARIANT Pointer(VARTYPE type, const void* pointer) {
     VARIANT value = Value(type);
-    value.byref = const_cast<void*>(static_cast<const void*>(pointer));
+    value.byref = const_cast<void*>(pointer);
     return value;
 }
 VARIANT Real(VARTYPE type, double number) {
     VARIANT value = Value(type);
-    if (type == VT_R4)
-        value.fltVal = static_cast<float>(number);
-    else
-        value.dblVal = number;
+    type == VT_R4 ? void(value.fltVal = static_cast<float>(number)) : void(value.dblVal = number);
     return value;
 }
 
@@ -140,7 +134,6 @@ std::wstring PropertyLine(const std::wstring& indent, ULONG flags, const wchar_t
 TEST(DumpPropertyContainer, WritesEachTypeAsItsLine) {
     static const char narrow[] = "abc";
     static const wchar_t wide[] = L"w\u00e9";
-    static const GUID guid = kId;
     struct Case {
         VARIANT value;
         std::wstring line;
@@ -158,10 +151,10 @@ TEST(DumpPropertyContainer, WritesEachTypeAsItsLine) {
         {Value(VT_BOOL, static_cast<USHORT>(VARIANT_TRUE)), L": BOOL     true\n"},
         {Value(VT_BOOL, 0), L": BOOL     false\n"},
         {Pointer(VT_LPSTR, narrow), L": STRING A [abc]\n"},
-        {Pointer(VT_LPSTR, static_cast<char*>(nullptr)), L": STRING A [<nil>]\n"},
+        {Pointer(VT_LPSTR, nullptr), L": STRING A [<nil>]\n"},
         {Pointer(VT_LPWSTR, wide), L": STRING W [w\u00e9]\n"},
-        {Pointer(VT_LPWSTR, static_cast<wchar_t*>(nullptr)), L": STRING W [<nil>]\n"},
-        {Pointer(VT_UNKNOWN, static_cast<IUnknown*>(nullptr)), L": IUnknown 00000000\n"},
+        {Pointer(VT_LPWSTR, nullptr), L": STRING W [<nil>]\n"},
+        {Pointer(VT_UNKNOWN, nullptr), L": IUnknown 00000000\n"},
         {Value(VT_EMPTY), L": No idea what this is...(0)\n"},
         {Value(VT_BSTR), L": No idea what this is...(8)\n"},
         {Value(VT_I8, 5), L": No idea what this is...(20)\n"},
@@ -176,8 +169,8 @@ TEST(DumpPropertyContainer, WritesEachTypeAsItsLine) {
             << "type " << c.value.vt;
     }
     // A GUID value is a task-allocated copy that the dump frees with the entry.
-    GUID* copy = static_cast<GUID*>(CoTaskMemAlloc(sizeof(GUID)));
-    *copy = guid;
+    auto* copy = static_cast<GUID*>(CoTaskMemAlloc(sizeof(GUID)));
+    *copy = kId;
     Container holder({{kId, 1, L"a name longer than twenty", Pointer(GW_VT_GUID, copy)}});
     wchar_t label[] = L"";
     KXDumpPropertyContainer(&holder.properties, label);
@@ -246,17 +239,12 @@ TEST(DumpPropertyContainer, EndsQuietlyWhenTheEnumerationFails) {
 
 // Writes the default value of the class's in-process server key (none when `server` is null).
 void RegisterServer(const GUID& clsid, const wchar_t* server) {
-    std::wstring key = L"CLSID\\" + ut::GuidToString(clsid) + L"\\InprocServer32";
-    HKEY created = nullptr;
-    ASSERT_EQ(RegCreateKeyExW(HKEY_CLASSES_ROOT, key.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr,
-                              &created, nullptr),
-              ERROR_SUCCESS);
-    ut::UniqueHKey owner(created);
-    if (!server)
-        return;
-    ASSERT_EQ(RegSetValueExW(created, nullptr, 0, REG_SZ, reinterpret_cast<const BYTE*>(server),
-                             static_cast<DWORD>((std::wcslen(server) + 1) * sizeof(wchar_t))),
-              ERROR_SUCCESS);
+    ut::UniqueHKey key;
+    std::wstring path = L"CLSID\\" + ut::GuidToString(clsid) + L"\\InprocServer32";
+    ASSERT_EQ(ut::sdk::CreateKey(HKEY_CLASSES_ROOT, path.c_str(), key), ERROR_SUCCESS);
+    if (server) {
+        ASSERT_EQ(ut::sdk::SetText(key.get(), nullptr, server), ERROR_SUCCESS);
+    }
 }
 
 std::string FileText(std::FILE* file) {
@@ -342,10 +330,7 @@ protected:
         return object;
     }
     std::string Log() const {
-        std::ifstream in(std::filesystem::path(log_), std::ios::binary);
-        std::stringstream text;
-        text << in.rdbuf();
-        std::string log = text.str();
+        std::string log = ut::test::FileContent(log_);
         std::erase(log, '\r'); // the log is a text file: Windows ends its lines with "\r\n"
         return log;
     }

@@ -14,6 +14,7 @@
 #include <ut/sdk/testing.h>
 #include <ut/time.h>
 
+#include "scene/test_scene.h"
 #include "support/fault_plan.h"
 
 namespace {
@@ -33,19 +34,14 @@ std::string Words(Values... values) {
     std::ostringstream text;
     auto word = [&](auto value) {
         if constexpr (std::is_same_v<decltype(value), HRESULT>)
-            text << (value == S_OK      ? "S_OK"
-                     : value == S_FALSE ? "S_FALSE"
-                     : value == E_FAIL  ? "E_FAIL"
-                                        : "other");
+            text << " " << ut::test::Result(value);
         else if constexpr (std::is_same_v<decltype(value), tagGWTIME>)
-            text << value.format << " " << value.rate << " " << value.time;
+            text << " " << value.format << " " << value.rate << " " << value.time;
         else
-            text << value;
-        text << " ";
+            text << " " << value;
     };
     (word(values), ...);
-    std::string words = text.str();
-    return words.substr(0, words.size() - 1);
+    return text.str().substr(1);
 }
 
 // Every test leaves the render time undefined, as the library starts.
@@ -95,18 +91,11 @@ TEST_F(TimeTest, ConversionsCountInTheFormatsOwnRateExceptForFramesFieldsAndSamp
 TEST_F(TimeTest, NearestFrameRoundsDownAfterAnEpsilonOfBias) {
     const double eps = CGWTime::Epsilon;
     // Beyond 32 bits, and NaN, give the 32-bit home's indefinite integer.
-    const std::pair<double, LONG> cases[] = {{24.0 - eps / 2, 24},
-                                             {24.0 - 2 * eps, 23},
-                                             {23.6, 23},
-                                             {24.1, 24},
-                                             {0.0, 0},
-                                             {-eps / 2, 0},
-                                             {-0.5, -1},
-                                             {-24.0, -24},
-                                             {1.0e6, 1000000},
-                                             {2147483648.0, kIndefinite},
-                                             {-1e12, kIndefinite},
-                                             {kNaN, kIndefinite}};
+    // clang-format off
+    const std::pair<double, LONG> cases[] = {
+        {24.0 - eps / 2, 24}, {24.0 - 2 * eps, 23}, {23.6, 23}, {24.1, 24}, {0.0, 0}, {-eps / 2, 0}, {-0.5, -1},
+        {-24.0, -24}, {1.0e6, 1000000}, {2147483648.0, kIndefinite}, {-1e12, kIndefinite}, {kNaN, kIndefinite}};
+    // clang-format on
     ut::host::ReferenceHost host({.timeFormat = GWTIMEFORMAT_FILM, .frameRate = 24.0});
     for (auto [frames, expected] : cases)
         EXPECT_EQ(KXSecondsToNearestFrame(frames / 24.0), expected) << frames << " frames";
@@ -198,62 +187,49 @@ TEST_F(TimeTest, EveryHostFailureFallsBackOrIsReturnedAndLeavesNothingBehind) {
         // Row 0: the clean run; row n: host call n failing.
         std::vector<std::string> outcomes;
     };
+    // clang-format off
     const Scenario scenarios[] = {
         // The time manager is found, then asked; without it the scene counts seconds at rate 1.
-        {"KXGetTimeFormat",
-         [] {
+        {"KXGetTimeFormat", [] {
              tagGWTIMEFORMAT format{};
              double rate = 0.0, ticks = 0.0;
              HRESULT hr = KXGetTimeFormat(&format, &rate, &ticks);
-             return Words(hr, format, rate, ticks);
-         },
+             return Words(hr, format, rate, ticks); },
          {"S_OK 1 24 24", "S_FALSE 10 1 1", "S_FALSE 10 1 1"}},
         // The display format is left as the failed query left it.
-        {"KXGetDisplayTimeFormat",
-         [] {
+        {"KXGetDisplayTimeFormat", [] {
              auto display = static_cast<GWTIMEDISPLAYFORMAT>(77);
              tagGWTIMEFORMAT format{};
              HRESULT hr = KXGetDisplayTimeFormat(&display, &format, nullptr, nullptr);
-             return Words(hr, display, format);
-         },
+             return Words(hr, display, format); },
          {"S_OK 1 1", "S_FALSE 77 10", "S_FALSE 77 10"}},
         {"KXFramesToSeconds", [] { return Words(KXFramesToSeconds(48.0)); }, {"2", "48", "48"}},
         // The play position, else the start of the play range, else a default time.
-        {"KXGetCurrentTime",
-         [] {
+        {"KXGetCurrentTime", [] {
              tagGWTIME now = {GWTIMEFORMAT_PAL, 7.0, 7.0};
              HRESULT hr = KXGetCurrentTime(&now);
-             return Words(hr, now);
-         },
+             return Words(hr, now); },
          {"S_OK 1 24 0.25", "S_OK 10 1 0", "S_OK 1 24 0.5", "S_OK 10 1 0"}},
-        {"KXGetCurrentTimeSpan",
-         [] {
+        {"KXGetCurrentTimeSpan", [] {
              tagGWTIMESPAN span{};
              HRESULT hr = KXGetCurrentTimeSpan(&span);
-             return Words(hr, span.start.time);
-         },
+             return Words(hr, span.start.time); },
          {"S_OK 0.5", "E_FAIL 0", "E_FAIL 0"}},
         // Current container (else a new one: creation, factory), key-time property (else the current
         // time: play control, its position), its value, then the conversion's time manager and format.
-        {"KXGetKeyTime",
-         [] {
-             double seconds = -1.0;
-             HRESULT hr = KXGetKeyTime(&seconds);
-             return Words(hr, seconds);
-         },
+        {"KXGetKeyTime", [] { double seconds = -1.0; HRESULT hr = KXGetKeyTime(&seconds); return Words(hr, seconds); },
          {"S_OK 1", "S_OK 0.5", "S_OK 0.25", "E_FAIL -1", "S_OK 24", "S_OK 24"}},
         // Current container, key-time property, time manager, format, the parameter's setter, the
         // refresh; then the key time afterwards.
-        {"KXSetKeyTime",
-         [] {
+        {"KXSetKeyTime", [] {
              HRESULT hr = KXSetKeyTime(2.0, 1, 1);
              ut::sdk::SetHostFaultHook(nullptr); // lifts the fault to read the key time back
              std::string outcome = Words(hr, KeyTime());
              EXPECT_EQ(KXSetKeyTime(1.0, 0, 0), S_OK);
-             return outcome;
-         },
+             return outcome; },
          {"S_OK 2", "S_OK 1", "E_FAIL 1", "S_OK 0.0833333", "S_OK 0.0833333", "E_FAIL 1", "E_FAIL 2"}},
     };
+    // clang-format on
     for (const Scenario& scenario : scenarios) {
         ut::test::WalkHostFaults(scenario.run, [&](int row, const std::string& outcome) {
             ASSERT_LT(row, static_cast<int>(scenario.outcomes.size()))
