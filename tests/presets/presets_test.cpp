@@ -218,13 +218,13 @@ TEST_F(Presets, CreatesObjectsFromFilesAndThroughTheFamilyCommand) {
         {GUID_NULL, temp_ / L"listed/Data/GWPresets/Odd.Preset", nullptr, E_NOINTERFACE, "-", L""},
     };
     for (const Case& c : cases) {
+        SCOPED_TRACE(Narrow(c.name.c_str()) + (c.folders ? " in the extra folder" : ""));
         ut::ClearPresetCache();
         ComPtr<IUnknown> object;
         ComPtr<IGWPreset> preset;
         EXPECT_EQ(KXCreateObjectFromPreset(c.clsid, c.name.c_str(), GUID_NULL, object.PutVoid(), preset.Put(),
                                            c.folders),
-                  c.result)
-            << Narrow(c.name.c_str());
+                  c.result);
         EXPECT_EQ(Describe(object.Get()), c.object);
         wchar_t* file = nullptr;
         HRESULT named = KXGetFilePathFromPreset(preset.Get(), &file);
@@ -313,60 +313,49 @@ TEST_F(Presets, EveryExportSurvivesEveryHostFault) {
         std::function<std::pair<HRESULT, IUnknown*>()> run;
     };
     auto none = [](HRESULT hr) { return std::pair(hr, static_cast<IUnknown*>(nullptr)); };
+    // A run that fails but still hands something out answers E_UNEXPECTED.
+    auto clsidOf = [&](auto find) {
+        GUID clsid = kOther;
+        HRESULT hr = find(&clsid);
+        return none(FAILED(hr) && !IsEqualGUID(clsid, GUID_NULL) ? E_UNEXPECTED : hr);
+    };
+    // clang-format off
     const Walk walks[] = {
-        {"find path",
-         [&] {
+        {"find path", [&] {
              CKXString path;
              HRESULT hr = KXFindPresetPath(kLight, L"Spot.Preset", path);
-             return none(FAILED(hr) && !path.IsEmpty() ? E_UNEXPECTED : hr);
-         }},
-        {"class from file",
-         [&] {
-             GUID clsid = kOther;
-             HRESULT hr = KXGetObjectCLSIDFromPreset(kLight, L"Spot", &clsid);
-             return none(FAILED(hr) && !IsEqualGUID(clsid, GUID_NULL) ? E_UNEXPECTED : hr);
-         }},
+             return none(FAILED(hr) && !path.IsEmpty() ? E_UNEXPECTED : hr); }},
+        {"class from file", [&] { return clsidOf([](GUID* c) { return KXGetObjectCLSIDFromPreset(kLight, L"Spot", c); }); }},
         {"class from command",
-         [&] {
-             GUID clsid = kOther;
-             HRESULT hr = KXGetObjectCLSIDFromPreset(kCommand, kSpotA, L"Factory", &clsid);
-             return none(FAILED(hr) && !IsEqualGUID(clsid, GUID_NULL) ? E_UNEXPECTED : hr);
-         }},
+         [&] { return clsidOf([](GUID* c) { return KXGetObjectCLSIDFromPreset(kCommand, kSpotA, L"Factory", c); }); }},
         {"validate", [&] { return none(KXValidateCmdPreset(kCommand, kSpotB, filePreset.Get())); }},
-        {"load command preset",
-         [&] {
+        {"load command preset", [&] {
              IGWPreset* preset = nullptr;
              HRESULT hr = KXLoadCmdPreset(kCommand, kSpotA, factory.data(), &preset);
-             return std::pair(hr, static_cast<IUnknown*>(preset));
-         }},
-        {"create from file",
-         [&] {
+             return std::pair(hr, static_cast<IUnknown*>(preset)); }},
+        {"create from file", [&] {
              IUnknown* object = nullptr;
              IGWPreset* preset = nullptr;
-             HRESULT hr = KXCreateObjectFromPreset(kLight, L"Spot", IID_IUnknown,
-                                                   reinterpret_cast<void**>(&object), &preset, nullptr);
+             HRESULT hr = KXCreateObjectFromPreset(kLight, L"Spot", IID_IUnknown, reinterpret_cast<void**>(&object),
+                                                   &preset, nullptr);
              if (preset && object)
                  preset->Release();
              else if (preset)
                  object = preset;
-             return std::pair(hr, object);
-         }},
-        {"create by command",
-         [&] {
+             return std::pair(hr, object); }},
+        {"create by command", [&] {
              IUnknown* object = nullptr;
-             HRESULT hr = KXCreateObjectFromPreset(kLight, L"Factory", GUID_NULL,
-                                                   reinterpret_cast<void**>(&object), nullptr, nullptr);
-             return std::pair(hr, object);
-         }},
-        {"file of a preset",
-         [&] {
+             HRESULT hr = KXCreateObjectFromPreset(kLight, L"Factory", GUID_NULL, reinterpret_cast<void**>(&object),
+                                                   nullptr, nullptr);
+             return std::pair(hr, object); }},
+        {"file of a preset", [&] {
              wchar_t* file = nullptr;
              HRESULT hr = KXGetFilePathFromPreset(filePreset.Get(), &file);
              bool handedOut = file != nullptr;
              delete[] file;
-             return none(FAILED(hr) && handedOut ? E_UNEXPECTED : hr);
-         }},
+             return none(FAILED(hr) && handedOut ? E_UNEXPECTED : hr); }},
     };
+    // clang-format on
     int walked = 0;
     for (const Walk& walk : walks) {
         ut::test::WalkHostFaults(

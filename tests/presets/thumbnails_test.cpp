@@ -380,14 +380,12 @@ TEST(Thumbnails, ChecksPointersAndArguments) {
     HBITMAP bitmap = nullptr, none = nullptr;
     ASSERT_EQ(KXImageHlp::CreateBitmapFromImage(image.Get(), &bitmap), S_OK);
     const double nan = std::nan("");
+    // clang-format off
     const std::pair<HRESULT, std::string> cases[] = {
-        {KXIsThumbnailAvaiable(nullptr), "E_POINTER"},
-        {KXGetThumbnail(nullptr), "E_POINTER"},
-        {GWSetThumbnail(nullptr, storage.Get()), "E_POINTER"},
-        {GWSetThumbnail(image.Get(), nullptr), "E_POINTER"},
+        {KXIsThumbnailAvaiable(nullptr), "E_POINTER"}, {KXGetThumbnail(nullptr), "E_POINTER"},
+        {GWSetThumbnail(nullptr, storage.Get()), "E_POINTER"}, {GWSetThumbnail(image.Get(), nullptr), "E_POINTER"},
         {GWSetThumbnail(empty.Get(), storage.Get()), "E_INVALIDARG"},
-        {GWGetThumbnail(nullptr, out.Put()), "E_POINTER"},
-        {GWGetThumbnail(storage.Get(), nullptr), "E_POINTER"},
+        {GWGetThumbnail(nullptr, out.Put()), "E_POINTER"}, {GWGetThumbnail(storage.Get(), nullptr), "E_POINTER"},
         {GWGetThumbnail(storage.Get(), out.Put()), "S_FALSE"},
         {GWGetGwImageFromThumbnail(nullptr, 4, 2, GWPIXELFORMAT_RGBA32, out.Put()), "E_INVALIDARG"},
         {GWGetGwImageFromThumbnail(bitmap, 64, 64, GWPIXELFORMAT_RGBA32, out.Put()), "E_INVALIDARG"},
@@ -403,9 +401,9 @@ TEST(Thumbnails, ChecksPointersAndArguments) {
         {kxILScaleTranslateImage(image.Get(), image.Get(), 1, 1, 0, 0, 2), "E_INVALIDARG"},
         {KXImageHlp::CreateBitmapFromImage(empty.Get(), &none), "E_INVALIDARG"},
         {KXImageHlp::CreateBitmapFromImage(nullptr, &none), "E_POINTER"},
-        {setup->SetPixelFormat(GUID_NULL), "E_INVALIDARG"},
-        {setup->SetSize(1u << 16, 1), "E_INVALIDARG"},
+        {setup->SetPixelFormat(GUID_NULL), "E_INVALIDARG"}, {setup->SetSize(1u << 16, 1), "E_INVALIDARG"},
     };
+    // clang-format on
     for (std::size_t i = 0; i < std::size(cases); ++i)
         EXPECT_EQ(Result(cases[i].first), cases[i].second) << "case " << i;
     EXPECT_FALSE(out);
@@ -427,31 +425,22 @@ TEST(Thumbnails, EveryExportSurvivesEveryHostFault) {
         std::set<std::string> answers; // what a failing host call may give
         std::function<bool()> clean;   // what must hold after a failing run
     };
+    // clang-format off
     const Walk walks[] = {
-        {"available",
-         [&] { return KXIsThumbnailAvaiable(&available); },
-         {"S_OK"},
-         [&] { return available == 0; }},
-        {"get",
-         [&] {
+        {"available", [&] { return KXIsThumbnailAvaiable(&available); }, {"S_OK"}, [&] { return available == 0; }},
+        {"get", [&] {
              HBITMAP bitmap = nullptr;
              HRESULT hr = KXGetThumbnail(&bitmap);
              if (bitmap && FAILED(hr))
                  return E_UNEXPECTED; // a bitmap handed out with a failure
              if (bitmap)
                  (void)DeleteObject(bitmap);
-             return hr;
-         },
-         {"E_FAIL", "DENIED"},
-         [] { return true; }},
-        {"put",
-         [&] {
-             folder.Write(L"scene.scn", original);
-             return KXPutThumnailInFile(CKXString(scene.c_str()));
-         },
-         {"S_FALSE", "DENIED"},
-         [&] { return ut::test::FileContent(scene) == original; }},
+             return hr; },
+         {"E_FAIL", "DENIED"}, [] { return true; }},
+        {"put", [&] { folder.Write(L"scene.scn", original); return KXPutThumnailInFile(CKXString(scene.c_str())); },
+         {"S_FALSE", "DENIED"}, [&] { return ut::test::FileContent(scene) == original; }},
     };
+    // clang-format on
     int walked = 0;
     for (const Walk& walk : walks) {
         ut::test::WalkHostFaults([&] { return walk.run(); },

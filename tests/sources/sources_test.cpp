@@ -314,38 +314,29 @@ TEST_F(Sources, EveryExportSurvivesEveryHostFault) {
     // A failing call that a walk passes over by design (a member whose class cannot be read is
     // not of the class; a missing container is made anew) leaves the answer a success.
     const std::set<std::string> failOrNone = {"E_FAIL", "S_FALSE", "S_OK"};
+    IUnknown* const nothing = nullptr;
+    // clang-format off
     const Walk walks[] = {
-        {"sources container",
-         handing([](void** out) { return F3DGetSourcesContainer(IID_IUnknown, out); }),
-         {"DENIED"}},
-        {"sources list", handing([](void** out) {
-             return F3DGetSourcesList(CLSID_3DImageSource, reinterpret_cast<I3DList**>(out));
-         }),
+        {"sources container", handing([](void** out) { return F3DGetSourcesContainer(IID_IUnknown, out); }), {"DENIED"}},
+        {"sources list",
+         handing([](void** out) { return F3DGetSourcesList(CLSID_3DImageSource, reinterpret_cast<I3DList**>(out)); }),
          failOrNone},
-        {"find source", handing([&](void** out) {
-             return F3DFindSource(CLSID_3DImageSource, platePath, IID_IUnknown, out);
-         }),
+        {"find source",
+         handing([&](void** out) { return F3DFindSource(CLSID_3DImageSource, platePath, IID_IUnknown, out); }),
          failOrNone},
-        {"find all sources",
-         handing([&](void** out) {
-             return F3DFindAllSources(CLSID_3DImageSource, cleanPath, reinterpret_cast<I3DList**>(out));
-         }),
+        {"find all sources", handing([&](void** out) {
+             return F3DFindAllSources(CLSID_3DImageSource, cleanPath, reinterpret_cast<I3DList**>(out)); }),
          {"DENIED", "E_FAIL", "S_FALSE", "S_OK"}},
-        {"find clip", handing([&](void** out) { return F3DFindImageClip(plate.Get(), IID_IUnknown, out); }),
-         failOrNone},
+        {"find clip", handing([&](void** out) { return F3DFindImageClip(plate.Get(), IID_IUnknown, out); }), failOrNone},
         {"top-most operator",
          handing([&](void** out) { return F3DGetTopMostOp(arm.Get(), 0, 0, kBlur, IID_IUnknown, out); }),
          {"NOTFOUND", "S_OK"}},
         {"primary folder",
-         handing([&](void** out) { return KXGetPrimaryFolderForAction(arm.Get(), IID_IUnknown, out); }),
-         {"E_FAIL"}},
-        {"source names",
-         [&] { return std::pair(F3DMakeSourceList(entries, true), static_cast<IUnknown*>(nullptr)); },
-         {"E_FAIL", "S_FALSE", "S_OK"}},
-        {"clip names",
-         [&] { return std::pair(F3DMakeClipList(entries, false), static_cast<IUnknown*>(nullptr)); },
-         {"E_FAIL", "S_FALSE", "S_OK"}},
+         handing([&](void** out) { return KXGetPrimaryFolderForAction(arm.Get(), IID_IUnknown, out); }), {"E_FAIL"}},
+        {"source names", [&] { return std::pair(F3DMakeSourceList(entries, true), nothing); }, failOrNone},
+        {"clip names", [&] { return std::pair(F3DMakeClipList(entries, false), nothing); }, failOrNone},
     };
+    // clang-format on
     int walked = 0;
     for (const Walk& walk : walks) {
         ut::test::WalkHostFaults([&] { return ut::test::Released(walk.run()); },
