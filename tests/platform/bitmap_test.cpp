@@ -1,8 +1,5 @@
 // Device contexts, sections and stretching as an image is brought onto the screen device, alike
 // on both homes, and the two ways to look at a bitmap.
-#include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <string>
 #include <vector>
 
@@ -18,13 +15,7 @@ constexpr std::uint32_t kColour = 0x00FFFFFF; // drawing need not keep the fourt
 
 // A 32-bit bottom-up section whose pixels, top row first, are `topDown`.
 HBITMAP Section(HDC dc, LONG width, LONG height, const std::vector<std::uint32_t>& topDown) {
-    BITMAPINFO info{};
-    info.bmiHeader.biSize = sizeof(BITMAPINFOHEADER);
-    info.bmiHeader.biWidth = width;
-    info.bmiHeader.biHeight = height;
-    info.bmiHeader.biPlanes = 1;
-    info.bmiHeader.biBitCount = 32;
-    info.bmiHeader.biCompression = BI_RGB;
+    BITMAPINFO info{{sizeof(BITMAPINFOHEADER), width, height, 1, 32, BI_RGB, 0, 0, 0, 0, 0}, {}};
     void* bits = nullptr;
     HBITMAP section = CreateDIBSection(dc, &info, DIB_RGB_COLORS, &bits, nullptr, 0);
     EXPECT_NE(section, nullptr);
@@ -138,8 +129,7 @@ TEST_F(BitmapTest, ABitmapIsReadTopRowFirstAndWrittenAsABmpFile) {
     ut::test::TempFolder folder;
     std::wstring path = folder / L"picture.bmp";
     ASSERT_EQ(ut::platform::WriteBitmapFile(section, path.c_str()), S_OK);
-    std::ifstream in(std::filesystem::path(path), std::ios::binary);
-    std::string file((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+    std::string file = ut::test::FileContent(path);
     ASSERT_EQ(file.size(), 54u + 3 * 2 * 4);
     EXPECT_EQ(file.substr(0, 2), "BM");
     EXPECT_EQ(file[28], 32); // bits per pixel

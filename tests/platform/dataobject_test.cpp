@@ -71,14 +71,12 @@ TEST(DropFiles, NamesCountLengthsAndCutCopies) {
     auto drop = static_cast<HDROP>(block.get());
     EXPECT_EQ(DragQueryFileW(drop, 0xFFFFFFFF, nullptr, 0), 3u);
     wchar_t buffer[64];
-    const std::tuple<UINT, UINT, UINT, const wchar_t*> cases[] = {
-        // index, room, length, text
-        {0, 64, 19, L"C:\\scenes\\first.scn"},
-        {1, 64, 19, L"/renders/second.avi"},
-        {2, 64, 1, L"x"},
-        {0, 6, 5, L"C:\\sc"},
-        {1, 1, 0, L""},
-    };
+    // The index, the room given, the length answered and the text copied.
+    const std::tuple<UINT, UINT, UINT, const wchar_t*> cases[] = {{0, 64, 19, L"C:\\scenes\\first.scn"},
+                                                                  {1, 64, 19, L"/renders/second.avi"},
+                                                                  {2, 64, 1, L"x"},
+                                                                  {0, 6, 5, L"C:\\sc"},
+                                                                  {1, 1, 0, L""}};
     for (const auto& [index, room, length, text] : cases) {
         EXPECT_EQ(DragQueryFileW(drop, index, buffer, room), length) << index;
         EXPECT_STREQ(buffer, text) << index;

@@ -133,8 +133,7 @@ TEST(RegistryStore, AKilledWriterLosesNothingThatHadReturned) {
 
 TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
     TempFolder temp;
-    const fs::path& folder = temp.Root();
-    fs::path store = folder / "store.db";
+    fs::path folder = temp.Root(), store = folder / "store.db";
     {
         StoreSwitch use(store);
         ASSERT_EQ(
@@ -152,7 +151,6 @@ TEST(RegistryStore, AReadOnlyStoreRefusesWritesAndStaysAsItWas) {
 
 TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
     TempFolder temp;
-    const fs::path& folder = temp.Root();
     auto sql = [](const fs::path& path, const char* statements) {
         sqlite3* db = nullptr;
         sqlite3_open(path.c_str(), &db);
@@ -190,7 +188,7 @@ TEST(RegistryStore, WhatIsNotAStoreIsRefusedOnceAndLeftUntouched) {
     };
     for (const auto& [label, make] : cases) {
         SCOPED_TRACE(label);
-        fs::path path = folder / (std::string(label) + ".db");
+        fs::path path = temp.Root() / (std::string(label) + ".db");
         make(path);
         std::string before = FileContent(path);
         {
@@ -221,13 +219,12 @@ TEST(RegistryStore, LivesWhereTheEnvironmentSaysAndMakesItsFolders) {
         EXPECT_EQ(ut::platform::RegistryStorePath(), expected);
     }
     TempFolder temp;
-    const fs::path& folder = temp.Root();
-    Variable data("XDG_DATA_HOME", folder.c_str());
+    Variable data("XDG_DATA_HOME", temp.Root().c_str());
     {
         StoreSwitch use(""); // the default place
         ASSERT_TRUE(CreateKey(HKEY_LOCAL_MACHINE, L"Software\\ut-tests\\placed"));
     }
-    EXPECT_TRUE(fs::is_regular_file(folder / "ut" / "registry.db"));
+    EXPECT_TRUE(fs::is_regular_file(temp.Root() / "ut" / "registry.db"));
 }
 
 TEST(RegistryStore, ReadsCostTheSameAtEveryStepAndNothingUntilAnotherProcessCommits) {
@@ -259,12 +256,11 @@ TEST(RegistryStore, ReadsCostTheSameAtEveryStepAndNothingUntilAnotherProcessComm
     EXPECT_EQ(ut::platform::GetRegistryStoreCounters().statements, statements);
 
     TempFolder temp;
-    const fs::path& folder = temp.Root();
     std::string path = Narrow(scratch.FullPath()) + "\\hundred";
-    WriteFile(folder / "change.reg", "Windows Registry Editor Version 5.00\n\n[" + path +
-                                         "\\key100005]\n\"Name\"=\"changed\"\n[-" + path + "\\key100006]\n[" +
-                                         path + "\\key100000a]\n");
-    ASSERT_EQ(Child("import " + (folder / "change.reg").string()).Wait(), 0);
+    WriteFile(temp.Root() / "change.reg", "Windows Registry Editor Version 5.00\n\n[" + path +
+                                              "\\key100005]\n\"Name\"=\"changed\"\n[-" + path +
+                                              "\\key100006]\n[" + path + "\\key100000a]\n");
+    ASSERT_EQ(Child("import " + (temp.Root() / "change.reg").string()).Wait(), 0);
     EXPECT_EQ(name(L"key100005").data, TextBytes(L"changed"));
     EXPECT_EQ(name(L"key100006").result, ERROR_INVALID_HANDLE); // no key to read from
     std::vector<std::wstring> names = SubKeyNames(list.get());

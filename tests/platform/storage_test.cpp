@@ -39,6 +39,8 @@ protected:
     std::wstring Sample() {
         std::wstring path = folder_ / L"sample.cfb";
         ComPtr<IStorage> root = CreateCompound(path), sub;
+        if (!root)
+            return path;
         EXPECT_EQ(root->SetClass(kRootClass), S_OK);
         for (std::size_t size : kSizes)
             EXPECT_EQ(PutStream(root.Get(), (L"s" + std::to_wstring(size)).c_str(), Pattern(size, 1)), S_OK);

@@ -1,5 +1,6 @@
 // VARIANT, BSTR and SAFEARRAY basics.
 #include <cstring>
+#include <utility>
 
 #include <gtest/gtest.h>
 
@@ -46,14 +47,12 @@ TEST(SafeArray, ReportsBoundsPerDimensionLeftMostFirst) {
     ut::UniqueSafeArray array(SafeArrayCreate(VT_I4, 2, bounds));
     ASSERT_TRUE(array);
     LONG low = 0, high = 0;
-    ASSERT_EQ(SafeArrayGetLBound(array.get(), 1, &low), S_OK);
-    ASSERT_EQ(SafeArrayGetUBound(array.get(), 1, &high), S_OK);
-    EXPECT_EQ(low, 1);
-    EXPECT_EQ(high, 3);
-    ASSERT_EQ(SafeArrayGetLBound(array.get(), 2, &low), S_OK);
-    ASSERT_EQ(SafeArrayGetUBound(array.get(), 2, &high), S_OK);
-    EXPECT_EQ(low, -2);
-    EXPECT_EQ(high, 2);
+    const std::pair<UINT, std::pair<LONG, LONG>> dimensions[] = {{1, {1, 3}}, {2, {-2, 2}}};
+    for (const auto& [dimension, expected] : dimensions) {
+        ASSERT_EQ(SafeArrayGetLBound(array.get(), dimension, &low), S_OK);
+        ASSERT_EQ(SafeArrayGetUBound(array.get(), dimension, &high), S_OK);
+        EXPECT_EQ(std::pair(low, high), expected) << dimension;
+    }
     EXPECT_EQ(SafeArrayGetLBound(array.get(), 3, &low), DISP_E_BADINDEX);
     VARTYPE type = VT_EMPTY;
     ASSERT_EQ(SafeArrayGetVartype(array.get(), &type), S_OK);

@@ -5,15 +5,9 @@ set -euo pipefail
 file=$1
 command -v gsf >/dev/null 2>&1 || { echo "gsf is not installed (libgsf-bin)"; exit 77; }
 listing=$(gsf list "$file")
-expect() {
-    grep -Eq "^$1 +$2 +$3\$" <<<"$listing" || { echo "missing from the listing: $1 $2 $3"; echo "$listing"; exit 1; }
-}
-expect f 100 Contents
-expect f 10000 Big
-expect f 0 Empty
-expect d 0 Sub
-expect f 5 Sub/Inner
-expect f 3 n299
+for entry in "f 100 Contents" "f 10000 Big" "f 0 Empty" "d 0 Sub" "f 5 Sub/Inner" "f 3 n299"; do
+    grep -Eq "^${entry// / +}\$" <<<"$listing" || { echo "missing from the listing: $entry"; echo "$listing"; exit 1; }
+done
 [ "$(grep -c ' n[0-9]*$' <<<"$listing")" = 300 ] || { echo "not all 300 small streams are listed"; exit 1; }
 [ "$(gsf cat "$file" n123)" = 123 ] || { echo "n123 reads wrong"; exit 1; }
 # Contents holds the bytes i * 7 + 1.
