@@ -67,11 +67,7 @@ std::wstring Entry(unsigned short id) {
 }
 
 TEST(CommonDialogError, MapsEveryCodeToItsDictionaryEntry) {
-    struct Case {
-        DWORD code;
-        unsigned short entry;
-    };
-    std::vector<Case> cases = {
+    std::vector<std::pair<DWORD, unsigned short>> cases = {
         {0xFFFF, 6022}, {1, 6024},      {2, 6025},      {3, 6026},      {4, 6050},       {5, 6027},
         {6, 6028},      {7, 6029},      {8, 6030},      {9, 6031},      {10, 6032},      {11, 6033},
         {0x2001, 6045}, {0x3001, 6046}, {0x3002, 6047}, {0x3003, 6048}, {12, 6049},      {0x1000, 6049},
@@ -80,11 +76,11 @@ TEST(CommonDialogError, MapsEveryCodeToItsDictionaryEntry) {
     for (DWORD code = 0x1001; code <= 0x100B; ++code)
         cases.push_back({code, static_cast<unsigned short>(6034 + code - 0x1001)});
     std::set<std::wstring> texts;
-    for (const Case& c : cases) {
+    for (auto [code, entry] : cases) {
         wchar_t buffer[300];
         std::wmemset(buffer, L'#', std::size(buffer));
-        KXGetCDError(c.code, buffer, static_cast<int>(std::size(buffer)));
-        EXPECT_EQ(std::wstring(buffer), Entry(c.entry)) << "code " << c.code;
+        KXGetCDError(code, buffer, static_cast<int>(std::size(buffer)));
+        EXPECT_EQ(std::wstring(buffer), Entry(entry)) << "code " << code;
         texts.insert(buffer);
     }
     // Every entry from 6022 to 6050 but 6023 has a text of its own.
@@ -211,12 +207,8 @@ class RecordingDialogs : public ut::test::ComMock<IGWFileDialogs> {
 public:
     RecordingDialogs() : ComMock(IID_IGWFileDialogs) {}
 
-    HRESULT STDMETHODCALLTYPE ShowOpenDialog(OPENFILENAMEW* record) override {
-        return Record(L"open", record);
-    }
-    HRESULT STDMETHODCALLTYPE ShowSaveDialog(OPENFILENAMEW* record) override {
-        return Record(L"save", record);
-    }
+    HRESULT STDMETHODCALLTYPE ShowOpenDialog(OPENFILENAMEW* r) override { return Record(L"open", r); }
+    HRESULT STDMETHODCALLTYPE ShowSaveDialog(OPENFILENAMEW* r) override { return Record(L"save", r); }
     HRESULT STDMETHODCALLTYPE GetExtendedError(DWORD*) override { return E_NOTIMPL; }
 
     std::wstring dialog;
