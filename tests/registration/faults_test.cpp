@@ -29,12 +29,8 @@ struct Walk {
     std::function<HRESULT(int n, std::string_view failed)> expected;
 };
 
-HRESULT Propagated(int n, std::string_view) {
-    return n ? kInjected : S_OK;
-}
-HRESULT Ignored(int, std::string_view) {
-    return S_OK;
-}
+const auto Propagated = [](int n, std::string_view) { return n ? kInjected : S_OK; };
+const auto Ignored = [](int, std::string_view) { return S_OK; };
 
 // Runs a listing and frees what it returned.
 HRESULT Freed(const std::function<HRESULT(DWORD*, GUID**)>& listing) {

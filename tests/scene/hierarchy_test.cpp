@@ -251,7 +251,6 @@ TEST(ShaderNameSpaceTraverser, NamesEveryShaderInItsPreferredOrTheGivenNameSpace
     EXPECT_EQ(network.Members(L"Library"), std::vector<std::wstring>{L"Mix"});
     C3DShaderNameSpaceTraverser copy(naming);
     EXPECT_EQ(copy.Traverse(surface.Get(), network.NameSpace(L"Library").Get()), S_FALSE);
-    EXPECT_EQ(copy.OnShader(nullptr), 0);
 }
 
 } // namespace
