@@ -1,10 +1,6 @@
-// A second process for the POSIX registration tests, on the store that UT_REGISTRY names:
-//
-//   registration_child register FIRST COUNT   registers the operators FIRST .. FIRST+COUNT-1, printing
-//                                             each number once its registration has returned
-//   registration_child probe                  as an unprivileged user (when started as root), tries
-//                                             registrations and prints their results
-// Each starts by printing "pid N".
+// The second process of the POSIX registration tests, on the store UT_REGISTRY names; it first
+// prints "pid N". "register FIRST COUNT" registers operators FIRST.. and prints each number once
+// registered; "probe" (as an unprivileged user when started as root) prints registration results.
 #include <cstdio>
 #include <cstdlib>
 #include <string>
