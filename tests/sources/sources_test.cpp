@@ -343,12 +343,12 @@ TEST_F(Sources, EveryExportSurvivesEveryHostFault) {
                                  [&](int row, const std::pair<HRESULT, bool>& outcome) {
                                      if (row == 0)
                                          return;
+                                     SCOPED_TRACE(std::string(walk.name) + " at call " + std::to_string(row));
                                      ++walked;
                                      EXPECT_TRUE(walk.answers.count(Result(outcome.first)))
-                                         << walk.name << " at call " << row << ": " << Result(outcome.first);
+                                         << Result(outcome.first);
                                      bool keepsItsList = std::string(walk.name) == "find all sources";
-                                     EXPECT_TRUE(SUCCEEDED(outcome.first) || keepsItsList || !outcome.second)
-                                         << walk.name << " at call " << row;
+                                     EXPECT_TRUE(SUCCEEDED(outcome.first) || keepsItsList || !outcome.second);
                                  },
                                  E_ACCESSDENIED);
     }

@@ -84,11 +84,11 @@ TEST(NumericCompare, IsAConsistentOrderAlikeInEveryFormOnGeneratedNames) {
     std::vector<int> sign(n * n);
     for (std::size_t i = 0; i < n; ++i) {
         for (std::size_t j = 0; j < n; ++j) {
+            SCOPED_TRACE(names[i] + " vs " + names[j]);
             Signs forward = Compare(names[i], names[j]);
-            ASSERT_EQ(forward.wide, -Sign(F3Dwcsicmpnum(Widen(names[j]).c_str(), Widen(names[i]).c_str())))
-                << names[i] << " vs " << names[j];
-            ASSERT_EQ(forward.multibyte, forward.wide) << names[i] << " vs " << names[j];
-            ASSERT_EQ(forward.narrow, forward.wide) << names[i] << " vs " << names[j];
+            ASSERT_EQ(forward.wide, -Sign(F3Dwcsicmpnum(Widen(names[j]).c_str(), Widen(names[i]).c_str())));
+            ASSERT_EQ(forward.multibyte, forward.wide);
+            ASSERT_EQ(forward.narrow, forward.wide);
             sign[i * n + j] = forward.wide;
         }
     }

@@ -37,20 +37,15 @@ std::wstring Hex(const void* pointer) {
 }
 
 // Collects what the dumps send to the debugger.
-class DebuggerOutput {
-public:
+struct DebuggerOutput {
     DebuggerOutput() {
-        previous_ = ut::SetDumpOutput([this](std::wstring_view text) { text_ += text; });
+        previous = ut::SetDumpOutput([this](std::wstring_view more) { text += more; });
     }
-    ~DebuggerOutput() { ut::SetDumpOutput(previous_); }
-    DebuggerOutput(const DebuggerOutput&) = delete;
-    DebuggerOutput& operator=(const DebuggerOutput&) = delete;
+    ~DebuggerOutput() { ut::SetDumpOutput(previous); }
+    std::wstring Take() { return std::exchange(text, {}); }
 
-    std::wstring Take() { return std::exchange(text_, {}); }
-
-private:
-    ut::DumpOutput previous_;
-    std::wstring text_;
+    ut::DumpOutput previous;
+    std::wstring text;
 };
 
 // One property an enumeration hands out; `value` is copied shallowly (the test keeps the data).
