@@ -82,15 +82,14 @@ protected:
     }
     void TearDown() override { ut::ClearPresetCache(); }
 
-    // Writes a file, making its folders.
+    // Writes a file, or a preset file, making its folders.
     void Write(const std::wstring& name, const char* content = "") {
         fs::create_directories(fs::path(temp_ / name).parent_path());
         temp_.Write(name, content);
     }
-    std::wstring Put(const std::wstring& name, const ut::host::PresetDescription& preset) {
-        fs::create_directories(fs::path(temp_ / name).parent_path());
+    void Put(const std::wstring& name, const ut::host::PresetDescription& preset) {
+        Write(name);
         EXPECT_EQ(ut::host::WritePresetFile(temp_ / name, preset), S_OK);
-        return temp_ / name;
     }
     // A path of the tree as the library writes it, with backslashes.
     std::wstring Native(const std::wstring& name) const {

@@ -266,6 +266,11 @@ TEST(Thumbnails, RefusesADamagedSummaryAndWritesNothing) {
         return std::string(good).replace(at, bytes.size(), bytes);
     };
     auto thumbnail = [](std::string value) { return SummaryStream({{17, value}}); };
+    // A clipboard value of `size` bytes in clipboard format `format`, followed by `rest`.
+    auto clip = [&](char size, char format, const std::string& rest) {
+        return thumbnail(std::string("\x47\0\0\0", 4) + size + std::string("\0\0\0\xFF\xFF\xFF\xFF", 7) +
+                         format + std::string(3, '\0') + rest);
+    };
     const std::string dib =
         std::string("\x28\0\0\0\x01\0\0\0\x01\0\0\0\x01\0\x18\0", 16) + std::string(24, '\0');
     struct Case {
@@ -286,16 +291,10 @@ TEST(Thumbnails, RefusesADamagedSummaryAndWritesNothing) {
         {"another property set", patched(28, "\x01"), "BADHEADER", "S_FALSE"},
         {"no thumbnail", good, "S_OK", "S_FALSE"},
         {"a thumbnail not in a clipboard value", thumbnail(kTitle), "S_OK", "E_NOTIMPL"},
-        {"a metafile", thumbnail(std::string("\x47\0\0\0\x08\0\0\0\xFF\xFF\xFF\xFF\x03\0\0\0", 16)), "S_OK",
-         "E_NOTIMPL"},
-        {"a clipboard size past the value",
-         thumbnail(std::string("\x47\0\0\0\x40\0\0\0\xFF\xFF\xFF\xFF\x08\0\0\0", 16)), "S_OK", "BADHEADER"},
-        {"a bitmap cut short",
-         thumbnail(std::string("\x47\0\0\0\x10\0\0\0\xFF\xFF\xFF\xFF\x08\0\0\0", 16) + dib.substr(0, 8)),
-         "S_OK", "BADHEADER"},
-        {"a bitmap without its rows",
-         thumbnail(std::string("\x47\0\0\0\x30\0\0\0\xFF\xFF\xFF\xFF\x08\0\0\0", 16) + dib), "S_OK",
-         "BADHEADER"},
+        {"a metafile", clip('\x08', '\x03', ""), "S_OK", "E_NOTIMPL"},
+        {"a clipboard size past the value", clip('\x40', '\x08', ""), "S_OK", "BADHEADER"},
+        {"a bitmap cut short", clip('\x10', '\x08', dib.substr(0, 8)), "S_OK", "BADHEADER"},
+        {"a bitmap without its rows", clip('\x30', '\x08', dib), "S_OK", "BADHEADER"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.what);
