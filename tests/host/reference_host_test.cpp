@@ -325,8 +325,11 @@ TEST_F(NotificationService, ASinkOwnedOnlyByTheServiceOutlivesItsOwnWithdrawal) 
 // The reference host's families, views and preferences, kept in the registry.
 class Managers : public testing::Test {
 protected:
+    void SetUp() override { ASSERT_EQ(GWGetFamiliesManager(manager.Put()), S_OK); }
     ut::test::RegistrationScope scope_;
     ut::host::ReferenceHost host_;
+    ComPtr<IGWFamiliesManager> manager;
+    HINSTANCE module = ut::test::TestModule();
 };
 
 const GUID kFamily = TestGuid(50), kOther = TestGuid(51), kA = TestGuid(1), kB = TestGuid(2);
@@ -343,9 +346,6 @@ std::vector<GUID> Members(IGWFamiliesManager& manager, const GUID& family) {
 
 TEST_F(Managers, FamiliesKeepTheirDescriptionAndMembersUntilBothAreGone) {
     ut::test::LiveObjectCheck live;
-    ComPtr<IGWFamiliesManager> manager;
-    ASSERT_EQ(GWGetFamiliesManager(manager.Put()), S_OK);
-    HINSTANCE module = ut::test::TestModule();
     const std::wstring key = L"Software\\ut\\Families\\" + ut::GuidToString(kFamily);
 
     ASSERT_EQ(manager->RegisterFamily(kFamily, kA, kOther, L"LIGHTS", L"c:\\lights", module, kB, GUID_NULL),
@@ -380,9 +380,6 @@ TEST_F(Managers, FamiliesKeepTheirDescriptionAndMembersUntilBothAreGone) {
 }
 
 TEST_F(Managers, FamiliesRefuseWhatNamesNoFamily) {
-    ComPtr<IGWFamiliesManager> manager;
-    ASSERT_EQ(GWGetFamiliesManager(manager.Put()), S_OK);
-    HINSTANCE module = ut::test::TestModule();
     const GUID withNull[] = {kFamily, GUID_NULL};
     IGWEnumGUID* members = nullptr;
     const HRESULT results[][2] = {
