@@ -79,9 +79,7 @@ TEST(TextTables, RefuseWhatCannotBeRead) {
 TEST(LogMessage, WritesOneLineWithTheKindToStandardErrorByDefault) {
     struct Case {
         ULONG kind;
-        const wchar_t* text;
-        const wchar_t* source;
-        const wchar_t* details;
+        const wchar_t *text, *source, *details;
         std::string line;
     };
     const Case cases[] = {

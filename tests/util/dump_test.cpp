@@ -206,8 +206,7 @@ TEST(DumpPropertyContainer, NestsMemberSetsWithoutTheirHeader) {
 
 TEST(DumpPropertyContainer, EndsQuietlyWhenTheEnumerationFails) {
     struct Case {
-        HRESULT enumerate;
-        HRESULT first;
+        HRESULT enumerate, first;
         ULONG firstFetched;
     } cases[] = {{E_FAIL, S_OK, 1}, {S_OK, E_FAIL, 0}, {S_OK, S_FALSE, 0}};
     DebuggerOutput output;

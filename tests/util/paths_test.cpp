@@ -112,8 +112,7 @@ TEST_F(Paths, ProjectFailuresPassThrough) {
 
 TEST(IsFileRelativeToProject, ComparesThePrefixOnlyWithoutCase) {
     struct Case {
-        const wchar_t* project;
-        const wchar_t* file;
+        const wchar_t *project, *file;
         int relative;
     } cases[] = {
         {L"C:\\proj", L"C:\\proj\\a.scn", 1},
@@ -194,8 +193,7 @@ TEST_F(Paths, DefaultImageIsTheReadablePreferenceOrTheFactoryOne) {
     ASSERT_EQ(KXGetFactoryPath(factory), S_OK);
     const std::wstring fallback = std::wstring(factory) + L"\\Resources\\noIcon.pic";
     struct Case {
-        std::wstring preference;
-        std::wstring path;
+        std::wstring preference, path;
     } cases[] = {{L"", fallback}, {folder / L"absent.pic", fallback}, {picture, picture}};
     for (const Case& c : cases) {
         if (!c.preference.empty())
