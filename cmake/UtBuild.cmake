@@ -2,6 +2,13 @@
 
 function(ut_target_defaults target)
   target_compile_options(${target} PRIVATE -Wall -Wextra -Wpedantic)
+  # A library's calls to its own exported functions go straight to them, not through the PLT, and
+  # can be inlined: nothing is meant to interpose them.
+  target_compile_options(${target} PRIVATE -fno-semantic-interposition)
+  get_target_property(type ${target} TYPE)
+  if(type STREQUAL "SHARED_LIBRARY" AND NOT WIN32)
+    target_link_options(${target} PRIVATE -Wl,-Bsymbolic-functions)
+  endif()
   if(UT_WERROR)
     target_compile_options(${target} PRIVATE -Werror)
   endif()
