@@ -239,12 +239,12 @@ private:
     // Opens a chunk whose header refers to a known row, when the window holds it; false when
     // the general path has to decide (`hr` is then untouched).
     bool OpenReferencedChunk(ULONG id, ULONG* version, HRESULT& hr);
+    // Opens the chunk whose header is at the position, whatever the header holds.
+    HRESULT OpenChunkFromHeader(ULONG id, ULONG* version);
     // Drops the rows recorded after `lastKept` (by an open that then failed).
     void ForgetRowsAfter(int lastKept);
 
     bool Packing(int kind) const { return active_ && kind; }
-    HRESULT PushReadEnd(ULONGLONG end);
-    HRESULT PushWriteStart();
     bool ImportingDelta() const;
 
     std::shared_ptr<CGWStreamHelper> helper_;

@@ -315,30 +315,26 @@ HRESULT C3DStreamCompressor::GetChunkHeader(ULONG& id, ULONG& version, bool reco
 
 // Chunks.
 
-// Pushes that fit the stacks' capacity cannot throw; only growing goes through the boundary,
-// which keeps the exception machinery out of the path taken for nearly every chunk.
-HRESULT C3DStreamCompressor::PushReadEnd(ULONGLONG end) {
-    if (readEnds_.size() < readEnds_.capacity()) {
-        readEnds_.push_back(end);
-        return S_OK;
-    }
+namespace {
+
+// Growing a stack of chunk positions is the only step of a chunk's open that can throw. It goes
+// through the boundary out of line, which keeps the exception machinery out of the path taken
+// for nearly every chunk.
+[[gnu::noinline]] HRESULT PushGrowing(std::vector<ULONGLONG>& stack, ULONGLONG value) {
     return ut::ExportBoundary([&] {
-        readEnds_.push_back(end);
+        stack.push_back(value);
         return S_OK;
     });
 }
 
-HRESULT C3DStreamCompressor::PushWriteStart() {
-    const ULONGLONG start = buffer_->Position();
-    if (writeStarts_.size() < writeStarts_.capacity()) {
-        writeStarts_.push_back(start);
-        return S_OK;
-    }
-    return ut::ExportBoundary([&] {
-        writeStarts_.push_back(start);
-        return S_OK;
-    });
+HRESULT Push(std::vector<ULONGLONG>& stack, ULONGLONG value) {
+    if (stack.size() == stack.capacity())
+        return PushGrowing(stack, value);
+    stack.push_back(value);
+    return S_OK;
 }
+
+} // namespace
 
 HRESULT C3DStreamCompressor::ChunkWriteOpen(ULONG id, ULONG version) {
     if (!active_)
@@ -349,7 +345,7 @@ HRESULT C3DStreamCompressor::ChunkWriteOpen(ULONG id, ULONG version) {
     if (SUCCEEDED(hr))
         hr = buffer_->WriteValue(ULONG{0});
     if (SUCCEEDED(hr))
-        hr = PushWriteStart();
+        hr = Push(writeStarts_, buffer_->Position());
     if (FAILED(hr))
         ForgetRowsAfter(rowsBefore); // their definitions are rewound with the rest
     return rewind(hr);
@@ -368,7 +364,7 @@ HRESULT C3DStreamCompressor::ChunkSafeWriteOpen(ULONG id, ULONG version) {
         return STG_E_OLDFORMAT;
     ULONG header[3] = {id, version, 0};
     (void)buffer_->WriteValue(header); // see above
-    return PushWriteStart();
+    return Push(writeStarts_, buffer_->Position());
 }
 
 HRESULT C3DStreamCompressor::ChunkWriteClose() {
@@ -392,7 +388,7 @@ bool C3DStreamCompressor::OpenReferencedChunk(ULONG id, ULONG* version, HRESULT&
         return false; // a definition, or another chunk: the general path decides
     ULONG size = 0;
     std::memcpy(&size, bytes + 1, sizeof size);
-    hr = PushReadEnd(start + 1 + sizeof size + size);
+    hr = Push(readEnds_, start + 1 + sizeof size + size);
     if (FAILED(hr))
         return true; // nothing consumed yet
     buffer_->Advance(1 + sizeof size);
@@ -406,6 +402,11 @@ HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
         return STG_E_OLDFORMAT;
     if (HRESULT hr = S_OK; OpenReferencedChunk(id, version, hr))
         return hr;
+    return OpenChunkFromHeader(id, version);
+}
+
+// Out of line, so that the step above needs no stack frame of its own.
+[[gnu::noinline]] HRESULT C3DStreamCompressor::OpenChunkFromHeader(ULONG id, ULONG* version) {
     ut::sdk::Rewind rewind(*buffer_);
     // A header that cannot be read reports an id of its own, so that a reader probing for an
     // optional last chunk is told "another chunk" at the end of the stream too.
@@ -416,7 +417,7 @@ HRESULT C3DStreamCompressor::ChunkReadOpen(ULONG id, ULONG* version) {
     ULONG size = 0;
     if (HRESULT hr = buffer_->ReadValue(size); FAILED(hr))
         return rewind(hr);
-    if (HRESULT hr = PushReadEnd(buffer_->Position() + size); FAILED(hr))
+    if (HRESULT hr = Push(readEnds_, buffer_->Position() + size); FAILED(hr))
         return rewind(hr);
     if (version)
         *version = foundVersion;
@@ -435,7 +436,7 @@ HRESULT C3DStreamCompressor::ChunkSafeReadOpen(ULONG id, ULONG* version) {
         return rewind(STG_E_INVALIDHEADER);
     (void)buffer_->ReadValue(foundVersion);
     (void)buffer_->ReadValue(size);
-    if (HRESULT hr = PushReadEnd(buffer_->Position() + size); FAILED(hr))
+    if (HRESULT hr = Push(readEnds_, buffer_->Position() + size); FAILED(hr))
         return rewind(hr);
     if (version)
         *version = foundVersion;
