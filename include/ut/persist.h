@@ -235,6 +235,13 @@ private:
     };
 
     HRESULT PutChunkHeader(ULONG id, ULONG version);
+    // The row that defines the header, or -1.
+    int FindRow(ULONG id, ULONG version) const;
+    // Opens a chunk for writing when its header refers to a known row and the window has room;
+    // false when the general path has to (`hr` is then untouched).
+    bool WriteReferencedChunk(ULONG id, ULONG version, HRESULT& hr);
+    // Writes the header and opens the chunk, whatever the header is.
+    HRESULT WriteChunkHeader(ULONG id, ULONG version);
     HRESULT GetChunkHeader(ULONG& id, ULONG& version, bool record);
     // Opens a chunk whose header refers to a known row, when the window holds it; false when
     // the general path has to decide (`hr` is then untouched).

@@ -247,15 +247,21 @@ HRESULT C3DStreamCompressor::LoadGUID(GUID&) {
 
 // Chunk headers.
 
+int C3DStreamCompressor::FindRow(ULONG id, ULONG version) const {
+    for (int row = 0; row <= lastIndex_; ++row) {
+        if (headerTable_[row].id == id && headerTable_[row].version == version)
+            return row;
+    }
+    return -1;
+}
+
 HRESULT C3DStreamCompressor::PutChunkHeader(ULONG id, ULONG version) {
     if (!active_ || !packHeaders_) {
         ULONG plain[2] = {id, version};
         return buffer_->WriteValue(plain);
     }
-    for (int row = 0; row <= lastIndex_; ++row) {
-        if (headerTable_[row].id == id && headerTable_[row].version == version)
-            return buffer_->WriteValue(static_cast<BYTE>(row));
-    }
+    if (int row = FindRow(id, version); row >= 0)
+        return buffer_->WriteValue(static_cast<BYTE>(row));
     if (lastIndex_ + 1 >= static_cast<int>(kTableRows))
         return KX_E_CHUNKTABLEFULL;
     int row = lastIndex_ + 1;
@@ -336,9 +342,36 @@ HRESULT Push(std::vector<ULONGLONG>& stack, ULONGLONG value) {
 
 } // namespace
 
+// Most chunks written have a header defined earlier: its index byte and the size field to patch
+// go into the window's room in one step, with the same outcome as the general path below.
+bool C3DStreamCompressor::WriteReferencedChunk(ULONG id, ULONG version, HRESULT& hr) {
+    if (!packHeaders_)
+        return false;
+    const int row = FindRow(id, version);
+    if (row < 0)
+        return false;
+    BYTE* room = buffer_->Reserve(1 + sizeof(ULONG));
+    if (!room)
+        return false;
+    hr = Push(writeStarts_, buffer_->Position() + 1 + sizeof(ULONG));
+    if (FAILED(hr))
+        return true; // nothing written yet
+    room[0] = static_cast<BYTE>(row);
+    std::memset(room + 1, 0, sizeof(ULONG));
+    buffer_->Commit(1 + sizeof(ULONG));
+    return true;
+}
+
 HRESULT C3DStreamCompressor::ChunkWriteOpen(ULONG id, ULONG version) {
     if (!active_)
         return STG_E_OLDFORMAT;
+    if (HRESULT hr = S_OK; WriteReferencedChunk(id, version, hr))
+        return hr;
+    return WriteChunkHeader(id, version);
+}
+
+// Out of line, so that the step above needs no stack frame of its own.
+[[gnu::noinline]] HRESULT C3DStreamCompressor::WriteChunkHeader(ULONG id, ULONG version) {
     ut::sdk::Rewind rewind(*buffer_);
     const int rowsBefore = lastIndex_;
     HRESULT hr = PutChunkHeader(id, version);

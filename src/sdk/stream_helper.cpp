@@ -113,9 +113,12 @@ HRESULT CloseWrittenChunk(StreamBuffer& buffer, std::vector<ULONGLONG>& bodyStar
         return E_UNEXPECTED;
     if (end == start)
         return S_OK;
-    if (HRESULT hr = buffer.SetPosition(start - sizeof(ULONG)); FAILED(hr))
+    const auto size = static_cast<ULONG>(end - start);
+    if (buffer.Overwrite(start - sizeof size, &size, sizeof size))
+        return S_OK;
+    if (HRESULT hr = buffer.SetPosition(start - sizeof size); FAILED(hr))
         return hr;
-    if (HRESULT hr = buffer.WriteValue(static_cast<ULONG>(end - start)); FAILED(hr))
+    if (HRESULT hr = buffer.WriteValue(size); FAILED(hr))
         return hr;
     return buffer.SetPosition(end);
 }

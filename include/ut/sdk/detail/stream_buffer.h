@@ -116,6 +116,20 @@ public:
     const BYTE* Cursor() const { return data_.get() + cursor_; }
     void Advance(ULONG count) { cursor_ += count; }
 
+    // Overwrites `count` bytes at `position` when the window holds them all, without moving;
+    // false, with nothing written, otherwise. For patching a size written earlier.
+    bool Overwrite(ULONGLONG position, const void* bytes, ULONG count) {
+        if (position < base_ || position - base_ > valid_ || count > valid_ - (position - base_))
+            return false;
+        const auto at = static_cast<ULONG>(position - base_);
+        std::memcpy(data_.get() + at, bytes, count);
+        if (at < dirtyBegin_)
+            dirtyBegin_ = at;
+        if (at + count > dirtyEnd_)
+            dirtyEnd_ = at + count;
+        return true;
+    }
+
     // Up to `count` bytes; fewer only at the end of the stream. For IStream::Read.
     HRESULT ReadSome(void* bytes, ULONG count, ULONG* read);
 
