@@ -144,6 +144,27 @@ TEST_F(Compact, ChunkHeadersBecomeIndexesIntoTheTable) {
                                                      0x00, 0x00, 0x00, 0x00, 0x00, 0x00}));
 }
 
+// The size is patched into bytes that a flush already wrote back: the patch must still reach
+// the stream.
+TEST_F(Compact, AChunkClosedAfterAFlushStillGetsItsSize) {
+    for (Form form : {Form::Plain, Form::Compact}) {
+        SCOPED_TRACE(form == Form::Plain ? "plain" : "compact");
+        ut::test::Saved saved = Save(form, [](C3DStreamHelper& h) {
+            h.ChunkWriteOpen(0x11223344, 2);
+            h.PutUInt32(5);
+            EXPECT_EQ(h.Flush(), S_OK);
+            EXPECT_EQ(h.ChunkWriteClose(), S_OK);
+        });
+        Bytes expected =
+            form == Form::Plain
+                ? Bytes{0x44, 0x33, 0x22, 0x11, 0x02, 0x00, 0x00, 0x00, 0x04, 0x00, 0x00, 0x00, //
+                        0x05, 0x00, 0x00, 0x00}
+                : ut::test::Concat(kMarker, {0x00, 0x44, 0x33, 0x22, 0x11, 0x02, 0x00, 0x00, 0x00, 0x01, 0x00,
+                                             0x00, 0x00, 0xF5});
+        EXPECT_EQ(saved.data, expected);
+    }
+}
+
 TEST_F(Compact, OutOfLineTableTravelsInItsOwnChunk) {
     ut::test::Saved saved = Save(Form::CompactTable, [](C3DStreamHelper& h) {
         h.ChunkWriteOpen(0x0A0B0C0D, 7);
