@@ -1,5 +1,8 @@
 // Text conversions shared by both homes. wchar_t is UTF-32 on POSIX and UTF-16 on Windows; the
 // code below asks which at compile time instead of asking which home it is on.
+#include <bit>
+#include <cstring>
+
 #include <ut/platform/text.h>
 
 namespace ut::platform {
@@ -157,18 +160,23 @@ std::wstring WideFromUtf16Le(const std::uint8_t* bytes, std::size_t units) {
 
 std::size_t DecodeUtf16Le(const std::uint8_t* bytes, std::size_t units, wchar_t* out) {
     auto unit = [bytes](std::size_t i) {
+        if constexpr (std::endian::native == std::endian::little) {
+            std::uint16_t value = 0;
+            std::memcpy(&value, bytes + 2 * i, 2);
+            return static_cast<char32_t>(value);
+        }
         return static_cast<char32_t>(bytes[2 * i] | (static_cast<unsigned>(bytes[2 * i + 1]) << 8));
     };
-    // Text without surrogates, nearly all of it, widens unit by unit in a loop the compiler can
-    // vectorise; the pairing below is only for the rest.
+    // Text without surrogates, nearly all of it, is widened in one pass the compiler can
+    // vectorise; the pairing below redoes the rest.
     unsigned surrogates = 0;
-    for (std::size_t i = 0; i < units; ++i)
-        surrogates |= static_cast<unsigned>(unit(i) - 0xD800u < 0x800u);
-    if (kWideIsUtf16 || surrogates == 0) {
-        for (std::size_t i = 0; i < units; ++i)
-            out[i] = static_cast<wchar_t>(unit(i));
-        return units;
+    for (std::size_t i = 0; i < units; ++i) {
+        const char32_t c = unit(i);
+        out[i] = static_cast<wchar_t>(c);
+        surrogates |= static_cast<unsigned>(c - 0xD800u < 0x800u);
     }
+    if (kWideIsUtf16 || surrogates == 0)
+        return units;
     wchar_t* next = out;
     for (std::size_t i = 0; i < units; ++i) {
         char32_t c = unit(i);
