@@ -82,16 +82,18 @@ HRESULT C3DStreamHelper::CountClose(HRESULT hr) {
 }
 
 // Values. A plain stream pays one test, as before; the library's own compressor is called
-// directly and any other one through its interface.
+// directly and any other one through its interface. Each starts on a cache line of its own: a
+// call costs a few nanoseconds, and where the rest of the library happened to put them moved
+// single rows of ut_bench_persist by up to a sixth.
 
-HRESULT C3DStreamHelper::PutUInt32(ULONG value) {
+[[gnu::aligned(64)]] HRESULT C3DStreamHelper::PutUInt32(ULONG value) {
     if (!compressor_)
         return CGWStreamHelper::PutUInt32(value);
     return stock_ ? ut::persist::StockCodec::SaveUInt32(*stock_, value)
                   : compressor_->SavePackedVarLenUInt32(value);
 }
 
-HRESULT C3DStreamHelper::GetUInt32(ULONG& value) {
+[[gnu::aligned(64)]] HRESULT C3DStreamHelper::GetUInt32(ULONG& value) {
     if (!compressor_)
         return CGWStreamHelper::GetUInt32(value);
     return stock_ ? ut::persist::StockCodec::LoadUInt32(*stock_, value)
@@ -106,14 +108,14 @@ HRESULT C3DStreamHelper::StoreUInt32(ULONG value) {
     return compressor_ ? compressor_->SavePackedVarLenUInt32ForPatchBack(value) : PutUInt32(value);
 }
 
-HRESULT C3DStreamHelper::PutInt32(LONG value) {
+[[gnu::aligned(64)]] HRESULT C3DStreamHelper::PutInt32(LONG value) {
     if (!compressor_)
         return CGWStreamHelper::PutInt32(value);
     return stock_ ? ut::persist::StockCodec::SaveInt32(*stock_, value)
                   : compressor_->SavePackedVarLenInt32(value);
 }
 
-HRESULT C3DStreamHelper::GetInt32(LONG& value) {
+[[gnu::aligned(64)]] HRESULT C3DStreamHelper::GetInt32(LONG& value) {
     if (!compressor_)
         return CGWStreamHelper::GetInt32(value);
     return stock_ ? ut::persist::StockCodec::LoadInt32(*stock_, value)
@@ -124,14 +126,14 @@ HRESULT C3DStreamHelper::SkipInt32() {
     return compressor_ ? compressor_->SkipPackedVarLenInt32() : CGWStreamHelper::SkipInt32();
 }
 
-HRESULT C3DStreamHelper::PutDouble(double value) {
+[[gnu::aligned(64)]] HRESULT C3DStreamHelper::PutDouble(double value) {
     if (!compressor_)
         return CGWStreamHelper::PutDouble(value);
     return stock_ ? ut::persist::StockCodec::SaveDouble(*stock_, value)
                   : compressor_->SaveVarLenDouble(value);
 }
 
-HRESULT C3DStreamHelper::GetDouble(double& value) {
+[[gnu::aligned(64)]] HRESULT C3DStreamHelper::GetDouble(double& value) {
     if (!compressor_)
         return CGWStreamHelper::GetDouble(value);
     return stock_ ? ut::persist::StockCodec::LoadDouble(*stock_, value)
