@@ -69,11 +69,8 @@ public:
         if (count > limit_ - cursor_)
             return WriteSlow(bytes, count);
         std::memcpy(data_.get() + cursor_, bytes, count);
-        if (cursor_ < dirtyBegin_)
-            dirtyBegin_ = cursor_;
+        MarkDirty(cursor_, cursor_ + count);
         cursor_ += count;
-        if (cursor_ > dirtyEnd_)
-            dirtyEnd_ = cursor_;
         if (cursor_ > valid_)
             valid_ = cursor_;
         return S_OK;
@@ -104,10 +101,9 @@ public:
         return cursor_ == valid_ && count <= limit_ - cursor_ ? data_.get() + cursor_ : nullptr;
     }
     void Commit(ULONG count) {
-        if (cursor_ < dirtyBegin_)
-            dirtyBegin_ = cursor_;
+        MarkDirty(cursor_, cursor_ + count);
         cursor_ += count;
-        valid_ = dirtyEnd_ = cursor_;
+        valid_ = cursor_;
     }
     // `count` readable bytes at the position, or null; Advance(n) then consumes n of them.
     const BYTE* Peek(ULONG count) const { return Holds(count) ? Cursor() : nullptr; }
@@ -123,10 +119,7 @@ public:
             return false;
         const auto at = static_cast<ULONG>(position - base_);
         std::memcpy(data_.get() + at, bytes, count);
-        if (at < dirtyBegin_)
-            dirtyBegin_ = at;
-        if (at + count > dirtyEnd_)
-            dirtyEnd_ = at + count;
+        MarkDirty(at, at + count);
         return true;
     }
 
@@ -165,6 +158,13 @@ private:
     HRESULT StartWindow(ULONGLONG position);
     HRESULT Fill();
     HRESULT Unusable() const { return stream_ ? E_OUTOFMEMORY : E_POINTER; }
+    // Widens the range of the window that Flush writes back to cover [begin, end).
+    void MarkDirty(ULONG begin, ULONG end) {
+        if (begin < dirtyBegin_)
+            dirtyBegin_ = begin;
+        if (end > dirtyEnd_)
+            dirtyEnd_ = end;
+    }
 
     ComPtr<IStream> stream_;
     std::unique_ptr<BYTE[]> data_;
