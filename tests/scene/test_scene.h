@@ -1,4 +1,4 @@
-// The reference scene the scene tests run on, and words for what a call answered.
+// The reference scene the scene tests run on.
 #pragma once
 
 #include <string>
@@ -8,6 +8,8 @@
 #include <ut/host/reference_host.h>
 #include <ut/platform/com.h>
 #include <ut/scene.h>
+
+#include "support/fault_plan.h"
 
 namespace ut::test {
 
@@ -39,23 +41,6 @@ inline ut::host::Settings TestScene(bool currentContainer = true) {
                                   {.name = L"Light"}},
                       .containers = {.layers = {L"Background"}, .devices = {L"Tablet"}}};
     return settings;
-}
-
-// The name of a result the scene functions give, or its number.
-inline std::string Result(HRESULT hr) {
-    const std::pair<HRESULT, const char*> names[] = {{S_OK, "S_OK"},
-                                                     {S_FALSE, "S_FALSE"},
-                                                     {E_FAIL, "E_FAIL"},
-                                                     {E_POINTER, "E_POINTER"},
-                                                     {E_NOINTERFACE, "E_NOINTERFACE"},
-                                                     {E_UNEXPECTED, "E_UNEXPECTED"},
-                                                     {E_INVALIDARG, "E_INVALIDARG"},
-                                                     {E_ACCESSDENIED, "DENIED"},
-                                                     {DISP_E_MEMBERNOTFOUND, "NOTFOUND"}};
-    for (auto [value, name] : names)
-        if (hr == value)
-            return name;
-    return std::to_string(hr);
 }
 
 // ASCII text of a wide name, for messages and comparisons.

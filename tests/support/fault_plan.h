@@ -69,4 +69,21 @@ inline std::pair<HRESULT, bool> Released(std::pair<HRESULT, IUnknown*> outcome) 
     return {outcome.first, outcome.second != nullptr};
 }
 
+// The name of a result the library's functions give, or its number, for tables of outcomes.
+inline std::string Result(HRESULT hr) {
+    const std::pair<HRESULT, const char*> names[] = {{S_OK, "S_OK"},
+                                                     {S_FALSE, "S_FALSE"},
+                                                     {E_FAIL, "E_FAIL"},
+                                                     {E_POINTER, "E_POINTER"},
+                                                     {E_NOINTERFACE, "E_NOINTERFACE"},
+                                                     {E_UNEXPECTED, "E_UNEXPECTED"},
+                                                     {E_INVALIDARG, "E_INVALIDARG"},
+                                                     {E_ACCESSDENIED, "DENIED"},
+                                                     {DISP_E_MEMBERNOTFOUND, "NOTFOUND"}};
+    for (auto [value, name] : names)
+        if (hr == value)
+            return name;
+    return std::to_string(hr);
+}
+
 } // namespace ut::test

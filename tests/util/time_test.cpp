@@ -14,7 +14,6 @@
 #include <ut/sdk/testing.h>
 #include <ut/time.h>
 
-#include "scene/test_scene.h"
 #include "support/fault_plan.h"
 
 namespace {
