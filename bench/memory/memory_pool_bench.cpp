@@ -1,21 +1,26 @@
-// CMemoryPool side by side with glibc malloc/free and mimalloc, in one run:
+// CMemoryPool side by side with glibc malloc/free and mimalloc, and the floor below, in one run:
 //   pair/<allocator>/<size>  allocate and free one block of a fixed size
 //   churn/<allocator>        free a random one of 4096 live blocks and allocate a new one of a
 //                            random size 1..4096 in its place
 // Operations are single calls (an allocation or a free). After the runs a table gives the pool's
-// rate against each of the others.
+// rate against each of its peers.
 //
 // Linked in, mimalloc's library replaces malloc and free for the whole program, as it does in an
-// application that links it: the pool's own blocks come from mimalloc then. glibc's allocator is
-// therefore called by its own names, so that the "glibc" runs measure glibc.
+// application that links it: the pool's own blocks come from mimalloc then. It takes over glibc's
+// internal names as well (__libc_malloc, __libc_free), so the "glibc" runs look glibc's allocator
+// up in the C library itself.
+#include <cstdio>
 #include <cstdlib>
 #include <iomanip>
 #include <map>
+#include <memory>
 #include <random>
 #include <string>
 #include <vector>
 
 #include <benchmark/benchmark.h>
+#include <dlfcn.h>
+#include <gnu/lib-names.h>
 #include <mimalloc.h>
 
 #include <ut/host/reference_host.h>
@@ -32,20 +37,83 @@ struct PoolAllocator {
     CMemoryPool pool;
 };
 
-// glibc's malloc and free under the names that no other library replaces.
-extern "C" void* __libc_malloc(std::size_t size);
-extern "C" void __libc_free(void* block);
+// glibc's malloc and free as the C library defines them, whatever replaces them in the program.
+class GlibcFunctions {
+public:
+    GlibcFunctions() : library_(dlopen(LIBC_SO, RTLD_NOW | RTLD_NOLOAD)) {
+        if (library_) {
+            malloc_ = reinterpret_cast<MallocFunction>(dlsym(library_.get(), "malloc"));
+            free_ = reinterpret_cast<FreeFunction>(dlsym(library_.get(), "free"));
+        }
+        if (!malloc_ || !free_) {
+            std::fprintf(stderr, "glibc's malloc and free are not found in %s\n", LIBC_SO);
+            std::exit(1);
+        }
+    }
+
+    void* Allocate(std::size_t size) const { return malloc_(size); }
+    void Free(void* block) const { free_(block); }
+
+private:
+    using MallocFunction = void* (*)(std::size_t);
+    using FreeFunction = void (*)(void*);
+    struct Closer {
+        void operator()(void* library) const { dlclose(library); }
+    };
+    std::unique_ptr<void, Closer> library_;
+    MallocFunction malloc_ = nullptr;
+    FreeFunction free_ = nullptr;
+};
+
+const GlibcFunctions& Glibc() {
+    static const GlibcFunctions functions;
+    return functions;
+}
 
 struct GlibcAllocator {
     static constexpr const char* kName = "glibc";
-    void* Allocate(std::size_t size) { return __libc_malloc(size); }
-    void Free(void* block) { __libc_free(block); }
+    void* Allocate(std::size_t size) { return glibc.Allocate(size); }
+    void Free(void* block) { glibc.Free(block); }
+    const GlibcFunctions& glibc = Glibc();
 };
 
 struct MimallocAllocator {
     static constexpr const char* kName = "mimalloc";
     void* Allocate(std::size_t size) { return mi_malloc(size); }
     void Free(void* block) { mi_free(block); }
+};
+
+// Not a peer but a floor: freed blocks wait on a stack per 16-byte class, the class in a word in
+// front of the block. An allocator that reads a header to free a block, and hands out blocks
+// freed long before, cannot do a step for less than this.
+class FloorAllocator {
+public:
+    static constexpr const char* kName = "floor";
+    ~FloorAllocator() {
+        for (std::vector<void*>& kept : kept_)
+            for (void* block : kept)
+                std::free(Header(block));
+    }
+    void* Allocate(std::size_t size) {
+        std::size_t sizeClass = (size - 1) / kGranule;
+        std::vector<void*>& kept = kept_[sizeClass];
+        if (kept.empty()) {
+            auto* header = static_cast<std::size_t*>(std::malloc(kGranule * (sizeClass + 2)));
+            header[0] = sizeClass;
+            return header + kGranule / sizeof(std::size_t);
+        }
+        void* block = kept.back();
+        kept.pop_back();
+        return block;
+    }
+    void Free(void* block) { kept_[*Header(block)].push_back(block); }
+
+private:
+    static constexpr std::size_t kGranule = 16;
+    static std::size_t* Header(void* block) {
+        return reinterpret_cast<std::size_t*>(static_cast<char*>(block) - kGranule);
+    }
+    std::vector<void*> kept_[4096 / kGranule];
 };
 
 // Touches the block as a caller would, so that no allocator gets away with handing out memory
@@ -119,7 +187,7 @@ void Churn(benchmark::State& state) {
     state.SetItemsProcessed(state.iterations() * 2);
 }
 
-// Scenario by scenario, the three allocators one after the other, so that a busy machine slows
+// Scenario by scenario, the allocators one after the other, so that a busy machine slows
 // the runs that are compared with each other alike. Each warms up first: otherwise the first run
 // of the program (the pool's 16-byte pairs) alone pays for the processor's clock ramping up.
 constexpr double kWarmUpSeconds = 0.1;
@@ -145,12 +213,12 @@ public:
         std::ostream& out = GetOutputStream();
         out << "\nmillions of operations per second, and the pool's rate against the others\n"
             << std::left << std::setw(12) << "scenario" << std::right;
-        for (const char* column : {"pool", "glibc", "mimalloc", "vs glibc", "vs mimalloc"})
+        for (const char* column : {"pool", "glibc", "mimalloc", "floor", "vs glibc", "vs mimalloc"})
             out << std::setw(13) << column;
         out << "\n" << std::fixed << std::setprecision(1);
         for (auto& [scenario, rates] : rates_) {
             out << std::left << std::setw(12) << scenario << std::right;
-            for (const char* allocator : {"pool", "glibc", "mimalloc"})
+            for (const char* allocator : {"pool", "glibc", "mimalloc", "floor"})
                 out << std::setw(13) << Mean(rates, allocator) / 1e6;
             out << std::setprecision(2) << std::setw(12) << Ratio(rates, "glibc") << "x" << std::setw(12)
                 << Ratio(rates, "mimalloc") << "x\n"
@@ -200,7 +268,7 @@ int main(int argc, char** argv) {
     // With the host's notification service installed the pool registers once, as in the
     // application; without it every allocation would ask the host again.
     ut::host::ReferenceHost host;
-    RegisterSideBySide<PoolAllocator, GlibcAllocator, MimallocAllocator>();
+    RegisterSideBySide<PoolAllocator, GlibcAllocator, MimallocAllocator, FloorAllocator>();
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv))
         return 1;
