@@ -1,6 +1,6 @@
 // Whole scenes saved and loaded through C3DStreamHelper, compact and plain, onto memory and file
 // streams, beside the same content as protobuf messages (one message per top-level object,
-// children nested), in the same binary and run.
+// children nested) in memory and in a file, in the same binary and run.
 #include <algorithm>
 #include <cmath>
 #include <cstring>
@@ -10,8 +10,11 @@
 #include <vector>
 
 #include <benchmark/benchmark.h>
+#include <fcntl.h>
 #include <google/protobuf/io/coded_stream.h>
+#include <google/protobuf/io/zero_copy_stream_impl.h>
 #include <google/protobuf/io/zero_copy_stream_impl_lite.h>
+#include <unistd.h>
 
 #include <ut/persist.h>
 #include <ut/platform/stream.h>
@@ -273,9 +276,7 @@ void Fill(ut::bench::SceneObject& m, const Object& o) {
 
 // Messages are built from the scene inside the timed loop, as a saver would build them from
 // its objects.
-std::size_t ProtobufSave(const Scene& scene, std::string& bytes) {
-    bytes.clear();
-    google::protobuf::io::StringOutputStream sink(&bytes);
+std::size_t ProtobufSave(const Scene& scene, google::protobuf::io::ZeroCopyOutputStream& sink) {
     google::protobuf::io::CodedOutputStream out(&sink);
     ut::bench::SceneObject message;
     for (const Object& o : scene.roots) {
@@ -285,7 +286,7 @@ std::size_t ProtobufSave(const Scene& scene, std::string& bytes) {
         message.SerializeToCodedStream(&out);
     }
     out.Trim();
-    return bytes.size();
+    return static_cast<std::size_t>(out.ByteCount());
 }
 
 void Extract(const ut::bench::SceneObject& m, Object& o) {
@@ -301,8 +302,8 @@ void Extract(const ut::bench::SceneObject& m, Object& o) {
         Extract(m.children(i), o.children[static_cast<std::size_t>(i)]);
 }
 
-std::size_t ProtobufLoad(const std::string& bytes, std::size_t roots, std::vector<Object>& into) {
-    google::protobuf::io::ArrayInputStream source(bytes.data(), static_cast<int>(bytes.size()));
+std::size_t ProtobufLoad(google::protobuf::io::ZeroCopyInputStream& source, std::size_t roots,
+                         std::vector<Object>& into) {
     google::protobuf::io::CodedInputStream in(&source);
     in.SetTotalBytesLimit(INT_MAX);
     into.resize(roots);
@@ -318,24 +319,76 @@ std::size_t ProtobufLoad(const std::string& bytes, std::size_t roots, std::vecto
     return into.size();
 }
 
-void ProtobufSaveBench(benchmark::State& state) {
+// Where protobuf's messages go: a string, or a file written and read through its descriptor.
+class ProtobufTarget {
+public:
+    explicit ProtobufTarget(Medium medium) : medium_(medium) {
+        if (medium == Medium::File)
+            file_ = open(Path().c_str(), O_RDWR | O_CREAT | O_TRUNC, 0600);
+    }
+    ~ProtobufTarget() {
+        if (file_ >= 0)
+            close(file_);
+    }
+    ProtobufTarget(const ProtobufTarget&) = delete;
+    ProtobufTarget& operator=(const ProtobufTarget&) = delete;
+
+    std::size_t Save(const Scene& scene) {
+        if (medium_ == Medium::Memory) {
+            bytes_.clear();
+            google::protobuf::io::StringOutputStream sink(&bytes_);
+            return ProtobufSave(scene, sink);
+        }
+        Rewind();
+        if (ftruncate(file_, 0) != 0)
+            return 0;
+        google::protobuf::io::FileOutputStream sink(file_);
+        std::size_t size = ProtobufSave(scene, sink);
+        return sink.Flush() ? size : 0;
+    }
+
+    std::size_t Load(std::size_t roots, std::vector<Object>& into) {
+        if (medium_ == Medium::Memory) {
+            google::protobuf::io::ArrayInputStream source(bytes_.data(), static_cast<int>(bytes_.size()));
+            return ProtobufLoad(source, roots, into);
+        }
+        Rewind();
+        google::protobuf::io::FileInputStream source(file_);
+        return ProtobufLoad(source, roots, into);
+    }
+
+private:
+    static std::string Path() {
+        return (std::filesystem::temp_directory_path() / "ut_scene_bench.pb").string();
+    }
+    void Rewind() { lseek(file_, 0, SEEK_SET); }
+
+    Medium medium_;
+    std::string bytes_;
+    int file_ = -1;
+};
+
+void ProtobufSaveBench(benchmark::State& state, Medium medium) {
     const Scene& scene = SceneOf(static_cast<std::size_t>(state.range(0)));
-    std::string bytes;
+    ProtobufTarget target(medium);
+    std::size_t bytes = 0;
     for (auto _ : state)
-        ProtobufSave(scene, bytes);
-    Report(state, scene, bytes.size());
+        bytes = target.Save(scene);
+    if (bytes == 0)
+        state.SkipWithError("the scene was not saved");
+    Report(state, scene, bytes);
 }
 
-void ProtobufLoadBench(benchmark::State& state) {
+void ProtobufLoadBench(benchmark::State& state, Medium medium) {
     const Scene& scene = SceneOf(static_cast<std::size_t>(state.range(0)));
-    std::string bytes;
-    ProtobufSave(scene, bytes);
+    ProtobufTarget source(medium);
+    std::size_t bytes = source.Save(scene);
     std::vector<Object> loaded;
     for (auto _ : state)
-        benchmark::DoNotOptimize(ProtobufLoad(bytes, scene.roots.size(), loaded));
+        benchmark::DoNotOptimize(source.Load(scene.roots.size(), loaded));
     if (loaded.back().name != scene.roots.back().name)
         state.SkipWithError("the scene did not read back");
-    Report(state, scene, bytes.size());
+    Report(state, scene, bytes);
 }
 
 const bool registered = [] {
@@ -349,12 +402,14 @@ const bool registered = [] {
     add("scene/save/plain/memory", StreamSave, Form::Plain, Medium::Memory);
     add("scene/save/compact/file", StreamSave, Form::Compact, Medium::File);
     add("scene/save/plain/file", StreamSave, Form::Plain, Medium::File);
-    add("scene/save/protobuf", ProtobufSaveBench);
+    add("scene/save/protobuf/memory", ProtobufSaveBench, Medium::Memory);
+    add("scene/save/protobuf/file", ProtobufSaveBench, Medium::File);
     add("scene/load/compact/memory", StreamLoad, Form::Compact, Medium::Memory);
     add("scene/load/plain/memory", StreamLoad, Form::Plain, Medium::Memory);
     add("scene/load/compact/file", StreamLoad, Form::Compact, Medium::File);
     add("scene/load/plain/file", StreamLoad, Form::Plain, Medium::File);
-    add("scene/load/protobuf", ProtobufLoadBench);
+    add("scene/load/protobuf/memory", ProtobufLoadBench, Medium::Memory);
+    add("scene/load/protobuf/file", ProtobufLoadBench, Medium::File);
     return true;
 }();
 
