@@ -38,9 +38,10 @@ struct PoolAllocator {
 };
 
 // glibc's malloc and free as the C library defines them, whatever replaces them in the program.
-class GlibcFunctions {
+class GlibcAllocator {
 public:
-    GlibcFunctions() : library_(dlopen(LIBC_SO, RTLD_NOW | RTLD_NOLOAD)) {
+    static constexpr const char* kName = "glibc";
+    GlibcAllocator() : library_(dlopen(LIBC_SO, RTLD_NOW | RTLD_NOLOAD)) {
         if (library_) {
             malloc_ = reinterpret_cast<MallocFunction>(dlsym(library_.get(), "malloc"));
             free_ = reinterpret_cast<FreeFunction>(dlsym(library_.get(), "free"));
@@ -50,9 +51,8 @@ public:
             std::exit(1);
         }
     }
-
-    void* Allocate(std::size_t size) const { return malloc_(size); }
-    void Free(void* block) const { free_(block); }
+    void* Allocate(std::size_t size) { return malloc_(size); }
+    void Free(void* block) { free_(block); }
 
 private:
     using MallocFunction = void* (*)(std::size_t);
@@ -63,18 +63,6 @@ private:
     std::unique_ptr<void, Closer> library_;
     MallocFunction malloc_ = nullptr;
     FreeFunction free_ = nullptr;
-};
-
-const GlibcFunctions& Glibc() {
-    static const GlibcFunctions functions;
-    return functions;
-}
-
-struct GlibcAllocator {
-    static constexpr const char* kName = "glibc";
-    void* Allocate(std::size_t size) { return glibc.Allocate(size); }
-    void Free(void* block) { glibc.Free(block); }
-    const GlibcFunctions& glibc = Glibc();
 };
 
 struct MimallocAllocator {
@@ -113,7 +101,7 @@ private:
     static std::size_t* Header(void* block) {
         return reinterpret_cast<std::size_t*>(static_cast<char*>(block) - kGranule);
     }
-    std::vector<void*> kept_[4096 / kGranule];
+    std::vector<void*> kept_[CMemoryPool::kSizeClasses];
 };
 
 // Touches the block as a caller would, so that no allocator gets away with handing out memory

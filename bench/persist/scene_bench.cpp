@@ -178,9 +178,8 @@ void Load(C3DStreamHelper& h, Object& o) {
 enum class Form { Compact, Plain };
 enum class Medium { Memory, File };
 
-std::wstring TempFile() {
-    static const std::filesystem::path path = std::filesystem::temp_directory_path() / "ut_scene_bench.bin";
-    return ut::platform::WideFromUtf8(path.string());
+std::filesystem::path TempFile(const char* name) {
+    return std::filesystem::temp_directory_path() / name;
 }
 
 ut::ComPtr<IStream> NewTarget(Medium medium) {
@@ -188,7 +187,9 @@ ut::ComPtr<IStream> NewTarget(Medium medium) {
     if (medium == Medium::Memory)
         ut::platform::CreateMemoryStream(stream.Put());
     else
-        ut::platform::OpenFileStream(TempFile().c_str(), STGM_CREATE | STGM_READWRITE, stream.Put());
+        ut::platform::OpenFileStream(
+            ut::platform::WideFromUtf8(TempFile("ut_scene_bench.bin").string()).c_str(),
+            STGM_CREATE | STGM_READWRITE, stream.Put());
     return stream;
 }
 
@@ -324,7 +325,7 @@ class ProtobufTarget {
 public:
     explicit ProtobufTarget(Medium medium) : medium_(medium) {
         if (medium == Medium::File)
-            file_ = open(Path().c_str(), O_RDWR | O_CREAT | O_TRUNC, 0600);
+            file_ = open(TempFile("ut_scene_bench.pb").c_str(), O_RDWR | O_CREAT | O_TRUNC, 0600);
     }
     ~ProtobufTarget() {
         if (file_ >= 0)
@@ -358,9 +359,6 @@ public:
     }
 
 private:
-    static std::string Path() {
-        return (std::filesystem::temp_directory_path() / "ut_scene_bench.pb").string();
-    }
     void Rewind() { lseek(file_, 0, SEEK_SET); }
 
     Medium medium_;
