@@ -194,6 +194,19 @@ TEST_F(Storage, ElementsFollowTheNamingAndSharingRules) {
     EXPECT_EQ(root->OpenStorage(L"a", nullptr, kElementMode, nullptr, 0, storage.Put()), STG_E_FILENOTFOUND);
     EXPECT_EQ(root->OpenStorage(L"sub", nullptr, kElementMode, nullptr, 0, storage.Put()),
               STG_E_ACCESSDENIED);
+    // Renaming follows the same rules: an open element stays as it is named.
+    ASSERT_EQ(PutStream(root.Get(), L"r", "1"), S_OK);
+    EXPECT_EQ(root->RenameElement(L"a", L"d"), STG_E_ACCESSDENIED);
+    EXPECT_EQ(root->RenameElement(L"nothere", L"x"), STG_E_FILENOTFOUND);
+    EXPECT_EQ(root->RenameElement(L"r", L"a"), STG_E_FILEALREADYEXISTS);
+    EXPECT_EQ(root->RenameElement(L"r", L"renamed"), S_OK);
+    sub.Reset();
+    std::vector<Element> expected = {{L"a", STGTY_STREAM, 0},
+                                     {L"sub", STGTY_STORAGE, 0},
+                                     {L"renamed", STGTY_STREAM, 1},
+                                     {L"0123456789012345678901234567890", STGTY_STREAM, 0}};
+    EXPECT_EQ(ElementsOf(root.Get()), expected);
+    EXPECT_EQ(ReadStream(root.Get(), L"renamed"), "1");
     // Creating over an element replaces it.
     EXPECT_EQ(root->CreateStream(L"a", kElementMode | STGM_CREATE, 0, 0, stream.Put()), S_OK);
 }
@@ -215,24 +228,6 @@ TEST_F(Storage, DestroyingOrRevertingLeavesTheHoldersReverted) {
     ASSERT_EQ(root->Revert(), S_OK);
     EXPECT_EQ(stream->Write("x", 1, nullptr), STG_E_REVERTED);
     EXPECT_TRUE(ElementsOf(root.Get()).empty());
-}
-
-TEST_F(Storage, RenamingFollowsTheNamingRules) {
-    ComPtr<IStorage> root = CreateCompound(folder_ / L"rename.cfb");
-    ASSERT_TRUE(root);
-    ASSERT_EQ(PutStream(root.Get(), L"a", "1"), S_OK);
-    ASSERT_EQ(PutStream(root.Get(), L"b", "2"), S_OK);
-    ComPtr<IStream> held;
-    ASSERT_EQ(root->CreateStream(L"c", kElementMode, 0, 0, held.Put()), S_OK);
-    EXPECT_EQ(root->RenameElement(L"c", L"d"), STG_E_ACCESSDENIED);
-    EXPECT_EQ(root->RenameElement(L"nothere", L"x"), STG_E_FILENOTFOUND);
-    EXPECT_EQ(root->RenameElement(L"a", L"b"), STG_E_FILEALREADYEXISTS);
-    EXPECT_EQ(root->RenameElement(L"a", L"renamed"), S_OK);
-    held.Reset();
-    std::vector<Element> expected = {
-        {L"b", STGTY_STREAM, 1}, {L"c", STGTY_STREAM, 0}, {L"renamed", STGTY_STREAM, 1}};
-    EXPECT_EQ(ElementsOf(root.Get()), expected);
-    EXPECT_EQ(ReadStream(root.Get(), L"renamed"), "1");
 }
 
 // Shorter names first, then by upper-case name; the list's paging follows the system's answers.
@@ -344,12 +339,9 @@ TEST_F(Storage, StatReportsNamesTypesAndModes) {
     ASSERT_EQ(root->Stat(&stat, STATFLAG_NONAME), S_OK);
     EXPECT_EQ(stat.pwcsName, nullptr);
     EXPECT_TRUE(FAILED(root->Stat(nullptr, STATFLAG_NONAME)));
-}
 
-TEST_F(Storage, AStorageWithoutANameIsATemporaryFileThatGoesWithIt) {
-    ComPtr<IStorage> root;
+    // A root without a name is a temporary file that goes with it.
     ASSERT_EQ(StgCreateDocfile(nullptr, kCreateMode | STGM_DELETEONRELEASE, 0, root.Put()), S_OK);
-    STATSTG stat{};
     ASSERT_EQ(root->Stat(&stat, STATFLAG_DEFAULT), S_OK);
     ASSERT_NE(stat.pwcsName, nullptr);
     std::filesystem::path file(stat.pwcsName);
@@ -385,62 +377,53 @@ TEST_F(Storage, CopiesAndMovesElementsBetweenStorages) {
     EXPECT_EQ(source->OpenStream(L"s0", nullptr, kReadMode, 0, gone.Put()), S_OK);
 }
 
-TEST_F(Storage, CompoundFilesLiveInGlobalMemoryToo) {
-    ComPtr<ILockBytes> bytes;
-    ASSERT_EQ(CreateILockBytesOnHGlobal(nullptr, TRUE, bytes.Put()), S_OK);
-    EXPECT_EQ(StgIsStorageILockBytes(bytes.Get()), S_FALSE);
-    {
+// Byte arrays in global memory and on files carry compound files too.
+TEST_F(Storage, CompoundFilesLiveOnByteArrays) {
+    std::wstring path = folder_ / L"bytes.cfb";
+    ComPtr<ILockBytes> memory, file;
+    ASSERT_EQ(CreateILockBytesOnHGlobal(nullptr, TRUE, memory.Put()), S_OK);
+    EXPECT_EQ(ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE, file.Put()), STG_E_FILENOTFOUND);
+    EXPECT_EQ(ut::platform::OpenFileLockBytes(nullptr, STGM_READWRITE, file.Put()), STG_E_INVALIDNAME);
+    EXPECT_EQ(ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE, nullptr), E_POINTER);
+    ASSERT_EQ(ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE | STGM_CREATE, file.Put()), S_OK);
+    EXPECT_EQ(StgIsStorageILockBytes(memory.Get()), S_FALSE);
+    for (ILockBytes* bytes : {memory.Get(), file.Get()}) {
         ComPtr<IStorage> root;
-        ASSERT_EQ(StgCreateDocfileOnILockBytes(bytes.Get(), kElementMode, 0, root.Put()), S_OK);
+        ASSERT_EQ(StgCreateDocfileOnILockBytes(bytes, kElementMode, 0, root.Put()), S_OK);
         ASSERT_EQ(root->SetClass(kSubClass), S_OK);
         ASSERT_EQ(PutStream(root.Get(), L"data", Pattern(5000, 2)), S_OK);
         ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
     }
-    EXPECT_EQ(StgIsStorageILockBytes(bytes.Get()), S_OK);
+    file.Reset();
+    EXPECT_EQ(ReadStream(OpenCompound(path).Get(), L"data"), Pattern(5000, 2));
+
+    EXPECT_EQ(StgIsStorageILockBytes(memory.Get()), S_OK);
     ComPtr<IStorage> root;
-    EXPECT_EQ(StgOpenStorageOnILockBytes(bytes.Get(), nullptr, STGM_READ, nullptr, 0, root.Put()),
+    EXPECT_EQ(StgOpenStorageOnILockBytes(memory.Get(), nullptr, STGM_READ, nullptr, 0, root.Put()),
               STG_E_INVALIDFLAG);
     EXPECT_EQ(StgOpenStorageOnILockBytes(nullptr, nullptr, kReadMode, nullptr, 0, root.Put()),
               STG_E_INVALIDPOINTER);
-    ASSERT_EQ(StgOpenStorageOnILockBytes(bytes.Get(), nullptr, kReadMode, nullptr, 0, root.Put()), S_OK);
+    ASSERT_EQ(StgOpenStorageOnILockBytes(memory.Get(), nullptr, kReadMode, nullptr, 0, root.Put()), S_OK);
     EXPECT_TRUE(IsEqualGUID(ClassOf(root.Get()), kSubClass));
     EXPECT_EQ(ReadStream(root.Get(), L"data"), Pattern(5000, 2));
     STATSTG stat{};
-    ASSERT_EQ(bytes->Stat(&stat, STATFLAG_NONAME), S_OK);
+    ASSERT_EQ(memory->Stat(&stat, STATFLAG_NONAME), S_OK);
     EXPECT_EQ(stat.type, static_cast<DWORD>(STGTY_LOCKBYTES));
     EXPECT_GE(stat.cbSize.QuadPart, 5000u);
-}
 
-TEST_F(Storage, FileByteArraysOpenCreateAndGoWithTheirLastReference) {
-    std::wstring path = folder_ / L"bytes.cfb";
-    ComPtr<ILockBytes> bytes;
-    EXPECT_EQ(ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE, bytes.Put()), STG_E_FILENOTFOUND);
-    EXPECT_EQ(ut::platform::OpenFileLockBytes(nullptr, STGM_READWRITE, bytes.Put()), STG_E_INVALIDNAME);
-    EXPECT_EQ(ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE, nullptr), E_POINTER);
-    ASSERT_EQ(ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE | STGM_CREATE, bytes.Put()), S_OK);
-    {
-        ComPtr<IStorage> root;
-        ASSERT_EQ(StgCreateDocfileOnILockBytes(bytes.Get(), kElementMode, 0, root.Put()), S_OK);
-        ASSERT_EQ(PutStream(root.Get(), L"data", "on a file"), S_OK);
-        ASSERT_EQ(root->Commit(STGC_DEFAULT), S_OK);
-    }
-    bytes.Reset();
-    EXPECT_EQ(StgIsStorageFile(path.c_str()), S_OK);
-    EXPECT_EQ(ReadStream(OpenCompound(path).Get(), L"data"), "on a file");
-
+    // A file opened to go with its last reference: reads past its end find nothing.
     ASSERT_EQ(
-        ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE | STGM_DELETEONRELEASE, bytes.Put()),
+        ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE | STGM_DELETEONRELEASE, file.Put()),
         S_OK);
     ULARGE_INTEGER at{};
     char signature[8] = {};
     ULONG read = 0;
-    ASSERT_EQ(bytes->ReadAt(at, signature, sizeof signature, &read), S_OK);
-    EXPECT_EQ(read, 8u);
-    EXPECT_EQ(std::string(signature, 2), "\xD0\xCF");
+    ASSERT_EQ(file->ReadAt(at, signature, sizeof signature, &read), S_OK);
+    EXPECT_EQ(std::string(signature, read), "\xD0\xCF\x11\xE0\xA1\xB1\x1A\xE1");
     at.QuadPart = 1 << 20;
-    EXPECT_EQ(bytes->ReadAt(at, signature, sizeof signature, &read), S_OK);
+    EXPECT_EQ(file->ReadAt(at, signature, sizeof signature, &read), S_OK);
     EXPECT_EQ(read, 0u);
-    bytes.Reset();
+    file.Reset();
     EXPECT_FALSE(std::filesystem::exists(std::filesystem::path(path)));
 }
 
