@@ -30,15 +30,10 @@ constexpr GUID kOtherId = {0xA, 0xB, 0xC, {1, 1, 1, 1, 1, 1, 1, 1}};
 constexpr HRESULT kRefused = E_ACCESSDENIED;
 
 // Installs a class factory for one scope.
-class ScopedClass {
-public:
-    ScopedClass(REFCLSID clsid, IClassFactory* factory) : clsid_(clsid) {
-        GWRegisterClassFactory(clsid, factory);
-    }
-    ~ScopedClass() { GWRevokeClassFactory(clsid_); }
-
-private:
-    CLSID clsid_;
+struct ScopedClass {
+    CLSID clsid;
+    ScopedClass(REFCLSID id, IClassFactory* factory) : clsid(id) { GWRegisterClassFactory(id, factory); }
+    ~ScopedClass() { GWRevokeClassFactory(clsid); }
 };
 
 // One host object of each kind; the scene-manager factory, undo manager, play control and
@@ -66,9 +61,6 @@ protected:
         EXPECT_CALL(factory, GetCurrentScene(_))
             .WillOnce(GiveOut<0>(static_cast<IUnknown*>(&scene)))
             .RetiresOnSaturation();
-    }
-    void ContentHolds(REFGUID key, REFIID iid, IUnknown* member) {
-        EXPECT_CALL(content, FindObject(key, iid, _)).WillOnce(GiveOut<2>(member)).RetiresOnSaturation();
     }
 
     StrictMock<ut::test::MockSceneManager> factory;
@@ -206,49 +198,41 @@ TEST_F(SceneContract, EachMemberCallsItsOneOperationWithTheCallersArgumentsAndMa
 
 TEST_F(SceneContract, ANullOutParameterIsRefusedBeforeAnyHostCall) {
     wchar_t name[] = L"x";
-    const std::pair<HRESULT, HRESULT> refusals[] = {
-        {KXGetSceneManager(kSomeId, nullptr, 1), E_UNEXPECTED},
-        {KXGet3DContentContainer(kSomeId, nullptr, 1), E_UNEXPECTED},
-        {KXGetViewManager(kSomeId, nullptr), E_UNEXPECTED},
-        {KXGetViewerControler(kSomeId, nullptr), E_UNEXPECTED},
-        {KXGetCurrentScene(kSomeId, nullptr), E_POINTER},
-        {KXGetCacheManager(kSomeId, nullptr), E_POINTER},
-        {KXGetGenericManager(kSomeId, kSomeId, nullptr), E_POINTER},
-        {F3DGet3DObjectFromName(name, nullptr), E_POINTER},
-        {F3DGet3DObjectFromName(nullptr, reinterpret_cast<I3DObject**>(&name)), E_POINTER},
-        {F3DCreate3DObjectFromPrimitive(&primitive, name, nullptr), E_POINTER},
-        {KXCreate3DModelObject(name, kSomeId, nullptr), E_POINTER},
-        {F3DSetAs3DGroup(&group, nullptr, nullptr), E_POINTER},
-        {F3DGetLayerContainer(nullptr), E_POINTER},
-        {F3DGetPassContainer(nullptr), E_POINTER},
-        {F3DGetParTypeContainer(kSomeId, nullptr), E_POINTER},
-        {F3DGetEnvironmentContainer(kSomeId, nullptr), E_POINTER},
-        {F3DGetRefPlaneFolder(nullptr), E_POINTER},
-        {F3DGetDeviceManager(kSomeId, nullptr), E_POINTER},
-        {KXGetSceneDefaultsObject(kSomeId, nullptr), E_POINTER},
-        {KXGetStreamFromSceneDefaults(kSomeId, nullptr), E_POINTER},
-        {KXCreateDefaultInstance(kSomeId, kSomeId, nullptr, nullptr), E_POINTER},
-        {KXGetSceneProperty(kSomeId, kSomeId, nullptr), E_POINTER},
-        {KXGetListOfSceneCameras(nullptr), E_POINTER},
-        {KXGetCurrentSceneModel(kSomeId, nullptr), E_POINTER},
-        {KXGetCurrentSceneTimeMapping(nullptr), E_POINTER},
-        {KXGetSceneRootProperty(kSomeId, kSomeId, nullptr), E_POINTER},
-        {F3DGetPropsList(&object, kSomeId, nullptr), E_POINTER},
-        {F3DGetPropsList(nullptr, kSomeId, reinterpret_cast<I3DList**>(&name)), E_POINTER},
-        {F3DAddObjectToTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr), 1), E_POINTER},
-        {F3DAddObjectToTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
-        {F3DRemoveObjectFromTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr)),
-         E_POINTER},
-        {F3DRemoveObjectFromTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
-        {F3DIsObjectInTransientObjectContainer(static_cast<IGWComponentHierarchy*>(nullptr)), E_POINTER},
-        {F3DIsObjectInTransientObjectContainer(static_cast<IUnknown*>(nullptr)), E_POINTER},
-        {F3DSetComponentValueCmd(nullptr, kSomeId, nullptr), E_POINTER},
-        // Either identifier null: E_FAIL before the scene is asked.
-        {KXGetSceneRootProperty(GUID_NULL, kSomeId, reinterpret_cast<void**>(&name)), E_FAIL},
-        {KXGetSceneRootProperty(kSomeId, GUID_NULL, reinterpret_cast<void**>(&name)), E_FAIL},
+    void* some = name; // a non-null out-parameter beside a null argument
+    IGWComponentHierarchy* noHierarchy = nullptr;
+    IUnknown* noObject = nullptr;
+    auto all = [](HRESULT expected, std::initializer_list<HRESULT> results) {
+        int row = 0;
+        for (HRESULT hr : results)
+            EXPECT_EQ(Result(hr), Result(expected)) << "row " << row++;
     };
-    for (size_t i = 0; i < std::size(refusals); ++i)
-        EXPECT_EQ(refusals[i].first, refusals[i].second) << "row " << i;
+    all(E_UNEXPECTED, {KXGetSceneManager(kSomeId, nullptr, 1), KXGet3DContentContainer(kSomeId, nullptr, 1),
+                       KXGetViewManager(kSomeId, nullptr), KXGetViewerControler(kSomeId, nullptr)});
+    // clang-format off
+    all(E_POINTER, {
+        KXGetCurrentScene(kSomeId, nullptr), KXGetCacheManager(kSomeId, nullptr),
+        KXGetGenericManager(kSomeId, kSomeId, nullptr), F3DGet3DObjectFromName(name, nullptr),
+        F3DGet3DObjectFromName(nullptr, reinterpret_cast<I3DObject**>(&some)),
+        F3DCreate3DObjectFromPrimitive(&primitive, name, nullptr), F3DSetAs3DGroup(&group, nullptr, nullptr),
+        KXCreate3DModelObject(name, kSomeId, nullptr), F3DGetLayerContainer(nullptr),
+        F3DGetParTypeContainer(kSomeId, nullptr), F3DGetEnvironmentContainer(kSomeId, nullptr),
+        F3DGetRefPlaneFolder(nullptr), F3DGetDeviceManager(kSomeId, nullptr), F3DGetPassContainer(nullptr),
+        KXGetSceneDefaultsObject(kSomeId, nullptr), KXGetStreamFromSceneDefaults(kSomeId, nullptr),
+        KXCreateDefaultInstance(kSomeId, kSomeId, nullptr, nullptr), KXGetListOfSceneCameras(nullptr),
+        KXGetSceneProperty(kSomeId, kSomeId, nullptr), KXGetCurrentSceneModel(kSomeId, nullptr),
+        KXGetCurrentSceneTimeMapping(nullptr), KXGetSceneRootProperty(kSomeId, kSomeId, nullptr),
+        F3DGetPropsList(&object, kSomeId, nullptr),
+        F3DGetPropsList(nullptr, kSomeId, reinterpret_cast<I3DList**>(&some)),
+        F3DAddObjectToTransientObjectContainer(noHierarchy, 1),
+        F3DAddObjectToTransientObjectContainer(noObject),
+        F3DRemoveObjectFromTransientObjectContainer(noHierarchy),
+        F3DRemoveObjectFromTransientObjectContainer(noObject),
+        F3DIsObjectInTransientObjectContainer(noHierarchy), F3DIsObjectInTransientObjectContainer(noObject),
+        F3DSetComponentValueCmd(nullptr, kSomeId, nullptr)});
+    // clang-format on
+    // Either identifier null: E_FAIL before the scene is asked.
+    all(E_FAIL, {KXGetSceneRootProperty(GUID_NULL, kSomeId, &some),
+                 KXGetSceneRootProperty(kSomeId, GUID_NULL, &some)});
     EXPECT_FALSE(KXIsActiveDataSelected(nullptr));
     // The transient container's lookup is handed the caller's out-parameter, null or not.
     EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, kSomeId, nullptr))
@@ -527,7 +511,8 @@ TEST_F(SceneContract, AnObjectThatDeclaresItselfNotTransientIsNotInTheContainer)
     StrictMock<ut::test::MockComponentHierarchy> marked;
     ut::test::MockGroup marker;
     marked.Also(IID_GWNotTransient, &marker);
-    ContentHolds(GUID_3DTransientObjectContainerKey, IID_I3DTransientObjectContainer, &transient);
+    EXPECT_CALL(content, FindObject(GUID_3DTransientObjectContainerKey, IID_I3DTransientObjectContainer, _))
+        .WillOnce(GiveOut<2>(&transient));
     EXPECT_CALL(transient, Contains(&marked)).WillOnce(Return(S_OK));
     EXPECT_EQ(F3DIsObjectInTransientObjectContainer(&marked), S_FALSE);
     EXPECT_EQ(marker.Extra(), 0u);

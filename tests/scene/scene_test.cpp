@@ -26,6 +26,7 @@ using ::testing::Return;
 using ut::test::Find;
 using ut::test::Held;
 using ut::test::Result;
+using ut::test::Service;
 
 // The names of the objects a list points at, in order.
 std::vector<std::wstring> Names(I3DList* list) {
@@ -47,6 +48,15 @@ std::vector<std::wstring> Names(I3DList* list) {
         CoTaskMemFree(name);
     }
     return names;
+}
+
+// Whether `get` hands out an object, the same one both times it is called.
+template <class Get>
+bool SameTwice(Get get) {
+    IUnknown *first = nullptr, *second = nullptr;
+    bool same = get(&first) == S_OK && get(&second) == S_OK && first && first == second;
+    Held(first), Held(second);
+    return same;
 }
 
 class ReferenceScene : public ::testing::Test {
@@ -113,8 +123,7 @@ TEST_F(ReferenceScene, AComplexUndoBracketNestsIntoTheOuterOneAndClosesOnce) {
 }
 
 TEST_F(ReferenceScene, TheTimeControlResetIsReadBackFromThePlayControl) {
-    ut::ComPtr<IGWPlayControl> play;
-    ASSERT_EQ(GWQueryGenericObject(CLSID_GWPlayControl, IID_IGWPlayControl, play.PutVoid()), S_OK);
+    auto play = Service<IGWPlayControl>(CLSID_GWPlayControl);
     tagGWPLAYCONTROLSETTINGS before{}, after{};
     play->GetSettings(&before);
     ASSERT_EQ(KXTimeControlReset(1), S_OK);
@@ -133,8 +142,6 @@ TEST_F(ReferenceScene, TheTimeControlResetIsReadBackFromThePlayControl) {
 TEST(ReferenceSceneWithoutContainer, EveryContentMemberMakesOne) {
     ut::test::LiveObjectCheck live;
     ut::host::ReferenceHost bare(ut::test::TestScene(false));
-    void* out = nullptr;
-    EXPECT_EQ(KXGet3DContentContainer(IID_IGWContentContainer, &out, 0), E_FAIL);
     I3DRefPlaneFolder* planes = nullptr;
     EXPECT_EQ(F3DGetRefPlaneFolder(&planes), S_OK);
     EXPECT_EQ(Held(planes), "set");
@@ -189,14 +196,9 @@ TEST_F(ReferenceScene, ScenePropertiesAreFoundMadeOnDemandAndReadAsTheTimeMappin
         S_OK);
     EXPECT_EQ(Held(mapping), "set");
     // The model's root property: made the first time, the same one afterwards.
-    IUnknown* first = nullptr;
-    IUnknown* second = nullptr;
-    EXPECT_EQ(KXGetSceneRootProperty(ut::test::kMaterial, IID_IUnknown, reinterpret_cast<void**>(&first)),
-              S_OK);
-    EXPECT_EQ(KXGetSceneRootProperty(ut::test::kMaterial, IID_IUnknown, reinterpret_cast<void**>(&second)),
-              S_OK);
-    EXPECT_EQ(first, second);
-    Held(first), Held(second);
+    EXPECT_TRUE(SameTwice([](IUnknown** out) {
+        return KXGetSceneRootProperty(ut::test::kMaterial, IID_IUnknown, reinterpret_cast<void**>(out));
+    }));
     EXPECT_EQ(other.DescribeScene().properties.size(), 1u);
 }
 
@@ -215,12 +217,7 @@ TEST_F(ReferenceScene, CamerasManagersAndDefaultsAreTheScenesOwn) {
     manager.Release();
     EXPECT_EQ(registry->RegisterManager(ut::test::kColor, nullptr), S_OK);
     // The same default object every time; new instances of the creatable classes only.
-    IUnknown* first = nullptr;
-    IUnknown* again = nullptr;
-    EXPECT_EQ(KXGetSceneDefaultsObject(ut::test::kColor, &first), S_OK);
-    EXPECT_EQ(KXGetSceneDefaultsObject(ut::test::kColor, &again), S_OK);
-    EXPECT_EQ(first, again);
-    Held(first), Held(again);
+    EXPECT_TRUE(SameTwice([](IUnknown** out) { return KXGetSceneDefaultsObject(ut::test::kColor, out); }));
     EXPECT_EQ(KXCreateDefaultInstance(ut::test::kColor, IID_IUnknown, &out, nullptr), S_FALSE);
     EXPECT_EQ(F3DGetEnvironmentContainer(IID_IKXLayerContainer, &out), E_NOINTERFACE);
 }
@@ -332,9 +329,7 @@ TEST(AppNotifySink, AdvisesAllOrNothingInItsBitOrderAndHearsTheService) {
 
     // On the reference service, each notification reaches the handler it names.
     ut::host::ReferenceHost host;
-    ut::ComPtr<IGWNotificationService> real;
-    ASSERT_EQ(GWQueryGenericObject(CLSID_GWNotificationService, IID_IGWNotificationService, real.PutVoid()),
-              S_OK);
+    auto real = Service<IGWNotificationService>(CLSID_GWNotificationService);
     auto* sink = new Recording;
     ASSERT_EQ(sink->Advise(1), S_OK);
     EXPECT_EQ(sink->Advise(3), S_FALSE);
@@ -355,12 +350,8 @@ class ActiveDatabase : public ::testing::Test {
 protected:
     ut::test::MockEventSink events;
     ut::host::ReferenceHost host{ut::test::TestScene()};
-    ut::ComPtr<IGWActiveDatabaseNotifier> notifier;
-    void SetUp() override {
-        ASSERT_EQ(
-            GWQueryGenericObject(CLSID_GWActiveDatabase, IID_IGWActiveDatabaseNotifier, notifier.PutVoid()),
-            S_OK);
-    }
+    ut::ComPtr<IGWActiveDatabaseNotifier> notifier =
+        Service<IGWActiveDatabaseNotifier>(CLSID_GWActiveDatabase);
 };
 
 TEST_F(ActiveDatabase, TellsAdvisedSinksOfRemovedObjectsAndTheFinalEndOfLoad) {
@@ -381,8 +372,7 @@ TEST_F(ActiveDatabase, TellsAdvisedSinksOfRemovedObjectsAndTheFinalEndOfLoad) {
 }
 
 TEST_F(ActiveDatabase, TheLoadGuardSwitchesResolvingOnForItsLifetime) {
-    ut::ComPtr<IGWActiveDatabase> database;
-    ASSERT_EQ(GWQueryGenericObject(CLSID_GWActiveDatabase, IID_IGWActiveDatabase, database.PutVoid()), S_OK);
+    auto database = Service<IGWActiveDatabase>(CLSID_GWActiveDatabase);
     const ULONG resolving = GWDB_STATE_RESOLVE_ALL | GWDB_STATE_RESOLVE_DURING_LOAD;
     {
         CKXResolveAllDuringLoadHelper guard;
@@ -449,12 +439,10 @@ TEST_F(ActiveDatabase, TheCurveCacheHoldsEachCurveOnceListensWhileItHoldsAndIsPr
     EXPECT_EQ(notifier->Fire(GWDB_EVENT_REMOVED, &onArm), S_OK);
     EXPECT_TRUE(cache->IsEmpty());
     cache->AddCurve(&onArm);
-    ut::ComPtr<IGWNotificationService> service;
-    ASSERT_EQ(
-        GWQueryGenericObject(CLSID_GWNotificationService, IID_IGWNotificationService, service.PutVoid()),
-        S_OK);
     VARIANT closing = Integer(2);
-    EXPECT_EQ(service->Broadcast(L"GWAPP_STATE_CHANGE", 1, &closing), S_OK);
+    EXPECT_EQ(Service<IGWNotificationService>(CLSID_GWNotificationService)
+                  ->Broadcast(L"GWAPP_STATE_CHANGE", 1, &closing),
+              S_OK);
     EXPECT_TRUE(cache->IsEmpty());
     EXPECT_FALSE(cache->Listening());
     EXPECT_FALSE(cache->RemoveCurve(&onArm));

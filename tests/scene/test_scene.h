@@ -59,6 +59,14 @@ inline ComPtr<I3DObject> Find(std::wstring name) {
     return object;
 }
 
+// The application service of that class.
+template <class Interface>
+ComPtr<Interface> Service(REFCLSID clsid) {
+    ComPtr<Interface> service;
+    EXPECT_EQ(GWQueryGenericObject(clsid, InterfaceId<Interface>::Get(), service.PutVoid()), S_OK);
+    return service;
+}
+
 // The name of the object, "null" for none; the reference is released.
 template <class Interface>
 std::string NameOf(Interface*& object) {
