@@ -4,13 +4,9 @@
 #include "registration/registration_test.h"
 
 #include <cwctype>
-#include <functional>
-#include <memory>
 #include <optional>
 #include <tuple>
 
-#include <ut/registration.h>
-#include <ut/sdk/detail/registry.h>
 #include <ut/sdk/families.h>
 #include <ut/sdk/paths.h>
 #include <ut/sdk/preferences.h>
@@ -73,7 +69,7 @@ TEST_F(RegistrationTest, ClassKeysAreFoundByTheIdentifierTheirNameParsesTo) {
 
     EXPECT_EQ(KXGetCLSIDList(L"Operator", nullptr, &list), E_POINTER);
     EXPECT_EQ(KXGetCLSIDList(L"Operator", &count, nullptr), E_POINTER);
-    EXPECT_EQ(Listed(L"Nothing here"), std::vector<GUID>{GUID_NULL});
+    EXPECT_EQ(Listed(L"Nothing here"), Ids{GUID_NULL});
     ASSERT_EQ(KXSetPathAtRegKey(L"Empty", L"only a path"), S_OK);
     ASSERT_EQ(KXGetCLSIDList(L"Empty", &count, &list), S_OK);
     EXPECT_EQ(count, 0u);
@@ -245,21 +241,11 @@ TEST_F(RegistrationTest, DefaultsAreReadBackAndOnlyTheirOwnClassRemovesThem) {
     }
 }
 
-// Stores `text` as the explorer's viewer preference.
-void SetViewerPreference(const wchar_t* text) {
+// The host's preferences, where the explorer's viewer is kept.
+ComPtr<IGWPreferences> Preferences() {
     ComPtr<IGWPreferences> preferences;
-    ASSERT_EQ(KXGetPreferencesMgr(preferences.Put()), S_OK);
-    ASSERT_EQ(preferences->SetText(L"qvx_explorer.viewer", text), S_OK);
-}
-
-std::wstring ViewerPreference() {
-    ComPtr<IGWPreferences> preferences;
-    wchar_t* text = nullptr;
-    if (FAILED(KXGetPreferencesMgr(preferences.Put())) ||
-        FAILED(preferences->GetText(L"qvx_explorer.viewer", &text)))
-        return L"<none>";
-    std::unique_ptr<wchar_t, TaskMemDeleter> owned(text);
-    return text;
+    EXPECT_EQ(KXGetPreferencesMgr(preferences.Put()), S_OK);
+    return preferences;
 }
 
 TEST_F(RegistrationTest, TheExplorersEditorIsAPreferenceWithTheRegistryBehindIt) {
@@ -268,7 +254,9 @@ TEST_F(RegistrationTest, TheExplorersEditorIsAPreferenceWithTheRegistryBehindIt)
     // Deliberately no key: the view's name goes to the preferences.
     EXPECT_EQ(KXRegisterQVXExplorerEditor(kOther, GUID_NULL, m), E_FAIL); // not a view
     EXPECT_EQ(KXRegisterQVXExplorerEditor(kView, GUID_NULL, m), S_OK);
-    EXPECT_EQ(ViewerPreference(), L"Curve view");
+    wchar_t* viewer = nullptr;
+    ASSERT_EQ(Preferences()->GetText(L"qvx_explorer.viewer", &viewer), S_OK);
+    EXPECT_STREQ((std::unique_ptr<wchar_t, TaskMemDeleter>{viewer}.get()), L"Curve view");
     EXPECT_FALSE(KeyExists(HKEY_LOCAL_MACHINE, Base(L"QVX Explorer")));
     GUID editor = GUID_NULL, second = kOther;
     EXPECT_EQ(KXGetDefaultQVXExplorerEditor(&editor, &second), S_OK);
@@ -278,7 +266,7 @@ TEST_F(RegistrationTest, TheExplorersEditorIsAPreferenceWithTheRegistryBehindIt)
     // An empty or unknown preference falls back to the registry's default editor.
     const std::wstring defaultEditor = Base(L"QVX Explorer\\DefaultEditor");
     for (const wchar_t* preference : {L"", L"Unknown view"}) {
-        SetViewerPreference(preference);
+        ASSERT_EQ(Preferences()->SetText(L"qvx_explorer.viewer", preference), S_OK);
         EXPECT_EQ(KXGetDefaultQVXExplorerEditor(&editor, nullptr), S_FALSE);
         EXPECT_EQ(editor, GUID_NULL);
     }

@@ -2,72 +2,14 @@
 // leave, the family's deliberate quirks, and what each failing host call ends in.
 #include "registration/registration_test.h"
 
-#include <functional>
-#include <memory>
 #include <string_view>
 
 #include <ut/platform/process.h>
-#include <ut/registration.h>
-#include <ut/sdk/detail/registry.h>
 #include <ut/sdk/families.h>
-#include <ut/sdk/preferences.h>
-#include <ut/sdk/resources.h>
 
 #include "support/fault_plan.h"
-#include "support/ref_tracker.h"
 
 namespace ut::test {
-
-void RegistrationTest::SetUp() {
-    ASSERT_EQ(host_.Status(), S_OK);
-    const KXDictString strings[] = {{kTwistId, kTwist}, {kInspectorId, kInspector}, {kUnusedId, kUnused}};
-    ASSERT_EQ(KXDictAddInstanceStrings(Module(), strings, 3), S_OK);
-}
-
-std::vector<GUID> Listed(const wchar_t* category, HRESULT* hr) {
-    DWORD count = 0;
-    GUID* list = nullptr;
-    HRESULT listed = KXGetCLSIDList(category, &count, &list);
-    std::unique_ptr<GUID, TaskMemDeleter> owned(list);
-    if (hr)
-        *hr = listed;
-    return FAILED(listed) ? std::vector<GUID>{GUID_NULL} : std::vector<GUID>(list, list + count);
-}
-
-Ids Listing(const std::function<HRESULT(DWORD*, GUID**)>& list, HRESULT expected) {
-    DWORD count = 9;
-    GUID* ids = reinterpret_cast<GUID*>(&count);
-    EXPECT_EQ(list(&count, &ids), expected);
-    std::unique_ptr<GUID, TaskMemDeleter> owned(ids);
-    return ids ? Ids(ids, ids + count) : Ids{};
-}
-
-std::wstring NameOf(const wchar_t* category, const GUID& clsid) {
-    wchar_t name[80] = L"";
-    DWORD bytes = sizeof name;
-    return KXGetKeyName(category, clsid, name, &bytes) == S_OK ? std::wstring(name) : L"<failed>";
-}
-
-std::wstring TextAt(HKEY root, const std::wstring& path, const wchar_t* value) {
-    UniqueHKey key = sdk::OpenKey(root, path.c_str());
-    std::wstring text;
-    return key && sdk::ReadText(key.get(), value, text) == ERROR_SUCCESS ? text : L"<none>";
-}
-
-void SetText(HKEY root, const std::wstring& path, const wchar_t* name, const std::wstring& text) {
-    UniqueHKey key;
-    ASSERT_EQ(sdk::CreateKey(root, path.c_str(), key), ERROR_SUCCESS);
-    ASSERT_EQ(sdk::SetText(key.get(), name, text.c_str()), ERROR_SUCCESS);
-}
-
-bool KeyExists(HKEY root, const std::wstring& path) {
-    return sdk::OpenKey(root, path.c_str()) != nullptr;
-}
-
-std::wstring Base(const std::wstring& path) {
-    return LibraryBaseKey() + path;
-}
-
 namespace {
 
 using Getter = HRESULT (*)(const GUID&, wchar_t*, DWORD*);
@@ -139,7 +81,7 @@ TEST_F(RegistrationTest, EveryFormWritesItsRecordThatReadsBackAndGoes) {
         SCOPED_TRACE(form.label);
         const bool named = !form.name.empty();
         ASSERT_EQ(form.add(), S_OK);
-        EXPECT_EQ(Listed(form.category), std::vector<GUID>{g});
+        EXPECT_EQ(Listed(form.category), Ids{g});
         EXPECT_EQ(TextAt(HKEY_LOCAL_MACHINE, Base(form.category) + L"\\" + GuidToString(g),
                          named ? L"Name" : L"Path"),
                   named ? form.name : kPath);
@@ -150,8 +92,7 @@ TEST_F(RegistrationTest, EveryFormWritesItsRecordThatReadsBackAndGoes) {
         EXPECT_EQ(ComName(g), named ? form.name : L"<none>");
 
         EXPECT_EQ(form.remove(), form.removed);
-        EXPECT_EQ(Listed(form.category),
-                  form.categoryStays ? std::vector<GUID>{} : std::vector<GUID>{GUID_NULL});
+        EXPECT_EQ(Listed(form.category), form.categoryStays ? Ids{} : Ids{GUID_NULL});
         EXPECT_EQ(ComName(g), L"<none>");
         ClearRegistrations();
     }
@@ -247,7 +188,7 @@ TEST_F(RegistrationTest, ThePrimitivesAnswerZeroOrOne) {
     EXPECT_EQ(KXAddRegistryKey(g, L"Fresh", L"Name", kTwist), S_OK);
     EXPECT_EQ(KXRemRegistryKey(g, L"Fresh"), S_OK);
     EXPECT_EQ(KXAddRegistryKey(g, L"Fresh", L"Name", nullptr), E_FAIL); // after the keys were made
-    EXPECT_EQ(Listed(L"Fresh"), std::vector<GUID>{g});
+    EXPECT_EQ(Listed(L"Fresh"), Ids{g});
     // A key the registry refuses gives 1, also after a COM entry that succeeded.
     const std::wstring tooLong(300, L'x');
     EXPECT_EQ(KXAddRegistryKey(g, tooLong.c_str(), L"Name", kTwist), S_FALSE);
@@ -338,16 +279,14 @@ TEST_F(RegistrationTest, EveryHostFailureEndsAsTheRulesSay) {
         ASSERT_EQ(KXRegisterQVXExplorerEditor(kView, GUID_NULL, m), S_OK);
         SetText(HKEY_LOCAL_MACHINE, Base(L"QVX Explorer\\DefaultEditor"), L"CLSID", GuidToString(kTree));
     };
+    // clang-format off
     const Walk walks[] = {
         {"operator", [] {}, [&] { return KXRegisterOperator(kClass, m, kTwist); }, Propagated},
         {"operator ex, family list", [] {},
-         [&] {
-             return KXRegisterOperatorEx(kClass, m, kTwistId, true, kCompanion, kInspectorId, 1, &kFamily);
-         },
+         [&] { return KXRegisterOperatorEx(kClass, m, kTwistId, true, kCompanion, kInspectorId, 1, &kFamily); },
          Propagated},
         {"operator ex, one family", [] {},
-         [&] { return KXRegisterOperatorEx(kClass, m, kTwistId, kCompanion, kInspectorId, kFamily); },
-         Propagated},
+         [&] { return KXRegisterOperatorEx(kClass, m, kTwistId, kCompanion, kInspectorId, kFamily); }, Propagated},
         // The earlier registration's removal does not count; the new COM entry does.
         {"manipulator", [] {}, [&] { return KXRegisterManipulator(kClass, m, kTwist, 1, &kView); },
          [](int, std::string_view failed) { return failed == "GWRegisterCOMObject" ? kInjected : S_OK; }},
@@ -355,24 +294,15 @@ TEST_F(RegistrationTest, EveryHostFailureEndsAsTheRulesSay) {
          [&] { return KXUnRegisterOperator(kClass); }, Ignored},
         // Only the last step, the memberships, gives the result.
         {"operator ex removal, family list",
-         [&] {
-             ASSERT_EQ(KXRegisterOperatorEx(kClass, m, kTwistId, true, kCompanion, kInspectorId, 1, &kFamily),
-                       S_OK);
-         },
+         [&] { ASSERT_EQ(KXRegisterOperatorEx(kClass, m, kTwistId, true, kCompanion, kInspectorId, 1, &kFamily), S_OK); },
          [&] { return KXUnRegisterOperatorEx(kClass, kCompanion, 1, &kFamily, m); },
          [](int, std::string_view failed) {
-             return failed == "GWQueryGenericObject" || failed == "IGWFamiliesManager::UnregisterMembers"
-                        ? kInjected
-                        : S_OK;
-         }},
+             return failed == "GWQueryGenericObject" || failed == "IGWFamiliesManager::UnregisterMembers" ? kInjected : S_OK; }},
         {"inspectable removal, one family",
-         [&] {
-             ASSERT_EQ(KXRegisterInspectableObject(kClass, m, 0, kCompanion, kInspectorId, kFamily), S_OK);
-         },
+         [&] { ASSERT_EQ(KXRegisterInspectableObject(kClass, m, 0, kCompanion, kInspectorId, kFamily), S_OK); },
          [&] { return KXUnRegisterInspectableObject(kClass, kCompanion, kFamily, m); },
          [](int n, std::string_view) { return n >= 4 ? kInjected : S_OK; }},
-        {"explorer source operators", explorerFamilies, [&] { return Freed(KXGetQVXExplorerSourceOps); },
-         Propagated},
+        {"explorer source operators", explorerFamilies, [&] { return Freed(KXGetQVXExplorerSourceOps); }, Propagated},
         {"explorer source operator views", explorerFamilies,
          [&] { return Freed([](DWORD* c, GUID** l) { return KXGetQVXExplorerSourceOpViews(kTree, c, l); }); },
          Propagated},
@@ -380,28 +310,21 @@ TEST_F(RegistrationTest, EveryHostFailureEndsAsTheRulesSay) {
          [&] { return KXRegisterQVXExplorerEditor(kView, GUID_NULL, m); },
          [](int n, std::string_view) { return n ? E_FAIL : S_OK; }},
         // The registry's default stands in for what the host cannot tell.
-        {"explorer editor lookup", viewWithEditor,
-         [&] {
+        {"explorer editor lookup", viewWithEditor, [&] {
              GUID editor = GUID_NULL;
              HRESULT hr = KXGetDefaultQVXExplorerEditor(&editor, nullptr);
-             return hr == S_OK && (editor == kView || editor == kTree) ? S_OK : E_UNEXPECTED;
-         },
+             return hr == S_OK && (editor == kView || editor == kTree) ? S_OK : E_UNEXPECTED; },
          Ignored},
         {"host view name", [&] { ASSERT_EQ(KXRegisterView(kView, m, L"Curve view"), S_OK); },
-         [&] {
-             CKXString name;
-             return KXGetGWViewName(kView, name);
-         },
-         Propagated},
-        {"description file", [] {},
-         [&] {
+         [&] { CKXString name; return KXGetGWViewName(kView, name); }, Propagated},
+        {"description file", [] {}, [&] {
              wchar_t file[8];
              DWORD bytes = sizeof file;
              HRESULT hr = KXGetQDEFFilename(kClass, file, &bytes);
-             return hr == E_FAIL ? S_OK : hr; // there is no file: only the key text can fail otherwise
-         },
+             return hr == E_FAIL ? S_OK : hr; }, // there is no file: only the key text can fail otherwise
          Propagated},
     };
+    // clang-format on
     for (const Walk& walk : walks) {
         for (int n = 1;; ++n) {
             ClearRegistrations();

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <functional>
+#include <memory>
 #include <ostream>
 #include <string>
 #include <vector>
@@ -12,6 +13,9 @@
 #include <ut/host/reference_host.h>
 #include <ut/platform/registry.h>
 #include <ut/platform/text.h>
+#include <ut/registration.h>
+#include <ut/sdk/detail/registry.h>
+#include <ut/sdk/resources.h>
 
 #include "support/registrations.h"
 
@@ -29,7 +33,11 @@ inline constexpr const wchar_t *kTwist = L"Twist deformer", *kInspector = L"Twis
 
 class RegistrationTest : public testing::Test {
 protected:
-    void SetUp() override;
+    void SetUp() override {
+        ASSERT_EQ(host_.Status(), S_OK);
+        const KXDictString strings[] = {{kTwistId, kTwist}, {kInspectorId, kInspector}, {kUnusedId, kUnused}};
+        ASSERT_EQ(KXDictAddInstanceStrings(Module(), strings, 3), S_OK);
+    }
     static HINSTANCE Module() { return TestModule(); }
 
 private:
@@ -37,20 +45,48 @@ private:
     host::ReferenceHost host_;
 };
 
-// The classes KXGetCLSIDList gives for a category; {GUID_NULL} when it fails (with its result in
-// `hr` when asked).
-std::vector<GUID> Listed(const wchar_t* category, HRESULT* hr = nullptr);
-// What a listing hands out, checking its result; the list must be set, if only to null.
 using Ids = std::vector<GUID>;
-Ids Listing(const std::function<HRESULT(DWORD*, GUID**)>& list, HRESULT expected);
+
+// The classes KXGetCLSIDList gives for a category; {GUID_NULL} when it fails.
+inline Ids Listed(const wchar_t* category) {
+    DWORD count = 0;
+    GUID* list = nullptr;
+    HRESULT listed = KXGetCLSIDList(category, &count, &list);
+    std::unique_ptr<GUID, TaskMemDeleter> owned(list);
+    return FAILED(listed) ? Ids{GUID_NULL} : Ids(list, list + count);
+}
+// What a listing hands out, checking its result; the list must be set, if only to null.
+inline Ids Listing(const std::function<HRESULT(DWORD*, GUID**)>& list, HRESULT expected) {
+    DWORD count = 9;
+    GUID* ids = reinterpret_cast<GUID*>(&count);
+    EXPECT_EQ(list(&count, &ids), expected);
+    std::unique_ptr<GUID, TaskMemDeleter> owned(ids);
+    return ids ? Ids(ids, ids + count) : Ids{};
+}
 // The "Name" KXGetKeyName gives, or "<failed>".
-std::wstring NameOf(const wchar_t* category, const GUID& clsid);
+inline std::wstring NameOf(const wchar_t* category, const GUID& clsid) {
+    wchar_t name[80] = L"";
+    DWORD bytes = sizeof name;
+    return KXGetKeyName(category, clsid, name, &bytes) == S_OK ? std::wstring(name) : L"<failed>";
+}
 // A text value of `root`\`path`, or "<none>"; whether a key is there.
-std::wstring TextAt(HKEY root, const std::wstring& path, const wchar_t* value);
-bool KeyExists(HKEY root, const std::wstring& path);
+inline std::wstring TextAt(HKEY root, const std::wstring& path, const wchar_t* value) {
+    UniqueHKey key = sdk::OpenKey(root, path.c_str());
+    std::wstring text;
+    return key && sdk::ReadText(key.get(), value, text) == ERROR_SUCCESS ? text : L"<none>";
+}
+inline bool KeyExists(HKEY root, const std::wstring& path) {
+    return sdk::OpenKey(root, path.c_str()) != nullptr;
+}
 // Writes a text value, making the key.
-void SetText(HKEY root, const std::wstring& path, const wchar_t* name, const std::wstring& text);
+inline void SetText(HKEY root, const std::wstring& path, const wchar_t* name, const std::wstring& text) {
+    UniqueHKey key;
+    ASSERT_EQ(sdk::CreateKey(root, path.c_str(), key), ERROR_SUCCESS);
+    ASSERT_EQ(sdk::SetText(key.get(), name, text.c_str()), ERROR_SUCCESS);
+}
 // The library's base key followed by `path`.
-std::wstring Base(const std::wstring& path = L"");
+inline std::wstring Base(const std::wstring& path = L"") {
+    return LibraryBaseKey() + path;
+}
 
 } // namespace ut::test
