@@ -40,12 +40,8 @@ std::vector<std::uint32_t> Colours(HBITMAP bitmap, LONG& width, LONG& height) {
 class BitmapTest : public ::testing::Test {
 protected:
     void SetUp() override {
-        screen_ = GetDC(nullptr);
-        ASSERT_NE(screen_, nullptr);
-        source_ = CreateCompatibleDC(screen_);
-        target_ = CreateCompatibleDC(screen_);
-        ASSERT_NE(source_, nullptr);
-        ASSERT_NE(target_, nullptr);
+        ASSERT_TRUE((screen_ = GetDC(nullptr)) && (source_ = CreateCompatibleDC(screen_)) &&
+                    (target_ = CreateCompatibleDC(screen_)));
     }
     void TearDown() override {
         EXPECT_TRUE(DeleteDC(source_));
@@ -62,8 +58,7 @@ protected:
         EXPECT_NE(bitmap, nullptr);
         HGDIOBJ oldSource = SelectObject(source_, section);
         HGDIOBJ oldTarget = SelectObject(target_, bitmap);
-        EXPECT_NE(oldSource, nullptr);
-        EXPECT_NE(oldTarget, nullptr);
+        EXPECT_TRUE(oldSource && oldTarget);
         EXPECT_NE(SetStretchBltMode(target_, COLORONCOLOR), 0);
         EXPECT_TRUE(StretchBlt(target_, to.left, to.top, to.right - to.left, to.bottom - to.top, source_, 0,
                                0, width, height, SRCCOPY));

@@ -3,7 +3,6 @@
 #include <array>
 #include <cwctype>
 #include <filesystem>
-#include <fstream>
 #include <string>
 #include <tuple>
 #include <utility>
@@ -22,10 +21,6 @@ std::wstring Lower(std::wstring text) {
     std::transform(text.begin(), text.end(), text.begin(),
                    [](wchar_t c) { return static_cast<wchar_t>(std::towlower(static_cast<wint_t>(c))); });
     return text;
-}
-
-void Touch(const std::filesystem::path& path, std::size_t size = 0) {
-    std::ofstream(path, std::ios::binary) << std::string(size, 'x');
 }
 
 TEST(Files, TheTemporaryFolderEndsWithASeparatorAndSaysWhatRoomItNeeds) {
@@ -66,13 +61,8 @@ TEST(Files, TemporaryNamesAreNewFilesUnlessTheNumberIsGiven) {
 
 TEST(Files, DeletingAndAccessFollowTheSystemsAnswers) {
     TempFolder folder;
-    std::filesystem::path file = folder.Root() / "file.bin";
-    std::filesystem::path readOnly = folder.Root() / "read_only.bin";
-    Touch(file);
-    Touch(readOnly);
-    std::filesystem::permissions(readOnly, std::filesystem::perms::owner_read |
-                                               std::filesystem::perms::group_read |
-                                               std::filesystem::perms::others_read);
+    std::filesystem::path file = folder.Write(L"file.bin", ""), readOnly = folder.Write(L"read_only.bin", "");
+    std::filesystem::permissions(readOnly, std::filesystem::perms(0444));
     std::filesystem::path missing = folder.Root() / "missing.bin";
     const std::tuple<std::filesystem::path, int, int> cases[] = {
         // path, mode, answer

@@ -24,28 +24,19 @@ using ut::ComPtr;
 
 constexpr DWORD kTransacted = STGM_TRANSACTED | STGM_READWRITE | STGM_SHARE_EXCLUSIVE;
 
-// Where the compound file lives: a file, or a global memory block.
-class Home {
-public:
-    Home(bool inMemory, const TempFolder& folder) : path_(folder / L"model.cfb") {
-        if (inMemory) {
-            EXPECT_EQ(CreateILockBytesOnHGlobal(nullptr, TRUE, bytes_.Put()), S_OK);
-        }
-    }
+// Where the compound file lives: a file, or a global memory block when `bytes` is set.
+struct Home {
     HRESULT Create(ComPtr<IStorage>& root) {
-        return bytes_
-                   ? StgCreateDocfileOnILockBytes(bytes_.Get(), kCreateMode | STGM_TRANSACTED, 0, root.Put())
-                   : StgCreateDocfile(path_.c_str(), kCreateMode | STGM_TRANSACTED, 0, root.Put());
+        return bytes ? StgCreateDocfileOnILockBytes(bytes.Get(), kCreateMode | STGM_TRANSACTED, 0, root.Put())
+                     : StgCreateDocfile(path.c_str(), kCreateMode | STGM_TRANSACTED, 0, root.Put());
     }
     HRESULT Open(ComPtr<IStorage>& root) {
-        root.Reset();
-        return bytes_ ? StgOpenStorageOnILockBytes(bytes_.Get(), nullptr, kTransacted, nullptr, 0, root.Put())
-                      : StgOpenStorage(path_.c_str(), nullptr, kTransacted, nullptr, 0, root.Put());
+        return bytes ? StgOpenStorageOnILockBytes(bytes.Get(), nullptr, kTransacted, nullptr, 0, root.Put())
+                     : StgOpenStorage(path.c_str(), nullptr, kTransacted, nullptr, 0, root.Put());
     }
 
-private:
-    std::wstring path_;
-    ComPtr<ILockBytes> bytes_;
+    std::wstring path;
+    ComPtr<ILockBytes> bytes;
 };
 
 std::string Slice(const std::string& bytes, std::size_t at, std::size_t count) {
@@ -192,7 +183,10 @@ TEST(StorageSectors, RandomChangesReadBackBeforeAndAfterCommits) {
         for (unsigned seed : {1u, 2u, 3u}) {
             SCOPED_TRACE(testing::Message() << (inMemory ? "memory" : "file") << " seed " << seed);
             TempFolder folder;
-            Home home(inMemory, folder);
+            Home home{folder / L"model.cfb", {}};
+            if (inMemory) {
+                ASSERT_EQ(CreateILockBytesOnHGlobal(nullptr, TRUE, home.bytes.Put()), S_OK);
+            }
             Model(home, seed).Run(300);
         }
 }
