@@ -26,8 +26,11 @@ class RegFile : public testing::Test {
 protected:
     void SetUp() override { ASSERT_NE(scratch_.Get(), nullptr); }
 
-    // Imports UTF-8 text in which "$" stands for the scratch key's full path.
+    // Imports UTF-8 text in which "$" stands for the scratch key's full path, and "HKCU\$" for
+    // it with the short root's name.
     LONG Import(std::string text, RegFileProblem* problem = nullptr) {
+        for (std::size_t at; (at = text.find("HKCU\\$")) != std::string::npos;)
+            text.replace(at, 6, "HKCU\\" + Narrow(scratch_.SubKey()));
         for (std::size_t at; (at = text.find('$')) != std::string::npos;)
             text.replace(at, 1, Narrow(scratch_.FullPath()));
         return ImportRegFile(text.data(), text.size(), problem);
@@ -98,12 +101,8 @@ TEST_F(RegFile, ImportReadsEveryForm) {
     // clang-format on
     for (const Case& c : cases) {
         SCOPED_TRACE(c.label);
-        std::string text = "Windows Registry Editor Version 5.00\n\n" + c.body;
-        // "[HKCU\$]" names the scratch key with the short root: the path below the root follows it.
-        for (std::size_t at; (at = text.find("HKCU\\$")) != std::string::npos;)
-            text.replace(at, 6, "HKCU\\" + Narrow(scratch_.SubKey()));
         RegFileProblem problem;
-        ASSERT_EQ(Import(text, &problem), ERROR_SUCCESS)
+        ASSERT_EQ(Import("Windows Registry Editor Version 5.00\n\n" + c.body, &problem), ERROR_SUCCESS)
             << Narrow(problem.message) << " line " << problem.line;
         Value value = QueryValue(scratch_.Get(), L"v");
         EXPECT_EQ(std::tie(value.result, value.type, value.data),

@@ -15,9 +15,9 @@ namespace ut::test {
 
 using Bytes = std::vector<BYTE>;
 
-// Text as a text value holds it: wchar_t units with the terminator.
-inline Bytes TextBytes(const std::wstring& text) {
-    Bytes bytes((text.size() + 1) * sizeof(wchar_t));
+// Text as a text value holds it: wchar_t units, with the terminator unless told otherwise.
+inline Bytes TextBytes(const std::wstring& text, bool terminated = true) {
+    Bytes bytes((text.size() + terminated) * sizeof(wchar_t));
     std::memcpy(bytes.data(), text.c_str(), bytes.size());
     return bytes;
 }
@@ -118,13 +118,7 @@ inline const std::vector<Sample>& EveryKindOfValue() {
         {L"quote \" and back\\slash", REG_SZ, TextBytes(L"")},
         {L"\u00c4pfel \u00e9t\u00e9", REG_SZ, TextBytes(L"\u00df \u4e2d \U0001F3AC")},
         {L"lines", REG_SZ, TextBytes(L"one\r\ntwo"), false},
-        {L"unterminated", REG_SZ,
-         [] {
-             Bytes bytes = TextBytes(L"ab");
-             bytes.resize(2 * sizeof(wchar_t));
-             return bytes;
-         }(),
-         false},
+        {L"unterminated", REG_SZ, TextBytes(L"ab", false), false},
         {L"inner zero", REG_SZ, MultiBytes({L"a", L"b"}), false},
         {L"expand", REG_EXPAND_SZ, TextBytes(L"%PATH%;\u00e9")},
         {L"multi", REG_MULTI_SZ, MultiBytes({L"one", L"two", L"\u00c4"})},

@@ -12,6 +12,7 @@
 namespace {
 
 using ut::ComPtr;
+using ut::platform::OpenFileStream;
 using ut::test::PositionOf;
 
 LARGE_INTEGER Offset(LONGLONG value) {
@@ -36,10 +37,9 @@ enum class Kind { Memory, File };
 class StreamTest : public ::testing::TestWithParam<Kind> {
 protected:
     void SetUp() override {
-        ASSERT_EQ(GetParam() == Kind::Memory
-                      ? ut::platform::CreateMemoryStream(stream_.Put())
-                      : ut::platform::OpenFileStream((folder_ / L"stream.bin").c_str(),
-                                                     STGM_READWRITE | STGM_CREATE, stream_.Put()),
+        ASSERT_EQ(GetParam() == Kind::Memory ? ut::platform::CreateMemoryStream(stream_.Put())
+                                             : OpenFileStream((folder_ / L"stream.bin").c_str(),
+                                                              STGM_READWRITE | STGM_CREATE, stream_.Put()),
                   S_OK);
     }
 
@@ -146,12 +146,12 @@ TEST(MemoryStream, RefusesPositionsPastFourGibibytes) {
     EXPECT_EQ(stream->Write("x", 1, nullptr), STG_E_MEDIUMFULL);
 }
 
-TEST(FileStream, KeepsItsBytesAcrossOpensReportsItsNameAndFollowsTheMode) {
+TEST(FileStream, KeepsItsBytesAcrossOpensReportsItsNameFollowsTheModeAndRefusesBadArguments) {
     ut::test::TempFolder folder;
     std::wstring path = folder.Path(L"ut_stream_reopen.bin");
     auto open = [&](DWORD mode) {
         ComPtr<IStream> stream;
-        EXPECT_EQ(ut::platform::OpenFileStream(path.c_str(), mode, stream.Put()), S_OK);
+        EXPECT_EQ(OpenFileStream(path.c_str(), mode, stream.Put()), S_OK);
         return stream;
     };
     ULONG count = 0;
@@ -172,21 +172,17 @@ TEST(FileStream, KeepsItsBytesAcrossOpensReportsItsNameAndFollowsTheMode) {
     ASSERT_NE(stat.pwcsName, nullptr);
     EXPECT_NE(std::wstring(stat.pwcsName).find(L"ut_stream_reopen.bin"), std::wstring::npos);
     CoTaskMemFree(stat.pwcsName);
-}
 
-TEST(FileStream, RefusesBadArgumentsFoldersAndMissingFiles) {
-    ut::test::TempFolder temp;
-    ComPtr<IStream> stream;
-    std::wstring folder = temp.Path(), missing = temp / L"missing.bin",
-                 inMissingFolder = temp / L"missing/file.bin";
-    EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), STGM_READ, stream.Put()), STG_E_ACCESSDENIED);
-    EXPECT_EQ(ut::platform::OpenFileStream(L"", STGM_READ, stream.Put()), STG_E_INVALIDNAME);
-    EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), 3, stream.Put()), STG_E_INVALIDFLAG);
-    EXPECT_EQ(ut::platform::OpenFileStream(folder.c_str(), STGM_READ, nullptr), E_POINTER);
-    EXPECT_EQ(ut::platform::OpenFileStream(missing.c_str(), STGM_READ, stream.Put()), STG_E_FILENOTFOUND);
-    EXPECT_EQ(
-        ut::platform::OpenFileStream(inMissingFolder.c_str(), STGM_READWRITE | STGM_CREATE, stream.Put()),
-        STG_E_FILENOTFOUND);
+    // Bad arguments, folders and missing files are refused.
+    std::wstring root = folder.Path(), missing = folder / L"missing.bin",
+                 inMissingFolder = folder / L"missing/file.bin";
+    EXPECT_EQ(OpenFileStream(root.c_str(), STGM_READ, stream.Put()), STG_E_ACCESSDENIED);
+    EXPECT_EQ(OpenFileStream(L"", STGM_READ, stream.Put()), STG_E_INVALIDNAME);
+    EXPECT_EQ(OpenFileStream(root.c_str(), 3, stream.Put()), STG_E_INVALIDFLAG);
+    EXPECT_EQ(OpenFileStream(root.c_str(), STGM_READ, nullptr), E_POINTER);
+    EXPECT_EQ(OpenFileStream(missing.c_str(), STGM_READ, stream.Put()), STG_E_FILENOTFOUND);
+    EXPECT_EQ(OpenFileStream(inMissingFolder.c_str(), STGM_READWRITE | STGM_CREATE, stream.Put()),
+              STG_E_FILENOTFOUND);
     EXPECT_FALSE(stream);
 }
 
