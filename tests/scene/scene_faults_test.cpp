@@ -65,6 +65,11 @@ std::function<std::string()> Says(
     };
 }
 
+// The walk of an export that gives a result only, named by its call; SAYS_THEN puts back what it
+// changed with `undo`.
+#define SAYS(call, ...) Walk(#call, Says([&] { return call; }), __VA_ARGS__)
+#define SAYS_THEN(call, undo, ...) Walk(#call, Says([&] { return call; }, [&] { (void)undo; }), __VA_ARGS__)
+
 struct Walk {
     const char* name;
     std::function<std::string()> run;
@@ -172,23 +177,16 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
          },
          {"DENIED 3"},
          "S_OK 1"},
-        {"F3DSceneNotificationQuietOff", Says(F3DSceneNotificationQuietOff), {"DENIED"}, "S_OK"},
+        SAYS(F3DSceneNotificationQuietOff(), {"DENIED"}, "S_OK"),
         HANDING(I3DObject, F3DCreate3DObjectFromPrimitive(&primitive_, cube, o), {denied}),
         HANDING(void, KXCreate3DModelObject(L"Model", IID_I3DModel, o), {denied}),
-        {"F3DAdd3DObjectToScene", // the removal answers S_FALSE when it was not added
-         Says([&] { return F3DAdd3DObjectToScene(rig_.Get(), arm_.Get(), 1); },
-              [&] { (void)F3DRemove3DObjectFromScene(rig_.Get()); }),
-         {"DENIED"},
-         "S_OK"},
-        {"F3DRemove3DObjectFromScene", // the adding back answers E_INVALIDARG when it stayed
-         Says([&] { return F3DRemove3DObjectFromScene(light_.Get()); },
-              [&] { (void)F3DAdd3DObjectToScene(light_.Get(), nullptr, 0); }),
-         {"DENIED", "DENIED", "S_OK"}, // telling the database of the removal may fail
-         "S_OK"},
-        {"F3DSetAs3DGroup",
-         Says([&] { return F3DSetAs3DGroup(&group_, element_.Get(), nullptr); }),
-         {"DENIED"},
-         "S_OK"},
+        // The removal answers S_FALSE when it was not added.
+        SAYS_THEN(F3DAdd3DObjectToScene(rig_.Get(), arm_.Get(), 1), F3DRemove3DObjectFromScene(rig_.Get()),
+                  {"DENIED"}, "S_OK"),
+        // The adding back answers E_INVALIDARG when it stayed; telling the database may fail.
+        SAYS_THEN(F3DRemove3DObjectFromScene(light_.Get()), F3DAdd3DObjectToScene(light_.Get(), nullptr, 0),
+                  {"DENIED", "DENIED", "S_OK"}, "S_OK"),
+        SAYS(F3DSetAs3DGroup(&group_, element_.Get(), nullptr), {"DENIED"}, "S_OK"),
         // The delete-all bracket is optional, and what it answers is not reported.
         {"KXDeleteAll",
          [&] {
@@ -234,29 +232,16 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
         // Any failure on the way to the list is E_FAIL.
         HANDING(I3DList, F3DGetPropsList(arm_.Get(), ut::test::kColor, o), {"E_FAIL null"}),
         // The transient object container, each put back afterwards.
-        {"F3DAddObjectToTransientObjectContainer",
-         Says([&] { return F3DAddObjectToTransientObjectContainer(light); },
-              [&] { (void)F3DRemoveObjectFromTransientObjectContainer(light); }),
-         {"S_OK", "DENIED", "DENIED"},
-         "S_OK"},
-        {"F3DRemoveObjectFromTransientObjectContainer",
-         Says([&] { return F3DRemoveObjectFromTransientObjectContainer(armObject); }, putBack),
-         {"S_FALSE", "DENIED", "DENIED"},
-         "S_OK"},
-        {"F3DIsObjectInTransientObjectContainer",
-         Says([&] { return F3DIsObjectInTransientObjectContainer(armObject); }),
-         {"S_FALSE", "DENIED", "DENIED"},
-         "S_OK"},
-        {"F3DTransientObjectContainerReset",
-         Says(F3DTransientObjectContainerReset, putBack),
-         {"S_OK", "DENIED", "DENIED"},
-         "S_OK"},
+        SAYS_THEN(F3DAddObjectToTransientObjectContainer(light),
+                  F3DRemoveObjectFromTransientObjectContainer(light), {"S_OK", "DENIED", "DENIED"}, "S_OK"),
+        SAYS_THEN(F3DRemoveObjectFromTransientObjectContainer(armObject), putBack(),
+                  {"S_FALSE", "DENIED", "DENIED"}, "S_OK"),
+        SAYS(F3DIsObjectInTransientObjectContainer(armObject), {"S_FALSE", "DENIED", "DENIED"}, "S_OK"),
+        SAYS_THEN(F3DTransientObjectContainerReset(), putBack(), {"S_OK", "DENIED", "DENIED"}, "S_OK"),
         // Reaching the parameter and the proxy fails the command; the current time and the set do not.
-        {"KXTimeControlReset", Says([] { return KXTimeControlReset(1); }), {"DENIED"}, "S_OK"},
-        {"F3DSetComponentValueCmd",
-         Says([&] { return F3DSetComponentValueCmd(arm_.Get(), ut::test::kX, &two); }),
-         {"DENIED", "DENIED", "S_OK", "S_OK", "S_OK"},
-         "S_OK"},
+        SAYS(KXTimeControlReset(1), {"DENIED"}, "S_OK"),
+        SAYS(F3DSetComponentValueCmd(arm_.Get(), ut::test::kX, &two),
+             {"DENIED", "DENIED", "S_OK", "S_OK", "S_OK"}, "S_OK"),
         {"KXIsActiveDataSelected",
          [&] { return std::string(KXIsActiveDataSelected(arm_.Get()) ? "yes" : "no"); },
          {"no"},
@@ -278,15 +263,12 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
          {"0", "0", "0", "0"},
          "1"},
         // Families: the manager's failures come back, except that membership is then "no".
-        {"KXFindFamily", Says([&] { return KXFindFamily(L"cameras", &found); }), {"DENIED"}, "S_OK"},
+        SAYS(KXFindFamily(L"cameras", &found), {"DENIED"}, "S_OK"),
         {"F3DIsCLSIDInFamily",
          [&] { return std::to_string(F3DIsCLSIDInFamily(kLens, GUID_3DCameraFamily)); },
          {std::to_string(kFault), "0"},
          "1"},
-        {"KXValidateObjectFamily",
-         Says([&] { return KXValidateObjectFamily(&cameras, 1, kLens); }),
-         {"DENIED"},
-         "S_OK"},
+        SAYS(KXValidateObjectFamily(&cameras, 1, kLens), {"DENIED"}, "S_OK"),
         // A failure inside a child's scan leaves that child out; the rest are returned.
         {"CSharedGuid",
          [&] {
@@ -343,14 +325,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
          },
          {"DENIED 3"},
          "S_OK 3"},
-        {"KXAdviseOnActiveDBEx",
-         Says([&] { return KXAdviseOnActiveDBEx(&events, 1, GWDB_EVENT_REMOVED); }, withdraw),
-         {"DENIED"},
-         "S_OK"},
-        {"KXAdviseOnActiveDBForFinalEndLoad",
-         Says([&] { return KXAdviseOnActiveDBForFinalEndLoad(&events, 5); }, withdraw),
-         {"DENIED"},
-         "S_OK"},
+        SAYS_THEN(KXAdviseOnActiveDBEx(&events, 1, GWDB_EVENT_REMOVED), withdraw(), {"DENIED"}, "S_OK"),
+        SAYS_THEN(KXAdviseOnActiveDBForFinalEndLoad(&events, 5), withdraw(), {"DENIED"}, "S_OK"),
         {"CKXResolveAllDuringLoadHelper, F3DWasLoadCancelled",
          [&] {
              std::string seen;
@@ -359,8 +335,7 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
                  seen = std::to_string(F3DWasLoadCancelled());
              }
              Lift();
-             ut::ComPtr<IGWActiveDatabase> database;
-             (void)GWQueryGenericObject(CLSID_GWActiveDatabase, IID_IGWActiveDatabase, database.PutVoid());
+             auto database = ut::test::Service<IGWActiveDatabase>(CLSID_GWActiveDatabase);
              seen += " " + Result(database->TestStateFlags(GWDB_STATE_RESOLVE_ALL));
              (void)database->SetStateFlags(GWDB_STATE_RESOLVE_ALL | GWDB_STATE_RESOLVE_DURING_LOAD, FALSE);
              return seen;
@@ -368,11 +343,9 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
          // Only a failing switch-off leaves resolving on.
          {"0 S_FALSE", "0 S_FALSE", "0 S_FALSE", "0 S_FALSE", "0 S_FALSE", "0 S_OK", "0 S_OK"},
          "0 S_FALSE"},
-        {"FPropertyChangedNotify", // quiet is switched off again when the bracket failed to close
-         Says([&] { return FPropertyChangedNotify(ut::test::kX, nullptr, nullptr, nullptr, 0, 0, sinks); },
-              [] { (void)F3DSceneNotificationQuietOff(); }),
-         {"S_OK"},
-         "S_OK"},
+        // Quiet is switched off again when the bracket failed to close.
+        SAYS_THEN(FPropertyChangedNotify(ut::test::kX, nullptr, nullptr, nullptr, 0, 0, sinks),
+                  F3DSceneNotificationQuietOff(), {"S_OK"}, "S_OK"),
         {"C3DFCurveKeySelectionCache",
          [&] {
              C3DFCurveKeySelectionCache* cache = KXGetFCurveKeySelectionCache();
@@ -384,17 +357,12 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
          },
          {"1 0"},
          "1 0"},
-        // Hierarchy moves and roots, each move put back afterwards.
-        {"KXMoveObjectInHier", // the removal answers S_FALSE when it did not move
-         Says(
-             [&] {
-                 ut::ComPtr<IUnknown> previous;
-                 return KXMoveObjectInHier(robot_.Get(), rig_.Get(), GWDEST_LAST, nullptr, previous.Put());
-             },
-             [&] { (void)F3DRemove3DObjectFromScene(rig_.Get()); }),
-         // A failing look-up of the object is a refusal; a failing check only skips `out`.
-         {"DENIED", "E_INVALIDARG", "DENIED", "S_OK", "DENIED"},
-         "S_OK"},
+        // Hierarchy moves and roots. A failing look-up of the object is a refusal; a failing check only
+        // skips `out`. The move is put back; the removal answers S_FALSE when it did not move.
+        SAYS_THEN(KXMoveObjectInHier(robot_.Get(), rig_.Get(), GWDEST_LAST, nullptr,
+                                     ut::ComPtr<IUnknown>().Put()), // released at once
+                  F3DRemove3DObjectFromScene(rig_.Get()),
+                  {"DENIED", "E_INVALIDARG", "DENIED", "S_OK", "DENIED"}, "S_OK"),
         HANDING(I3DObject, KXGet3DObjectHierarchyRoot(arm_.Get(), o), {denied}),
         {"KXGet3DObjectHierarchyRootInModel",
          Handing<I3DObject>([&](auto o) {
@@ -403,10 +371,7 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
              return KXGet3DObjectHierarchyRootInModel(arm_.Get(), model.Get(), o);
          }),
          {denied}},
-        {"KXGetSceneBBox",
-         Says([&] { return KXGetSceneBBox(nullptr, nullptr, 0, E3DSPACE_GLOBAL, nullptr, 0, &box); }),
-         {"DENIED"},
-         "S_FALSE"},
+        SAYS(KXGetSceneBBox(nullptr, nullptr, 0, E3DSPACE_GLOBAL, nullptr, 0, &box), {"DENIED"}, "S_FALSE"),
     };
     int walked = 0;
     for (const Walk& walk : walks) {
