@@ -5,7 +5,6 @@
 #include <filesystem>
 #include <functional>
 #include <iostream>
-#include <set>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -29,13 +28,11 @@ using ut::ComPtr;
 using ut::test::Narrow;
 namespace fs = std::filesystem;
 
-constexpr CLSID kLight = {0x9E5E0001, 0, 0, {1, 1, 1, 1, 1, 1, 1, 1}};
-constexpr CLSID kOther = {0x9E5E0002, 0, 0, {2, 2, 2, 2, 2, 2, 2, 2}};
-constexpr CLSID kSpotA = {0x9E5E0003, 0, 0, {3, 3, 3, 3, 3, 3, 3, 3}};
-constexpr CLSID kSpotB = {0x9E5E0004, 0, 0, {4, 4, 4, 4, 4, 4, 4, 4}};
-constexpr CLSID kCommand = {0x9E5E0005, 0, 0, {5, 5, 5, 5, 5, 5, 5, 5}};
-constexpr GUID kFamily = {0x9E5E0006, 0, 0, {6, 6, 6, 6, 6, 6, 6, 6}};
-constexpr GUID kWidth = {0x9E5E0007, 0, 0, {7, 7, 7, 7, 7, 7, 7, 7}};
+constexpr GUID Id(unsigned char n) {
+    return {0x9E5E0000u + n, 0, 0, {n, n, n, n, n, n, n, n}};
+}
+constexpr CLSID kLight = Id(1), kOther = Id(2), kSpotA = Id(3), kSpotB = Id(4), kCommand = Id(5);
+constexpr GUID kFamily = Id(6), kWidth = Id(7);
 
 ut::host::PresetDescription Spot(const CLSID& clsid, double width) {
     return {.objectClass = clsid, .values = {{kWidth, L"width", width}}};

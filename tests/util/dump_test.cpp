@@ -4,7 +4,6 @@
 #include <vector>
 
 #include <gmock/gmock.h>
-#include <gtest/gtest.h>
 
 #include <ut/dump.h>
 #include <ut/host/reference_host.h>
