@@ -61,7 +61,6 @@ TEST(ClipboardFormats, OneNumberPerNameWhateverItsCase) {
     EXPECT_NE(url, corvane);
     EXPECT_EQ(RegisterClipboardFormatW(L"uniformresourcelocator"), url);
     EXPECT_EQ(RegisterClipboardFormatW(L"CORVANE IUNKNOWN"), corvane);
-    EXPECT_EQ(RegisterClipboardFormatW(L"3DList IUnknown"), RegisterClipboardFormatW(L"3DList IUnknown"));
 }
 
 TEST(DropFiles, NamesCountLengthsAndCutCopies) {

@@ -14,16 +14,12 @@ using namespace ut::test;
 using ut::UniqueHKey;
 
 // One-call forms for the tables; what they hand out is dropped.
-LONG Open(HKEY key, const wchar_t* path) {
-    HKEY opened = nullptr;
-    LONG result = RegOpenKeyExW(key, path, 0, KEY_READ, &opened);
-    UniqueHKey owned(opened);
-    return result;
-}
-LONG Create(HKEY key, const wchar_t* path) {
-    HKEY created = nullptr;
-    LONG result = RegCreateKeyExW(key, path, 0, nullptr, 0, KEY_READ, nullptr, &created, nullptr);
-    UniqueHKey owned(created);
+constexpr bool kCreate = true;
+LONG Open(HKEY key, const wchar_t* path, bool create = false) {
+    HKEY handed = nullptr;
+    LONG result = create ? RegCreateKeyExW(key, path, 0, nullptr, 0, KEY_READ, nullptr, &handed, nullptr)
+                         : RegOpenKeyExW(key, path, 0, KEY_READ, &handed);
+    UniqueHKey owned(handed);
     return result;
 }
 LONG Query(HKEY key) {
@@ -42,7 +38,7 @@ const Call ListKeys = [](HKEY key) { return List(key, false); };
 const Call ListValues = [](HKEY key) { return List(key, true); };
 const Call DeleteValue = [](HKEY key) { return RegDeleteValueW(key, L"v"); };
 const Call OpenSub = [](HKEY key) { return Open(key, L"sub"); };
-const Call CreateNew = [](HKEY key) { return Create(key, L"new"); };
+const Call CreateNew = [](HKEY key) { return Open(key, L"new", kCreate); };
 const Call DeleteNew = [](HKEY key) { return RegDeleteKeyW(key, L"new"); };
 LONG Info(HKEY key) {
     DWORD subKeys = 0;
@@ -126,7 +122,7 @@ TEST_F(Registry, CallsAnswerTheSystemsCodes) {
         {"open below a missing key", KEY_READ, [](HKEY k) { return Open(k, L"missing\\deeper"); }, ERROR_FILE_NOT_FOUND},
         {"open without a result", KEY_READ, [](HKEY k) { return RegOpenKeyExW(k, L"sub", 0, KEY_READ, nullptr); },
          ERROR_INVALID_PARAMETER},
-        {"a path that starts with a backslash", KEY_READ, [](HKEY k) { return Create(k, L"\\lead"); }, ERROR_BAD_PATHNAME},
+        {"a path that starts with a backslash", KEY_READ, [](HKEY k) { return Open(k, L"\\lead", kCreate); }, ERROR_BAD_PATHNAME},
         {"query a missing value", KEY_READ, Query, ERROR_FILE_NOT_FOUND},
         {"query data without a byte count", KEY_READ,
          [](HKEY k) { return RegQueryValueExW(k, L"v", nullptr, nullptr, reinterpret_cast<BYTE*>(&k), nullptr); },

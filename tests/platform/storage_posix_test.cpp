@@ -33,29 +33,26 @@ ComPtr<IStorage> Created(const std::wstring& path) {
 }
 
 // The bytes of a compound file, with the places a test damages found by name.
-class RawFile {
-public:
-    explicit RawFile(std::string bytes) : bytes_(std::move(bytes)) {}
-
+struct RawFile {
     std::uint32_t Get32(std::size_t at) const {
         std::uint32_t value = 0;
         for (int i = 3; i >= 0; --i)
-            value = value << 8 | static_cast<std::uint8_t>(bytes_[at + i]);
+            value = value << 8 | static_cast<std::uint8_t>(bytes[at + i]);
         return value;
     }
     // Writes the `size` low bytes of `value`, little-endian.
     void Put(std::size_t at, std::uint32_t value, int size = 4) {
         for (int i = 0; i < size; ++i)
-            bytes_[at + i] = static_cast<char>(value >> (8 * i));
+            bytes[at + i] = static_cast<char>(value >> (8 * i));
     }
     // The directory entry named `name`: entries are 128 bytes, aligned, after the header.
     std::size_t Entry(const std::string& name) const {
         std::string utf16;
         for (char c : name)
             utf16 += std::string{c, '\0'};
-        for (std::size_t at = 512; at + 128 <= bytes_.size(); at += 128)
-            if (bytes_.compare(at, utf16.size() + 2, utf16 + std::string(2, '\0')) == 0 &&
-                static_cast<std::uint8_t>(bytes_[at + 64]) == utf16.size() + 2)
+        for (std::size_t at = 512; at + 128 <= bytes.size(); at += 128)
+            if (bytes.compare(at, utf16.size() + 2, utf16 + std::string(2, '\0')) == 0 &&
+                static_cast<std::uint8_t>(bytes[at + 64]) == utf16.size() + 2)
                 return at;
         ADD_FAILURE() << "no entry " << name;
         return 0;
@@ -65,10 +62,7 @@ public:
         return (Get32(76) + 1) * 512 + 4 * Get32(Entry(name) + 116);
     }
 
-    std::string& Bytes() { return bytes_; }
-
-private:
-    std::string bytes_;
+    std::string bytes;
 };
 
 // A small file: a regular stream "big", a mini stream "small" and a storage "sub".
@@ -102,11 +96,11 @@ const Damage kDamages[] = {
     {"mini sector shift", kOpen, STG_E_INVALIDHEADER, [](RawFile& f) { f.Put(32, 7, 2); }},
     {"FAT count past the file", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(44, 0x7FFFFFFF); }},
     {"directory past the file", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(48, 0x00FFFFFF); }},
-    {"truncated", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Bytes().resize(1024); }},
+    {"truncated", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.bytes.resize(1024); }},
     {"sibling back to the root", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 72, 0); }},
     {"sibling past the directory", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 72, 5000); }},
     {"odd name length", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 64, 7, 2); }},
-    {"unknown type", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Bytes()[f.Entry("small") + 66] = 9; }},
+    {"unknown type", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.bytes[f.Entry("small") + 66] = 9; }},
     {"stream with elements", kOpen, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("small") + 76, 0); }},
     {"stream larger than the file", kReadBig, STG_E_DOCFILECORRUPT, [](RawFile& f) { f.Put(f.Entry("big") + 120, 0x7FFFFFF0); }},
     {"chain in a loop", kReadBig, STG_E_DOCFILECORRUPT,
@@ -133,11 +127,11 @@ TEST(StoragePosix, DamagedFilesAreRefusedWithTheSystemsCodes) {
     std::string good = SampleBytes(folder);
     ASSERT_GT(good.size(), 2048u);
     for (const Damage& damage : kDamages) {
-        RawFile file(good);
+        RawFile file{good};
         damage.apply(file);
         ComPtr<IStorage> root;
         auto expected = [&](Step step) { return damage.fails == step ? damage.code : S_OK; };
-        ASSERT_EQ(Open(folder.Write(L"damaged.cfb", file.Bytes()), root), expected(kOpen)) << damage.what;
+        ASSERT_EQ(Open(folder.Write(L"damaged.cfb", file.bytes), root), expected(kOpen)) << damage.what;
         if (!root)
             continue;
         EXPECT_EQ(ReadResult(root.Get(), L"big"), expected(kReadBig)) << damage.what;

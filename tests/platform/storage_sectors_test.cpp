@@ -2,7 +2,6 @@
 // stretch gathered in memory: random changes must read back the same before and after commits
 // and reverts, and a full disk must fail only the call it hits, losing nothing.
 #include <csignal>
-#include <filesystem>
 #include <map>
 #include <random>
 #include <string>
@@ -11,7 +10,6 @@
 
 #include <gtest/gtest.h>
 
-#include <ut/platform/global.h>
 #include <ut/platform/storage.h>
 
 #include "support/compound.h"

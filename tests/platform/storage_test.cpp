@@ -388,6 +388,7 @@ TEST_F(Storage, CompoundFilesLiveOnByteArrays) {
     ASSERT_EQ(ut::platform::OpenFileLockBytes(path.c_str(), STGM_READWRITE | STGM_CREATE, file.Put()), S_OK);
     EXPECT_EQ(StgIsStorageILockBytes(memory.Get()), S_FALSE);
     for (ILockBytes* bytes : {memory.Get(), file.Get()}) {
+        SCOPED_TRACE(bytes == file.Get() ? "on a file" : "in memory");
         ComPtr<IStorage> root;
         ASSERT_EQ(StgCreateDocfileOnILockBytes(bytes, kElementMode, 0, root.Put()), S_OK);
         ASSERT_EQ(root->SetClass(kSubClass), S_OK);

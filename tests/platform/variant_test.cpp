@@ -1,5 +1,4 @@
 // VARIANT, BSTR and SAFEARRAY basics.
-#include <cstring>
 #include <utility>
 
 #include <gtest/gtest.h>
