@@ -1,5 +1,7 @@
 // Text tables, catalogs and logging; module registry keys and string dictionaries.
 #include <string>
+#include <tuple>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -34,27 +36,15 @@ TEST(TextTables, ReadOneNumberedTextALineAndSkipWhatTheyCannotRead) {
                                 "12 \xC3\xBCn\xC3\xAF \xE2\x82\xAC\n"
                                 "13 the last line without a break";
     ASSERT_EQ(KXDictLoadFile(L"UTPARSE", folder.Write(L"parse.dict", content).c_str()), S_OK);
-    struct Case {
-        unsigned short id;
-        std::wstring text;
-    };
-    const Case cases[] = {
-        {1, L"replaced"},
-        {2, L"tab separated"},
-        {3, L"many blanks"},
-        {4, L"escapes \n \t \\ and C:\\dir\\file"},
-        {5, L""},
-        {6, L"trailing blanks kept  "},
-        {7, L"a line ending in CR LF"},
-        {8, L""},
-        {9, L""},
-        {10, L""},
-        {0, L"zero"},
-        {12, L"\u00FCn\u00EF \u20AC"},
-        {13, L"the last line without a break"},
-    };
-    for (const Case& c : cases)
-        EXPECT_EQ(std::wstring(DictLoadIdstring(L"UTPARSE", c.id)), c.text) << "entry " << c.id;
+    // clang-format off
+    const std::pair<unsigned short, std::wstring> cases[] = {
+        {1, L"replaced"}, {2, L"tab separated"}, {3, L"many blanks"},
+        {4, L"escapes \n \t \\ and C:\\dir\\file"}, {5, L""}, {6, L"trailing blanks kept  "},
+        {7, L"a line ending in CR LF"}, {8, L""}, {9, L""}, {10, L""}, {0, L"zero"},
+        {12, L"\u00FCn\u00EF \u20AC"}, {13, L"the last line without a break"}};
+    // clang-format on
+    for (const auto& [id, text] : cases)
+        EXPECT_EQ(std::wstring(DictLoadIdstring(L"UTPARSE", id)), text) << "entry " << id;
 
     // Reading again replaces the table; texts handed out before stay readable.
     const wchar_t* before = DictLoadIdstring(L"UTPARSE", 1);
@@ -77,22 +67,16 @@ TEST(TextTables, RefuseWhatCannotBeRead) {
 }
 
 TEST(LogMessage, WritesOneLineWithTheKindToStandardErrorByDefault) {
-    struct Case {
-        ULONG kind;
-        const wchar_t *text, *source, *details;
-        std::string line;
-    };
-    const Case cases[] = {
+    // The kind, text, source and details; the line written.
+    const std::tuple<ULONG, const wchar_t*, const wchar_t*, const wchar_t*, std::string> cases[] = {
         {KXLOG_INFO, L"plain", nullptr, nullptr, "info: plain\n"},
         {KXLOG_WARNING, L"two\nlines\r", L"cat 7", nullptr, "warning: two lines  [cat 7]\n"},
         {KXLOG_ERROR, L"failed", L"", L"more", "error: failed more\n"},
-        {7, L"odd", nullptr, L"", "kind 7: odd\n"},
-    };
-    for (const Case& c : cases) {
+        {7, L"odd", nullptr, L"", "kind 7: odd\n"}};
+    for (const auto& [kind, text, source, details, line] : cases) {
         testing::internal::CaptureStderr();
-        HRESULT hr = KXLogMessage(c.kind, c.text, c.source, c.details);
-        EXPECT_EQ(testing::internal::GetCapturedStderr(), c.line);
-        EXPECT_EQ(hr, S_OK);
+        EXPECT_EQ(KXLogMessage(kind, text, source, details), S_OK);
+        EXPECT_EQ(testing::internal::GetCapturedStderr(), line);
     }
     EXPECT_EQ(KXLogMessage(KXLOG_INFO, nullptr, nullptr, nullptr), E_POINTER);
 }
