@@ -282,24 +282,19 @@ const wchar_t* const kNames[] = {L"GWAPP_STATE_CHANGE",   L"KX3D_SELECTION_LIST"
 
 TEST(AppNotifySink, DispatchesEachNotificationByItsExactName) {
     // The notification, its kind and value (-1: none); the result and the handlers that ran.
+    const wchar_t *state = L"GWAPP_STATE_CHANGE", *activation = L"DesktopAppActivation";
+    // clang-format off
     const std::tuple<const wchar_t*, ULONG, LONG, std::string> cases[] = {
-        {L"GWAPP_STATE_CHANGE", 1, 8, "S_FALSE Terminate"},
-        {L"GWAPP_STATE_CHANGE", 1, 2, "S_FALSE PreClose"},
-        {L"GWAPP_STATE_CHANGE", 1, 1, "S_FALSE Startup"},
-        {L"GWAPP_STATE_CHANGE", 1, 4, "S_FALSE New"},
-        {L"GWAPP_STATE_CHANGE", 1, 16, "S_FALSE PostClose"},
-        {L"GWAPP_STATE_CHANGE", 1, 0x10100, "S_FALSE Changed"}, // the low 16 bits
-        {L"GWAPP_STATE_CHANGE", 1, 3, "S_OK "},
-        {L"GWAPP_STATE_CHANGE", 2, 8, "E_INVALIDARG "},
-        {L"GWAPP_STATE_CHANGE", 1, -1, "E_INVALIDARG "},
+        {state, 1, 8, "S_FALSE Terminate"}, {state, 1, 2, "S_FALSE PreClose"},
+        {state, 1, 1, "S_FALSE Startup"}, {state, 1, 4, "S_FALSE New"}, {state, 1, 16, "S_FALSE PostClose"},
+        {state, 1, 0x10100, "S_FALSE Changed"}, // the low 16 bits
+        {state, 1, 3, "S_OK "}, {state, 2, 8, "E_INVALIDARG "}, {state, 1, -1, "E_INVALIDARG "},
         {L"gwapp_state_change", 1, 8, "S_OK "},
-        {L"KX3D_SELECTION_LIST", 5, -1, "S_FALSE Selection5"},
-        {L"KX3D_ACTIVE_LIST", 6, 0, "S_FALSE Active6"},
-        {L"DesktopAppActivation", 1, 1, "S_FALSE Activate"},
-        {L"DesktopAppActivation", 1, 0, "S_FALSE Deactivate"},
-        {L"DesktopAppActivation", 0, 1, "E_INVALIDARG "},
-        {L"DesktopAppMinimized", 0, -1, "S_FALSE Minimize"},
+        {L"KX3D_SELECTION_LIST", 5, -1, "S_FALSE Selection5"}, {L"KX3D_ACTIVE_LIST", 6, 0, "S_FALSE Active6"},
+        {activation, 1, 1, "S_FALSE Activate"}, {activation, 0, 1, "E_INVALIDARG "},
+        {activation, 1, 0, "S_FALSE Deactivate"}, {L"DesktopAppMinimized", 0, -1, "S_FALSE Minimize"},
         {L"DesktopAppRestore", 0, -1, "S_FALSE Maximize"}};
+    // clang-format on
     for (const auto& [name, kind, number, expected] : cases) {
         auto* sink = new Recording;
         VARIANT value = Integer(number);

@@ -2,6 +2,7 @@
 // tidying emptied keys, deleting trees, modules' string tables and the factory folder.
 #include <functional>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -27,24 +28,18 @@ std::wstring TextAt(HKEY root, const std::wstring& path, const wchar_t* value) {
 }
 
 TEST(CoreKey, IsBuiltInTheCallersBuffer) {
-    struct Case {
-        const wchar_t* subKey;
-        int capacity;
-        HRESULT result;
-        const wchar_t* text;
-    };
-    const Case cases[] = {
+    // The sub-key and the buffer's capacity; the result and the buffer after.
+    const std::tuple<const wchar_t*, int, HRESULT, const wchar_t*> cases[] = {
         {L"QDEF", 260, S_OK, L"Software\\ut\\Core\\QDEF"},
         {L"", 260, S_OK, L"Software\\ut\\Core"},
         {nullptr, 260, S_OK, L"Software\\ut\\Core"},
         {L"QDEF", 22, S_OK, L"Software\\ut\\Core\\QDEF"},
         {L"QDEF", 21, HRESULT_FROM_WIN32(ERROR_INSUFFICIENT_BUFFER), L""},
-        {L"QDEF", 0, E_INVALIDARG, L"untouched"},
-    };
-    for (const Case& c : cases) {
+        {L"QDEF", 0, E_INVALIDARG, L"untouched"}};
+    for (const auto& [subKey, capacity, result, text] : cases) {
         wchar_t buffer[260] = L"untouched";
-        EXPECT_EQ(GWConstructKxcoreRegKey(c.subKey, buffer, c.capacity), c.result) << c.capacity;
-        EXPECT_STREQ(buffer, c.text);
+        EXPECT_EQ(GWConstructKxcoreRegKey(subKey, buffer, capacity), result) << capacity;
+        EXPECT_STREQ(buffer, text) << capacity;
     }
     EXPECT_EQ(GWConstructKxcoreRegKey(L"QDEF", nullptr, 260), E_POINTER);
 }
