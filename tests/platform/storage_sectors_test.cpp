@@ -1,6 +1,7 @@
 // A large stream's bytes go to the sectors of the next file as they are written, through a
 // stretch gathered in memory: random changes must read back the same before and after commits
 // and reverts, and a full disk must fail only the call it hits, losing nothing.
+#include <algorithm>
 #include <csignal>
 #include <map>
 #include <random>
@@ -88,12 +89,6 @@ private:
             held_.erase(name);
     }
 
-    void Seek(IStream* stream, std::size_t at) {
-        LARGE_INTEGER move{};
-        move.QuadPart = static_cast<LONGLONG>(at);
-        ASSERT_EQ(stream->Seek(move, STREAM_SEEK_SET, nullptr), S_OK);
-    }
-
     void Write() {
         std::wstring name = Pick();
         IStream* stream = Held(name);
@@ -102,10 +97,9 @@ private:
         std::string data(Length(), '\0');
         for (char& c : data)
             c = static_cast<char>(random_());
-        Seek(stream, at);
+        ASSERT_EQ(stream->Seek({.QuadPart = LONGLONG(at)}, STREAM_SEEK_SET, nullptr), S_OK);
         ASSERT_EQ(stream->Write(data.data(), static_cast<ULONG>(data.size()), nullptr), S_OK);
-        if (model.size() < at + data.size())
-            model.resize(at + data.size());
+        model.resize(std::max(model.size(), at + data.size()));
         model.replace(at, data.size(), data);
         MaybeLetGo(name);
     }
@@ -116,10 +110,9 @@ private:
         std::string& model = current_[name];
         const std::size_t sizes[] = {
             0, 4095, 4096, 4097, model.size() / 2, model.size() + 5000, Below(150000)};
-        ULARGE_INTEGER size{};
-        size.QuadPart = sizes[Below(std::size(sizes))];
-        ASSERT_EQ(stream->SetSize(size), S_OK);
-        model.resize(size.QuadPart);
+        std::size_t size = sizes[Below(std::size(sizes))];
+        ASSERT_EQ(stream->SetSize({.QuadPart = size}), S_OK);
+        model.resize(size);
         MaybeLetGo(name);
     }
 
@@ -130,13 +123,12 @@ private:
         IStream* stream = Held(name);
         const std::string& model = current_[name];
         std::size_t at = Below(model.size() + 100);
-        std::string got(Length(), '\0');
+        std::string got(Length(), '\0'), expected = Slice(model, at, got.size());
         ULONG read = 0;
-        Seek(stream, at);
+        ASSERT_EQ(stream->Seek({.QuadPart = LONGLONG(at)}, STREAM_SEEK_SET, nullptr), S_OK);
         ASSERT_EQ(stream->Read(got.data(), static_cast<ULONG>(got.size()), &read), S_OK);
         got.resize(read);
-        EXPECT_TRUE(got == Slice(model, at, got.size()) && read == Slice(model, at, got.size()).size())
-            << "stream " << current_.size() << " at " << at;
+        EXPECT_TRUE(got == expected) << read << " bytes of " << expected.size() << " read at " << at;
         MaybeLetGo(name);
     }
 
@@ -207,20 +199,15 @@ TEST(StorageSectors, AGrownStreamReadsZerosWhereItHadShrunk) {
         ASSERT_EQ(root->CreateStream(L"s", kElementMode, 0, 0, stream.Put()), S_OK);
         std::string content(100000, 'x');
         ASSERT_EQ(stream->Write(content.data(), static_cast<ULONG>(content.size()), nullptr), S_OK);
-        ULARGE_INTEGER size{};
-        size.QuadPart = shrunk;
-        ASSERT_EQ(stream->SetSize(size), S_OK);
+        ASSERT_EQ(stream->SetSize({.QuadPart = shrunk}), S_OK);
         content.resize(shrunk);
         content.resize(20000, '\0');
         if (growByWriting) {
-            LARGE_INTEGER end{};
-            end.QuadPart = 19999;
-            ASSERT_EQ(stream->Seek(end, STREAM_SEEK_SET, nullptr), S_OK);
+            ASSERT_EQ(stream->Seek({.QuadPart = 19999}, STREAM_SEEK_SET, nullptr), S_OK);
             ASSERT_EQ(stream->Write("y", 1, nullptr), S_OK);
             content.back() = 'y';
         } else {
-            size.QuadPart = content.size();
-            ASSERT_EQ(stream->SetSize(size), S_OK);
+            ASSERT_EQ(stream->SetSize({.QuadPart = content.size()}), S_OK);
         }
         stream.Reset();
         EXPECT_TRUE(ReadStream(root.Get(), L"s") == content);

@@ -16,9 +16,7 @@ using ut::platform::OpenFileStream;
 using ut::test::PositionOf;
 
 LARGE_INTEGER Offset(LONGLONG value) {
-    LARGE_INTEGER offset;
-    offset.QuadPart = value;
-    return offset;
+    return {.QuadPart = value};
 }
 
 // Reads from the start in small pieces, leaving the position at the end.
@@ -93,10 +91,8 @@ TEST_P(StreamTest, GrowingPastTheEndFillsTheGapWithZeros) {
     ASSERT_EQ(stream_->Write("x", 1, nullptr), S_OK);
     EXPECT_EQ(ReadAll(stream_.Get()), std::string("\0\0\0\0x", 5));
 
-    ULARGE_INTEGER size{};
-    size.QuadPart = 5000;
     ASSERT_EQ(stream_->Write("y", 1, nullptr), S_OK);
-    ASSERT_EQ(stream_->SetSize(size), S_OK);
+    ASSERT_EQ(stream_->SetSize({.QuadPart = 5000}), S_OK);
     EXPECT_EQ(PositionOf(stream_.Get()), 6u);
     EXPECT_EQ(ReadAll(stream_.Get()), std::string("\0\0\0\0xy", 6) + std::string(4994, '\0'));
 }
@@ -105,15 +101,13 @@ TEST_P(StreamTest, CopyToMovesTheRequestedBytesSetSizeTruncatesAndStatReportsThe
     ASSERT_EQ(stream_->Write("0123456789", 10, nullptr), S_OK);
     ASSERT_EQ(stream_->Seek(Offset(2), STREAM_SEEK_SET, nullptr), S_OK);
     ComPtr<IStream> target = ut::test::StreamOf();
-    ULARGE_INTEGER count{}, read{}, written{};
-    count.QuadPart = 5;
-    ASSERT_EQ(stream_->CopyTo(target.Get(), count, &read, &written), S_OK);
+    ULARGE_INTEGER read{}, written{};
+    ASSERT_EQ(stream_->CopyTo(target.Get(), {.QuadPart = 5}, &read, &written), S_OK);
     EXPECT_EQ(read.QuadPart, 5u);
     EXPECT_EQ(written.QuadPart, 5u);
     EXPECT_EQ(ReadAll(target.Get()), "23456");
 
-    count.QuadPart = 4;
-    ASSERT_EQ(stream_->SetSize(count), S_OK);
+    ASSERT_EQ(stream_->SetSize({.QuadPart = 4}), S_OK);
     STATSTG stat{};
     ASSERT_EQ(stream_->Stat(&stat, STATFLAG_NONAME), S_OK);
     EXPECT_EQ(stat.type, static_cast<DWORD>(STGTY_STREAM));
