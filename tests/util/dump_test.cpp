@@ -23,7 +23,6 @@ namespace {
 
 using ::testing::_;
 using ::testing::Invoke;
-using ::testing::Return;
 using ut::ComPtr;
 using ut::test::MockEnumProperties;
 using ut::test::MockProperties;
