@@ -1,5 +1,4 @@
-// Device contexts, sections and stretching as an image is brought onto the screen device, alike
-// on both homes, and the two ways to look at a bitmap.
+// Device contexts, sections, stretching onto the screen device, and reading a bitmap, alike on both homes.
 #include <string>
 #include <vector>
 

@@ -1,5 +1,4 @@
-// Global memory, dropped-file lists, registered formats and the data object in memory, alike
-// on both homes.
+// Global memory, dropped-file lists, registered formats and the data object, alike on both homes.
 #include <cstring>
 #include <string>
 #include <tuple>

@@ -1,5 +1,4 @@
-// ".reg" files on both homes: exports that import back unchanged, the forms and encodings an
-// import reads, and malformed files refused whole, with their line.
+// ".reg" files on both homes: round trips, every form and encoding, malformed files refused whole.
 #include <gtest/gtest.h>
 
 #include <ut/platform/regfile.h>
@@ -26,8 +25,7 @@ class RegFile : public testing::Test {
 protected:
     void SetUp() override { ASSERT_NE(scratch_.Get(), nullptr); }
 
-    // Imports UTF-8 text in which "$" stands for the scratch key's full path, and "HKCU\$" for
-    // it with the short root's name.
+    // Imports UTF-8 text; "$" is the scratch key's full path, "HKCU\$" the same with the short root.
     LONG Import(std::string text, RegFileProblem* problem = nullptr) {
         for (std::size_t at; (at = text.find("HKCU\\$")) != std::string::npos;)
             text.replace(at, 6, "HKCU\\" + Narrow(scratch_.SubKey()));
@@ -39,7 +37,6 @@ protected:
     ScratchKey scratch_;
 };
 
-// Unknown roots and missing keys are refused.
 TEST_F(RegFile, ExportImportsBackUnchanged) {
     const wchar_t* keys[] = {L"export", L"export\\sub key \"q\" \u00c4", L"export\\Stra\u00dfe\\deeper",
                              L"export\\empty"};

@@ -1,5 +1,4 @@
-// Helpers of the registry tests: value data in memory's layout, keys, names and values in one call
-// each, and one value of every kind.
+// Helpers of the registry tests: value data, keys, names and values in one call, every kind of value.
 #pragma once
 
 #include <cstdint>

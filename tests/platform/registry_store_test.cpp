@@ -1,6 +1,4 @@
-// The POSIX registry's store: processes that share it, a writer killed mid-way, stores that cannot
-// be written or are not stores at all, where it lives, what reads cost, the fixed case rule, and
-// store transactions.
+// What only the POSIX registry's store has: processes sharing it, its file, its costs, transactions.
 #include <clocale>
 #include <csignal>
 #include <cstdio>
@@ -72,8 +70,7 @@ struct Child {
             return std::nullopt;
         return std::string(line, std::strcspn(line, "\n"));
     }
-    // Reads what is left of the output and answers the exit code, or -1 when the child did not
-    // exit by itself.
+    // Reads the rest of the output; the exit code, or -1 when the child did not exit by itself.
     int Wait() {
         while (Line())
             continue;
@@ -83,8 +80,7 @@ struct Child {
     std::FILE* output;
 };
 
-// Fills `parent\name` with `count` sub-keys, each with a default value and a "Name", in one
-// transaction.
+// Fills `parent\name` with `count` sub-keys with a default value and a "Name", in one transaction.
 void Fill(HKEY parent, const std::wstring& name, int count) {
     ut::platform::RegistryTransaction transaction;
     UniqueHKey key = CreateKey(parent, name);
@@ -225,8 +221,7 @@ TEST(RegistryStore, ReadsCostTheSameAtEveryStepAndNothingUntilAnotherProcessComm
     ScratchKey scratch;
     Fill(scratch.Get(), L"hundred", 100);
     Fill(scratch.Get(), L"thousand", 1000);
-    // Walks the sub-keys one index at a time reading each one's "Name", as the registration
-    // lookups do, and answers what the store ran per step.
+    // Walks the sub-keys reading each one's "Name", as registration lookups do: the store's work per step.
     auto walk = [&](const wchar_t* name) {
         UniqueHKey key = OpenKey(scratch.Get(), name);
         ut::platform::RegistryStoreCounters before = ut::platform::GetRegistryStoreCounters();

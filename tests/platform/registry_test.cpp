@@ -1,5 +1,4 @@
-// The registry calls answer alike on both homes: the same tables run against the system's
-// registry on Windows and against the store of our own on POSIX.
+// The registry calls answer alike on both homes: the system's registry and our own POSIX store.
 #include <algorithm>
 #include <array>
 

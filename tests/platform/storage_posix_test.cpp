@@ -1,5 +1,4 @@
-// What POSIX's own compound files promise beyond the shared rules: damaged files refused with
-// the system's codes, atomic commits, and what the system writes read back.
+// What only POSIX's own compound files promise: damaged files refused, atomic commits, the system's bytes.
 #include <chrono>
 #include <csignal>
 #include <filesystem>
@@ -187,9 +186,8 @@ TEST(StoragePosix, StateBitsTimesAndClassIdsRoundTrip) {
     EXPECT_EQ(root->Commit(STGC_DEFAULT), STG_E_ACCESSDENIED);
 }
 
-// libgsf links a storage's elements as one list, which its own reader follows recursively:
-// the written directory must be relinked as balanced trees to read back. Commits keep the file's
-// permissions and leave nothing beside it.
+// libgsf links a storage's elements as one list, which its reader follows recursively: a written
+// directory must be relinked as balanced trees. Commits keep permissions and leave nothing beside.
 TEST(StoragePosix, ManyElementsReadBackAndCommitsKeepPermissions) {
     TempFolder folder;
     std::wstring path = folder / L"many.cfb";
@@ -213,8 +211,7 @@ TEST(StoragePosix, ManyElementsReadBackAndCommitsKeepPermissions) {
     EXPECT_EQ(std::distance(std::filesystem::directory_iterator(folder.Root()), {}), 1);
 }
 
-// The bytes the system itself wrote: a class id, streams large and small, an empty one, and a
-// sub-storage with its own class id.
+// Bytes the system itself wrote: class ids, streams large, small and empty, and a sub-storage.
 TEST(StoragePosix, ReadsWhatTheSystemWrites) {
     std::wstring path =
         (std::filesystem::path(UT_SOURCE_DIR) / "tests/platform/data/system_written.cfb").wstring();
@@ -252,8 +249,7 @@ std::uintmax_t OpenFileSizeIn(pid_t pid, const std::filesystem::path& folder, co
     return 0;
 }
 
-// A writer killed while it writes the next file: the old file stays whole, and nothing is left
-// beside it.
+// A writer killed while it writes the next file leaves the old file whole and nothing beside it.
 TEST(StoragePosix, AWriterKilledWhileWritingLeavesTheOldFileIntactAndNothingBeside) {
     TempFolder folder;
     std::wstring path = folder / L"crash.cfb";

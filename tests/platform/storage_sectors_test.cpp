@@ -1,6 +1,5 @@
-// A large stream's bytes go to the sectors of the next file as they are written, through a
-// stretch gathered in memory: random changes must read back the same before and after commits
-// and reverts, and a full disk must fail only the call it hits, losing nothing.
+// A large stream's bytes go to the next file's sectors as they are written, gathered in stretches:
+// changes must read back across commits and reverts, and a full disk fail only the call it meets.
 #include <algorithm>
 #include <csignal>
 #include <map>
@@ -42,9 +41,8 @@ std::string Slice(const std::string& bytes, std::size_t at, std::size_t count) {
     return at >= bytes.size() ? std::string() : bytes.substr(at, count);
 }
 
-// Random writes (a few bytes, a few KiB, more than a gathered stretch), resizes across the
-// mini-stream cutoff, reads, destroys, commits, reverts and reopenings, on streams held open
-// across steps or opened for one; every read is checked against a model.
+// Random writes, resizes across the mini-stream cutoff, reads, destroys, commits, reverts and
+// reopenings, on streams held open across steps or opened for one; reads checked against a model.
 class Model {
 public:
     Model(Home& home, unsigned seed) : home_(home), random_(seed) {}
