@@ -66,9 +66,12 @@ std::function<std::string()> Says(
 }
 
 // The walk of an export that gives a result only, named by its call; SAYS_THEN puts back what it
-// changed with `undo`.
+// changed with `undo`. TELLS walks an expression that gives its outcome as text.
+// clang-format off
 #define SAYS(call, ...) Walk(#call, Says([&] { return call; }), __VA_ARGS__)
 #define SAYS_THEN(call, undo, ...) Walk(#call, Says([&] { return call; }, [&] { (void)undo; }), __VA_ARGS__)
+#define TELLS(text, ...) Walk(#text, [&] { return text; }, __VA_ARGS__)
+// clang-format on
 
 struct Walk {
     const char* name;
@@ -242,10 +245,7 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
         SAYS(KXTimeControlReset(1), {"DENIED"}, "S_OK"),
         SAYS(F3DSetComponentValueCmd(arm_.Get(), ut::test::kX, &two),
              {"DENIED", "DENIED", "S_OK", "S_OK", "S_OK"}, "S_OK"),
-        {"KXIsActiveDataSelected",
-         [&] { return std::string(KXIsActiveDataSelected(arm_.Get()) ? "yes" : "no"); },
-         {"no"},
-         "yes"},
+        TELLS(std::string(KXIsActiveDataSelected(arm_.Get()) ? "yes" : "no"), {"no"}, "yes"),
         // The undo bracket: a step is recorded only when it opened and closed.
         {"C3DComplexUndo",
          [&] {
@@ -264,10 +264,8 @@ TEST_F(SceneFaults, EveryExportGivesItsDocumentedFailureAtEveryFailingHostCall) 
          "1"},
         // Families: the manager's failures come back, except that membership is then "no".
         SAYS(KXFindFamily(L"cameras", &found), {"DENIED"}, "S_OK"),
-        {"F3DIsCLSIDInFamily",
-         [&] { return std::to_string(F3DIsCLSIDInFamily(kLens, GUID_3DCameraFamily)); },
-         {std::to_string(kFault), "0"},
-         "1"},
+        TELLS(std::to_string(F3DIsCLSIDInFamily(kLens, GUID_3DCameraFamily)),
+              {std::to_string(kFault), "0"}, "1"),
         SAYS(KXValidateObjectFamily(&cameras, 1, kLens), {"DENIED"}, "S_OK"),
         // A failure inside a child's scan leaves that child out; the rest are returned.
         {"CSharedGuid",

@@ -407,10 +407,9 @@ TEST_F(ActiveDatabase, TheCurveCacheHoldsEachCurveOnceListensWhileItHoldsAndIsPr
     EXPECT_FALSE(cache->Listening());
     ut::ComPtr<I3DObject> arm = Find(L"Arm"), light = Find(L"Light");
     ut::test::MockFCurve onArm, onLight, orphan;
-    EXPECT_CALL(onArm, GetParentObject)
-        .WillRepeatedly(ut::test::GiveOut<0>(static_cast<IUnknown*>(arm.Get())));
-    EXPECT_CALL(onLight, GetParentObject)
-        .WillRepeatedly(ut::test::GiveOut<0>(static_cast<IUnknown*>(light.Get())));
+    for (auto [curve, parent] : {std::pair(&onArm, arm.Get()), std::pair(&onLight, light.Get())})
+        EXPECT_CALL(*curve, GetParentObject)
+            .WillRepeatedly(ut::test::GiveOut<0>(static_cast<IUnknown*>(parent)));
     EXPECT_CALL(orphan, GetParentObject).WillRepeatedly(Return(S_FALSE));
     for (IFCurve* curve : {&onArm, &onLight, &onArm, &orphan})
         cache->AddCurve(curve);

@@ -120,11 +120,8 @@ TEST(StreamHelperEncoding, CountedFormsKeepNullsEmbeddedZerosAndTheirCounts) {
 SAFEARRAY* IntMatrix() {
     SAFEARRAYBOUND bounds[2] = {{2, -1}, {3, 5}};
     SAFEARRAY* array = SafeArrayCreate(VT_I4, 2, bounds);
-    LONG* data = nullptr;
-    SafeArrayAccessData(array, reinterpret_cast<void**>(&data));
-    for (LONG i = 0; i < 6; ++i)
-        data[i] = i * 100 - 7;
-    SafeArrayUnaccessData(array);
+    const LONG values[] = {-7, 93, 193, 293, 393, 493};
+    std::memcpy(array->pvData, values, sizeof values);
     return array;
 }
 
