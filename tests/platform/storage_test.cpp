@@ -79,17 +79,14 @@ TEST_F(Storage, WrittenFilesReadBackWithTheirClassIdsSizesAndBytes) {
     ComPtr<IStream> small, large;
     ASSERT_EQ(root->OpenStream(L"s4095", nullptr, kReadMode, 0, small.Put()), S_OK);
     ASSERT_EQ(root->OpenStream(L"s70000", nullptr, kReadMode, 0, large.Put()), S_OK);
-    std::string a, b;
+    std::string read[2];
     char chunk[100];
-    ULONG got = 0;
-    for (int i = 0; i < 40; ++i) {
-        ASSERT_EQ(small->Read(chunk, sizeof chunk, &got), S_OK);
-        a.append(chunk, got);
-        ASSERT_EQ(large->Read(chunk, sizeof chunk, &got), S_OK);
-        b.append(chunk, got);
+    for (ULONG i = 0, got = 0; i < 80; ++i) {
+        ASSERT_EQ((i % 2 ? large : small)->Read(chunk, sizeof chunk, &got), S_OK);
+        read[i % 2].append(chunk, got);
     }
-    EXPECT_EQ(a, Pattern(4000, 1));
-    EXPECT_EQ(b, Pattern(70000, 1).substr(0, 4000));
+    EXPECT_EQ(read[0], Pattern(4000, 1));
+    EXPECT_EQ(read[1], Pattern(70000, 1).substr(0, 4000));
     large.Reset();
 
     ComPtr<IStream> stream;
@@ -142,24 +139,17 @@ TEST_F(Storage, RefusesBadArgumentsAndFilesThatAreNotCompoundFiles) {
     EXPECT_EQ(StgOpenStorage(nullptr, nullptr, kReadMode, nullptr, 0, storage.Put()), STG_E_INVALIDNAME);
     EXPECT_EQ(StgOpenStorage(folder.c_str(), nullptr, kReadMode, nullptr, 0, storage.Put()),
               STG_E_ACCESSDENIED);
-    struct Case {
-        const char* what;
-        const char* content; // null: no file
-        std::size_t size;
-        HRESULT isStorage, open;
-    } cases[] = {
-        {"text", "just some text that is long enough to be mistaken for nothing", 60, S_FALSE,
-         STG_E_FILEALREADYEXISTS},
-        {"empty", "", 0, S_FALSE, STG_E_FILEALREADYEXISTS},
-        {"signature only", "\xD0\xCF\x11\xE0\xA1\xB1\x1A\xE1", 8, S_OK, STG_E_FILEALREADYEXISTS},
-        {"missing", nullptr, 0, STG_E_FILENOTFOUND, STG_E_FILENOTFOUND},
+    const std::tuple<const char*, const char*, HRESULT, HRESULT> cases[] = {
+        // what, the file's content (null: no file), what StgIsStorageFile and opening answer
+        {"text", "just some text, long enough to be mistaken for nothing", S_FALSE, STG_E_FILEALREADYEXISTS},
+        {"empty", "", S_FALSE, STG_E_FILEALREADYEXISTS},
+        {"signature only", "\xD0\xCF\x11\xE0\xA1\xB1\x1A\xE1", S_OK, STG_E_FILEALREADYEXISTS},
+        {"missing", nullptr, STG_E_FILENOTFOUND, STG_E_FILENOTFOUND},
     };
-    for (const Case& c : cases) {
-        std::wstring file =
-            c.content ? folder_.Write(L"not.cfb", std::string(c.content, c.size)) : folder_ / L"missing.cfb";
-        EXPECT_EQ(StgIsStorageFile(file.c_str()), c.isStorage) << c.what;
-        EXPECT_EQ(StgOpenStorage(file.c_str(), nullptr, kReadMode, nullptr, 0, storage.Put()), c.open)
-            << c.what;
+    for (const auto& [what, content, isStorage, open] : cases) {
+        std::wstring file = content ? folder_.Write(L"not.cfb", content) : folder_ / L"missing.cfb";
+        EXPECT_EQ(StgIsStorageFile(file.c_str()), isStorage) << what;
+        EXPECT_EQ(StgOpenStorage(file.c_str(), nullptr, kReadMode, nullptr, 0, storage.Put()), open) << what;
         EXPECT_FALSE(storage);
     }
 }
