@@ -247,18 +247,17 @@ TEST_F(Registry, ShortBuffersAnswerMoreDataWithTheSizeNeeded) {
         LONG result = RegEnumValueW(Scratch(), 0, name, &length, nullptr, nullptr, data, &size);
         return std::pair{result, reportName ? length : size};
     };
-    const std::tuple<const char*, std::pair<LONG, DWORD>, LONG, DWORD> cases[] = {
-        {"a name without room for its terminator", listKey(7), ERROR_MORE_DATA, 7},
-        {"a name that just fits", listKey(8), ERROR_SUCCESS, 7},
-        {"a value one byte short", query(data, text - 1), ERROR_MORE_DATA, text},
-        {"a value's size asked without a buffer", query(nullptr, 0), ERROR_SUCCESS, text},
-        {"a listed value's data without room", listValue(16, 4, false), ERROR_MORE_DATA, text},
-        {"a listed value's name without room", listValue(4, sizeof data, true), ERROR_MORE_DATA, 4},
+    using Answer = std::pair<LONG, DWORD>;
+    const std::tuple<const char*, Answer, Answer> cases[] = {
+        {"a name without room for its terminator", listKey(7), {ERROR_MORE_DATA, 7}},
+        {"a name that just fits", listKey(8), {ERROR_SUCCESS, 7}},
+        {"a value one byte short", query(data, text - 1), {ERROR_MORE_DATA, text}},
+        {"a value's size asked without a buffer", query(nullptr, 0), {ERROR_SUCCESS, text}},
+        {"a listed value's data without room", listValue(16, 4, false), {ERROR_MORE_DATA, text}},
+        {"a listed value's name without room", listValue(4, sizeof data, true), {ERROR_MORE_DATA, 4}},
     };
-    for (const auto& [label, got, code, reported] : cases) {
-        EXPECT_EQ(got.first, code) << label;
-        EXPECT_EQ(got.second, reported) << label;
-    }
+    for (const auto& [label, got, expected] : cases)
+        EXPECT_EQ(got, expected) << label;
 }
 
 TEST_F(Registry, DeletionFollowsTheSystemsRules) {
