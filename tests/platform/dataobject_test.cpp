@@ -115,24 +115,25 @@ TEST_F(DataObjectTest, AnswersWhichFormatsAndMediaItHolds) {
 }
 
 TEST_F(DataObjectTest, GetDataHandsOutCopiesAndSetDataReplaces) {
-    UINT format = RegisterClipboardFormatW(L"UniformResourceLocator");
-    ASSERT_EQ(ut::platform::SetGlobalData(data_.Get(), static_cast<CLIPFORMAT>(format), "file:///a", 9),
-              S_OK);
-    FORMATETC url = Format(static_cast<CLIPFORMAT>(format));
-    STGMEDIUM first{};
-    ASSERT_EQ(data_->GetData(&url, &first), S_OK);
-    EXPECT_EQ(first.tymed, static_cast<DWORD>(TYMED_HGLOBAL));
-    EXPECT_EQ(BlockText(first.hGlobal), "file:///a");
+    auto format = static_cast<CLIPFORMAT>(RegisterClipboardFormatW(L"UniformResourceLocator"));
+    ASSERT_EQ(ut::platform::SetGlobalData(data_.Get(), format, "file:///a", 9), S_OK);
+    FORMATETC url = Format(format);
+    STGMEDIUM medium{};
+    ASSERT_EQ(data_->GetData(&url, &medium), S_OK);
+    EXPECT_EQ(medium.tymed, static_cast<DWORD>(TYMED_HGLOBAL));
+    EXPECT_EQ(BlockText(medium.hGlobal), "file:///a");
     {
-        ut::GlobalLockGuard lock(first.hGlobal);
+        ut::GlobalLockGuard lock(medium.hGlobal);
         static_cast<char*>(lock.Data())[0] = 'F';
     }
-    ReleaseStgMedium(&first);
-    ASSERT_EQ(ut::platform::SetGlobalData(data_.Get(), static_cast<CLIPFORMAT>(format), "http://b", 8), S_OK);
-    STGMEDIUM second{};
-    ASSERT_EQ(data_->GetData(&url, &second), S_OK);
-    EXPECT_EQ(BlockText(second.hGlobal), "http://b");
-    ReleaseStgMedium(&second);
+    ReleaseStgMedium(&medium);
+    ASSERT_EQ(data_->GetData(&url, &medium), S_OK);
+    EXPECT_EQ(BlockText(medium.hGlobal), "file:///a"); // the change went to a copy
+    ReleaseStgMedium(&medium);
+    ASSERT_EQ(ut::platform::SetGlobalData(data_.Get(), format, "http://b", 8), S_OK);
+    ASSERT_EQ(data_->GetData(&url, &medium), S_OK);
+    EXPECT_EQ(BlockText(medium.hGlobal), "http://b");
+    ReleaseStgMedium(&medium);
 
     ComPtr<IEnumFORMATETC> list;
     ASSERT_EQ(data_->EnumFormatEtc(DATADIR_GET, list.Put()), S_OK);
@@ -140,7 +141,7 @@ TEST_F(DataObjectTest, GetDataHandsOutCopiesAndSetDataReplaces) {
     ULONG fetched = 0;
     EXPECT_EQ(list->Next(4, listed, &fetched), S_FALSE);
     ASSERT_EQ(fetched, 1u);
-    EXPECT_EQ(listed[0].cfFormat, static_cast<CLIPFORMAT>(format));
+    EXPECT_EQ(listed[0].cfFormat, format);
 }
 
 TEST_F(DataObjectTest, CarriesDroppedFilesAndSharedStreams) {

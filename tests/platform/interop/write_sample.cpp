@@ -47,13 +47,9 @@ bool WriteSample(const std::wstring& path) {
 } // namespace
 
 int main(int argc, char** argv) {
-    if (argc != 2) {
-        std::fprintf(stderr, "usage: %s FILE\n", argv[0]);
-        return 2;
-    }
-    if (!WriteSample(ut::platform::WideFromUtf8(argv[1]))) {
-        std::fprintf(stderr, "could not write %s\n", argv[1]);
-        return 1;
-    }
+    if (argc != 2)
+        return std::fprintf(stderr, "usage: %s FILE\n", argv[0]), 2;
+    if (!WriteSample(ut::platform::WideFromUtf8(argv[1])))
+        return std::fprintf(stderr, "could not write %s\n", argv[1]), 1;
     return 0;
 }
