@@ -44,12 +44,11 @@ int Probe(const std::wstring& path) {
         return std::printf("cannot drop privileges\n"), 1;
     ut::UniqueHKey key = OpenKey(HKEY_CURRENT_USER, path, KEY_ALL_ACCESS);
     HKEY created = nullptr;
-    LONG results[] = {
+    long results[] = {
         QueryValue(key.get(), L"v").result,
         RegCreateKeyExW(key.get(), L"new", 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &created, nullptr),
         SetText(key.get(), L"v", L"changed"), RegDeleteValueW(key.get(), L"v")};
-    std::printf("read=%ld create=%ld set=%ld delete=%ld\n", static_cast<long>(results[0]),
-                static_cast<long>(results[1]), static_cast<long>(results[2]), static_cast<long>(results[3]));
+    std::printf("read=%ld create=%ld set=%ld delete=%ld\n", results[0], results[1], results[2], results[3]);
     return 0;
 }
 

@@ -156,8 +156,7 @@ TEST(StoragePosix, StateBitsTimesAndClassIdsRoundTrip) {
     TempFolder folder;
     std::wstring path = folder / L"attributes.cfb";
     constexpr CLSID kClass = {0x01020304, 0x0506, 0x0708, {9, 10, 11, 12, 13, 14, 15, 16}};
-    const FILETIME created{0x11111111, 0x01D00000};
-    const FILETIME modified{0x22222222, 0x01D10000};
+    const FILETIME created{0x11111111, 0x01D00000}, modified{0x22222222, 0x01D10000};
     {
         ComPtr<IStorage> root = Created(path), sub;
         ASSERT_TRUE(root);
