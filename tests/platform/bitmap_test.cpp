@@ -72,9 +72,7 @@ protected:
         return result;
     }
 
-    HDC screen_ = nullptr;
-    HDC source_ = nullptr;
-    HDC target_ = nullptr;
+    HDC screen_ = nullptr, source_ = nullptr, target_ = nullptr;
 };
 
 TEST_F(BitmapTest, StretchingCopiesScalesAndClips) {
